@@ -1,0 +1,128 @@
+#include "base/base.h"
+#include <filesystem>
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace fs = std::filesystem;
+
+std::string platform_data_dir()
+{
+    std::string dir;
+    if (const char *set = std::getenv("PLATFORM_DATA_DIR"); set && *set)
+        dir = set;
+    else if (const char *xdg = std::getenv("XDG_DATA_HOME"); xdg && *xdg == '/')
+        dir = std::string(xdg) + "/orvant-platform";
+    else if (const char *home = std::getenv("HOME"); home && *home)
+        dir = std::string(home) + "/.local/share/orvant-platform";
+    else
+        dir = "/tmp/orvant-platform-" + std::to_string(getuid());
+    std::error_code failed;
+    if (!fs::exists(dir, failed) && fs::create_directories(dir, failed))
+        ::chmod(dir.c_str(), 0700);
+    return dir;
+}
+
+std::string platform_data_file(const std::string &name)
+{
+    std::error_code failed;
+    for (fs::path dir = fs::read_symlink("/proc/self/exe", failed).parent_path(); !failed && dir.has_relative_path();
+         dir = dir.parent_path())
+        if (const fs::path file = dir / "platform" / name; fs::exists(file, failed))
+            return file;
+    if (const fs::path file = fs::path("/usr/share/orvant-platform") / name; fs::exists(file, failed))
+        return file;
+    return {};
+}
+
+bool Db::open(const std::string &path, const char *schema)
+{
+    sqlite3 *raw = nullptr;
+    const int result =
+        sqlite3_open_v2(path.c_str(), &raw, SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE | SQLITE_OPEN_NOMUTEX, nullptr);
+    handle.reset(raw);
+    if (result != SQLITE_OK) {
+        handle.reset();
+        return false;
+    }
+    sqlite3_busy_timeout(raw, 5000);
+    if (!run("PRAGMA journal_mode=WAL; PRAGMA synchronous=NORMAL; PRAGMA foreign_keys=ON;") || (schema && !run(schema)))
+        handle.reset();
+    return handle != nullptr;
+}
+
+bool Db::run(const char *sql)
+{
+    return handle && sqlite3_exec(handle.get(), sql, nullptr, nullptr, nullptr) == SQLITE_OK;
+}
+
+Stmt::Stmt(const Db &db, const char *sql)
+{
+    sqlite3_stmt *raw = nullptr;
+    if (db && sqlite3_prepare_v2(db.handle.get(), sql, -1, &raw, nullptr) == SQLITE_OK)
+        handle.reset(raw);
+}
+
+Stmt &Stmt::bind(int index, const char *text)
+{
+    if (handle)
+        sqlite3_bind_text(handle.get(), index, text, -1, SQLITE_TRANSIENT);
+    return *this;
+}
+
+Stmt &Stmt::bind(int index, const std::string &text)
+{
+    if (handle)
+        sqlite3_bind_text(handle.get(), index, text.data(), static_cast<int>(text.size()), SQLITE_TRANSIENT);
+    return *this;
+}
+
+Stmt &Stmt::bind(int index, long long value)
+{
+    if (handle)
+        sqlite3_bind_int64(handle.get(), index, value);
+    return *this;
+}
+
+Stmt &Stmt::bind(int index, double value)
+{
+    if (handle)
+        sqlite3_bind_double(handle.get(), index, value);
+    return *this;
+}
+
+bool Stmt::row()
+{
+    return handle && sqlite3_step(handle.get()) == SQLITE_ROW;
+}
+
+bool Stmt::done()
+{
+    return handle && sqlite3_step(handle.get()) == SQLITE_DONE;
+}
+
+void Stmt::reset()
+{
+    if (handle)
+        sqlite3_reset(handle.get());
+}
+
+long long Stmt::integer(int column) const
+{
+    return sqlite3_column_int64(handle.get(), column);
+}
+
+double Stmt::real(int column) const
+{
+    return sqlite3_column_double(handle.get(), column);
+}
+
+std::string Stmt::text(int column) const
+{
+    const auto *bytes = reinterpret_cast<const char *>(sqlite3_column_text(handle.get(), column));
+    return bytes ? std::string(bytes, static_cast<size_t>(sqlite3_column_bytes(handle.get(), column))) : std::string();
+}
+
+bool Stmt::null(int column) const
+{
+    return sqlite3_column_type(handle.get(), column) == SQLITE_NULL;
+}

@@ -1,0 +1,76 @@
+#pragma once
+// What the platform's libraries share: where they keep their files, and small owners of C handles.
+#include <cstdlib>
+#include <memory>
+#include <sqlite3.h>
+#include <string>
+
+// The folder in which the platform's libraries keep the current user's databases, without a final slash. It is
+// $PLATFORM_DATA_DIR when that is set (tests, demos), else $XDG_DATA_HOME/orvant-platform, else
+// ~/.local/share/orvant-platform. The folder is made when it is missing, readable by its owner alone. Any thread.
+std::string platform_data_dir();
+
+// A file that is installed with the platform's libraries, such as "theme/platform.edj". The running program's own
+// folder and those above it are looked through first, so that a program of a build folder finds the files built beside
+// it; then /usr/share/orvant-platform. Empty when there is none. Any thread.
+std::string platform_data_file(const std::string &name);
+
+struct CFree {
+    void operator()(void *p) const
+    {
+        std::free(p);
+    }
+};
+using CString = std::unique_ptr<char, CFree>;
+
+// An SQLite connection in WAL mode with a busy time-out, closed with its owner. It may be used by one thread at a time.
+struct Db {
+    struct Close {
+        void operator()(sqlite3 *db) const
+        {
+            sqlite3_close_v2(db);
+        }
+    };
+    std::unique_ptr<sqlite3, Close> handle;
+
+    // Opens (and creates) the database file and runs `schema`, a list of statements that change nothing when they were
+    // run before. The result is false when either fails; the connection is then closed.
+    bool open(const std::string &path, const char *schema);
+    // Runs statements that return no rows.
+    bool run(const char *sql);
+    explicit operator bool() const
+    {
+        return handle != nullptr;
+    }
+};
+
+// A prepared statement. Parameters count from 1, columns from 0; texts are copied by bind.
+struct Stmt {
+    struct Finalize {
+        void operator()(sqlite3_stmt *s) const
+        {
+            sqlite3_finalize(s);
+        }
+    };
+    std::unique_ptr<sqlite3_stmt, Finalize> handle;
+
+    Stmt(const Db &db, const char *sql);
+    Stmt &bind(int index, const char *text); // null binds NULL
+    Stmt &bind(int index, const std::string &text);
+    Stmt &bind(int index, long long value);
+    Stmt &bind(int index, double value);
+    // True when a row is there to be read.
+    bool row();
+    // Runs a statement that returns no rows; false on failure (a broken constraint among them).
+    bool done();
+    // Makes the statement ready to run again; the parameters stay bound.
+    void reset();
+    long long integer(int column) const;
+    double real(int column) const;
+    std::string text(int column) const; // NULL reads as ""
+    bool null(int column) const;
+    explicit operator bool() const
+    {
+        return handle != nullptr;
+    }
+};
