@@ -1,10 +1,8 @@
 #pragma once
 // The notification area.
-#include <ctime>
 
 typedef struct notification_s *notification_h;
-struct app_bundle;
-typedef app_bundle bundle;
+#include "app/bundle.h"
 
 enum notification_error_e {
     NOTIFICATION_ERROR_NONE = 0,
