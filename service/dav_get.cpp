@@ -6,10 +6,20 @@
 
 static const int64_t BLOCK = 256 << 10;
 
+// A receiver on a fast line would keep the loop for itself: after so many bytes it has to queue again.
+static const int64_t TURN = 4 << 20;
+
 namespace {
 struct Download {
     Fd file;
     int64_t left = 0;
+    guint pause_timer = 0;
+
+    ~Download()
+    {
+        if (pause_timer)
+            g_source_remove(pause_timer);
+    }
 };
 } // namespace
 
@@ -32,9 +42,23 @@ static void send_block(SoupServerMessage *message, Download &download)
     soup_message_body_append(body, SOUP_MEMORY_TAKE, block, static_cast<gsize>(count));
 }
 
+static gboolean go_on(gpointer data)
+{
+    auto *message = static_cast<SoupServerMessage *>(data);
+    static_cast<Download *>(g_object_get_data(G_OBJECT(message), "download"))->pause_timer = 0;
+    soup_server_message_unpause(message);
+    return G_SOURCE_REMOVE;
+}
+
 static void wrote_chunk(SoupServerMessage *message, gpointer data)
 {
-    send_block(message, *static_cast<Download *>(data));
+    Download &download = *static_cast<Download *>(data);
+    const int64_t before = download.left;
+    send_block(message, download);
+    if (before / TURN != download.left / TURN && !download.pause_timer) {
+        soup_server_message_pause(message);
+        download.pause_timer = g_idle_add(go_on, message);
+    }
 }
 
 // The one range of the Range header; the whole file when there is none, or several, or If-Range names another version.

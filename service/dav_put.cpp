@@ -7,6 +7,8 @@
 #include <sys/stat.h>
 
 static const int64_t DELAY_STEP = 64 << 10;
+// A sender that is faster than the disk would keep the loop for itself: after so many bytes it has to queue again.
+static const int64_t TURN = 1 << 20;
 // Written-back in steps while the body arrives, so that the final fsync has little left to wait for.
 static const int64_t FLUSH_STEP = 8 << 20;
 
@@ -23,19 +25,25 @@ struct Upload {
     int64_t replaced = 0; // bytes of the file that it takes the place of
     int64_t reserved = 0; // this upload's share of account->reserved
     int64_t flushed = 0;
-    guint delay_timer = 0;
+    int sync_error = 0; // errno of the final fsync
+    guint pause_timer = 0;
+
+    void sync()
+    {
+        sync_error = fsync(file.fd) == 0 ? 0 : errno;
+    }
 };
 
 void put_drop(Request &request)
 {
+    if (!request.upload || request.jobs)
+        return; // a body that is being written to the disk is complete: it is stored even if nobody waits for it
     Upload *upload = std::exchange(request.upload, nullptr);
-    if (!upload)
-        return;
     upload->account->reserved -= upload->reserved;
     if (upload->file)
         unlinkat(upload->service->temporary.fd, upload->temporary.c_str(), 0);
-    if (upload->delay_timer)
-        g_source_remove(upload->delay_timer);
+    if (upload->pause_timer)
+        g_source_remove(upload->pause_timer);
     delete upload;
 }
 
@@ -125,7 +133,7 @@ void put_begin(Request &request)
 static gboolean go_on(gpointer data)
 {
     auto *request = static_cast<Request *>(data);
-    request->upload->delay_timer = 0;
+    request->upload->pause_timer = 0;
     soup_server_message_unpause(request->message);
     return G_SOURCE_REMOVE;
 }
@@ -150,9 +158,11 @@ void put_chunk(Request &request, GBytes *chunk)
         sync_file_range(upload.file.fd, upload.flushed, upload.received - upload.flushed, SYNC_FILE_RANGE_WRITE);
         upload.flushed = upload.received;
     }
-    if (request.service->faults.delay && before / DELAY_STEP != upload.received / DELAY_STEP && !upload.delay_timer) {
+    const unsigned delay = request.service->faults.delay;
+    const int64_t step = delay ? DELAY_STEP : TURN;
+    if (before / step != upload.received / step && !upload.pause_timer) {
         soup_server_message_pause(request.message);
-        upload.delay_timer = g_timeout_add(request.service->faults.delay, go_on, &request);
+        upload.pause_timer = g_timeout_add(delay, go_on, &request);
     }
 }
 
@@ -166,16 +176,18 @@ static int store(Request &request)
         return 400;
     if (!upload.wanted_digest.empty() && upload.wanted_digest != digest)
         return 400;
-    if (fsync(upload.file.fd) != 0)
-        return status_of_errno(errno);
+    if (upload.sync_error)
+        return status_of_errno(upload.sync_error);
     // Much may have happened while the body arrived.
     Entry old;
     const Fd folder = request.parent();
     if (const int status = check_target(request, folder, old))
         return status;
     int64_t freed = 0;
-    const int status = move_entry(service.temporary.fd, upload.temporary, folder.fd, request.path.name(),
-                                  upload.only_new ? Overwrite::NO : Overwrite::YES, service.temporary.fd, &freed);
+    std::string aside; // stays empty: no folder is replaced
+    const int status =
+        move_entry(service.temporary.fd, upload.temporary, folder.fd, request.path.name(),
+                   upload.only_new ? Overwrite::NO : Overwrite::YES, service.temporary.fd, &freed, &aside);
     if (status >= 300)
         return status;
     upload.file = Fd();
@@ -190,13 +202,24 @@ static int store(Request &request)
     return status;
 }
 
-void put_finish(Request &request)
+static void store_and_answer(Request &request)
 {
-    if (!request.upload)
-        return request.answer(500);
     const int status = store(request);
     put_drop(request);
     request.answer(status);
     if (status < 300 && request.service->faults.lose_reply > 0 && --request.service->faults.lose_reply == 0)
         g_socket_shutdown(soup_server_message_get_socket(request.message), TRUE, TRUE, nullptr);
+}
+
+void put_finish(Request &request)
+{
+    if (!request.upload)
+        return request.answer(500);
+    Upload *upload = request.upload;
+    if (upload->received < FLUSH_STEP) {
+        upload->sync();
+        return store_and_answer(request);
+    }
+    in_thread(
+        request, [upload] { upload->sync(); }, [&request] { store_and_answer(request); });
 }

@@ -4,6 +4,21 @@
 #include <cstring>
 #include <sys/stat.h>
 
+// Answers when what was taken aside (nothing when empty) is removed and its room, if it was `counted` as used, is free
+// again. It may be a folder of a hundred thousand files, so it is not done on the main loop.
+static void answer_after_removal(Request &request, int status, const std::string &aside, bool counted = true)
+{
+    if (aside.empty())
+        return request.answer(status);
+    const auto freed = std::make_shared<int64_t>(0);
+    in_thread(
+        request, [attic = request.service->temporary.fd, aside, freed] { remove_tree(attic, aside, freed.get()); },
+        [&request, status, freed, counted] {
+            request.account->used -= counted ? *freed : 0;
+            request.answer(status);
+        });
+}
+
 void dav_delete(Request &request)
 {
     if (request.path.root())
@@ -22,11 +37,8 @@ void dav_delete(Request &request)
     const int attic = request.service->temporary.fd;
     if (!folder || renameat(folder.fd, request.path.name().c_str(), attic, aside.c_str()) != 0)
         return request.answer(status_of_errno(errno));
-    int64_t freed = 0;
-    remove_tree(attic, aside, &freed);
-    request.account->used = std::max<int64_t>(0, request.account->used - freed);
     request.service->metadata.forget(*request.account, request.path);
-    request.answer(204);
+    answer_after_removal(request, 204, aside);
 }
 
 void dav_mkcol(Request &request)
@@ -71,35 +83,77 @@ static int read_destination(const Request &request, Path &path)
     return status == 404 ? 502 : status;
 }
 
-// A copy is made whole among the temporary files and then moved to its name.
-static int copy_to(Request &request, const Fd &from, const Path &target, const Fd &to, Overwrite overwrite, bool deep)
+static Fd target_folder(const Request &request, const Path &target)
 {
-    Account &account = *request.account;
-    const int temporary = request.service->temporary.fd;
+    return open_folder(request.account->folder.fd, target, target.parts.size() - 1);
+}
+
+static int status_without_target_folder()
+{
+    return errno == ENOENT || errno == ENOTDIR ? 409 : status_of_errno(errno);
+}
+
+namespace {
+// A copy is made whole among the temporary files, on another thread, and then moved to its name.
+struct Copy {
+    Request &request;
+    Path target;
+    Overwrite overwrite;
+    bool deep;
+    Fd from; // the folder of what is copied
+    std::string name = temporary_name("copy");
+    int64_t reserved = 0, size = 0;
+    std::vector<CopiedFile> files;
+    int error = 0; // errno of copying
+
+    Copy(Request &asked, const Path &to, Overwrite over, bool whole, Fd folder)
+        : request(asked), target(to), overwrite(over), deep(whole), from(std::move(folder))
+    {
+    }
+
+    void make()
+    {
+        const int temporary = request.service->temporary.fd;
+        error = copy_tree(from.fd, request.path.name(), temporary, name, deep, files) ? 0 : errno;
+        size = tree_size(temporary, name);
+    }
+
+    void finish()
+    {
+        Account &account = *request.account;
+        const int temporary = request.service->temporary.fd;
+        account.reserved -= reserved;
+        int64_t freed = 0;
+        std::string aside;
+        int status = error ? status_of_errno(error) : 0;
+        const Fd to = target_folder(request, target);
+        if (!status && !to)
+            status = status_without_target_folder();
+        if (!status)
+            status = move_entry(temporary, name, to.fd, target.name(), overwrite, temporary, &freed, &aside);
+        if (status >= 300)
+            return answer_after_removal(request, status, name, false);
+        account.used += size - freed;
+        request.service->metadata.copied(account, request.path, target, deep, files);
+        answer_after_removal(request, status, aside);
+    }
+};
+} // namespace
+
+static void start_copy(Request &request, Fd from, const Fd &to, const Path &target, Overwrite overwrite, bool deep)
+{
     const Entry source = look(from.fd, request.path.name()), old = look(to.fd, target.name());
     const int64_t size = deep || source.kind == Entry::FILE ? tree_size(from.fd, request.path.name()) : 0;
+    const int64_t more = size - (old.kind == Entry::NONE ? 0 : tree_size(to.fd, target.name()));
     if (overwrite == Overwrite::NO && old.kind != Entry::NONE)
-        return 412;
-    if (size - (old.kind == Entry::NONE ? 0 : tree_size(to.fd, target.name())) > account.left())
-        return 507;
-    const std::string name = temporary_name("copy");
-    std::vector<CopiedFile> files;
-    int64_t freed = 0;
-    int status = 0;
-    if (!copy_tree(from.fd, request.path.name(), temporary, name, deep, files))
-        status = status_of_errno(errno);
-    int64_t copied = 0;
-    if (!status) {
-        copied = tree_size(temporary, name);
-        status = move_entry(temporary, name, to.fd, target.name(), overwrite, temporary, &freed);
-    }
-    if (status >= 300) {
-        remove_tree(temporary, name, nullptr);
-        return status;
-    }
-    account.used += copied - freed;
-    request.service->metadata.copied(account, request.path, target, deep, files);
-    return status;
+        return request.answer(412);
+    if (more > request.account->left())
+        return request.answer(507);
+    auto copy = std::make_shared<Copy>(request, target, overwrite, deep, std::move(from));
+    copy->reserved = std::max<int64_t>(0, more);
+    request.account->reserved += copy->reserved;
+    in_thread(
+        request, [copy] { copy->make(); }, [copy] { copy->finish(); });
 }
 
 void dav_copy_move(Request &request, bool move)
@@ -126,23 +180,21 @@ void dav_copy_move(Request &request, bool move)
     if (request.path.root() || target.root() || target.parts == request.path.parts || request.path.holds(target) ||
         target.holds(request.path))
         return request.answer(403);
-    const Fd from = request.parent(), to = open_folder(request.account->folder.fd, target, target.parts.size() - 1);
+    Fd from = request.parent();
+    const Fd to = target_folder(request, target);
     if (!from)
         return request.answer(status_of_errno(errno));
     if (!to)
-        return request.answer(errno == ENOENT || errno == ENOTDIR ? 409 : status_of_errno(errno));
-
-    int status;
-    if (move) {
-        int64_t freed = 0;
-        status = move_entry(from.fd, request.path.name(), to.fd, target.name(), overwrite,
-                            request.service->temporary.fd, &freed);
-        if (status < 300) {
-            request.account->used = std::max<int64_t>(0, request.account->used - freed);
-            request.service->metadata.moved(*request.account, request.path, target);
-        }
-    } else {
-        status = copy_to(request, from, target, to, overwrite, !flat);
-    }
-    request.answer(status);
+        return request.answer(status_without_target_folder());
+    if (!move)
+        return start_copy(request, std::move(from), to, target, overwrite, !flat);
+    int64_t freed = 0;
+    std::string aside;
+    const int status = move_entry(from.fd, request.path.name(), to.fd, target.name(), overwrite,
+                                  request.service->temporary.fd, &freed, &aside);
+    if (status >= 300)
+        return request.answer(status);
+    request.account->used -= freed;
+    request.service->metadata.moved(*request.account, request.path, target);
+    answer_after_removal(request, status, aside);
 }

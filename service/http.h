@@ -2,6 +2,7 @@
 // What the handlers of requests share. All of it runs on the main loop.
 #include "metadata.h"
 #include <ctime>
+#include <functional>
 #include <libsoup/soup.h>
 
 // Disturbances that tests ask for; see README.md.
@@ -17,6 +18,7 @@ struct Service {
     Metadata metadata;
     Fd files, temporary; // the folders of the accounts and of unfinished work, on one file system
     Faults faults;
+    int busy = 0; // jobs on other threads
 };
 
 struct Upload;
@@ -27,6 +29,7 @@ struct Request {
     Path path;                            // empty for addresses outside /dav/
     bool is_dav = false;
     Upload *upload = nullptr; // owned; of a PUT whose body is being received
+    int jobs = 0;             // on other threads, for this request
     int64_t body_bytes = 0;   // received so far, of methods other than PUT
 
     const char *method() const
@@ -64,6 +67,9 @@ void refuse(Request &request, int status);
 // The status that the If-Match, If-None-Match and If-(Un)Modified-Since headers demand for a resource (RFC 9110, 13): 0
 // to go on, 412, or 304 for GET and HEAD. An entry of kind NONE is a resource that does not exist.
 int check_conditions(const Request &request, const Entry &entry);
+// Runs `work` on another thread while the request waits, then `done` on the main loop; `done` answers, or calls this
+// again. Both run also when the client has gone meanwhile. `work` must touch nothing that the main loop uses.
+void in_thread(Request &request, std::function<void()> work, std::function<void()> done);
 std::string http_date(int64_t nanoseconds);
 // The value of a Repr-Digest header (RFC 9530) for 64 hexadecimal digits.
 std::string repr_digest(const std::string &sha256_hex);

@@ -171,7 +171,7 @@ static bool copy_file(int from, const std::string &from_name, int to, const std:
     for (;;) {
         ssize_t count = copy_file_range(in.fd, nullptr, out.fd, nullptr, COPY_STEP, 0);
         if (count == 0)
-            return fsync(out.fd) == 0;
+            return true;
         if (count > 0)
             continue;
         if (errno != EXDEV && errno != EINVAL && errno != ENOSYS && errno != EOPNOTSUPP)
@@ -180,7 +180,7 @@ static bool copy_file(int from, const std::string &from_name, int to, const std:
         while ((count = read(in.fd, block, sizeof block)) > 0)
             if (write(out.fd, block, static_cast<size_t>(count)) != count)
                 return false;
-        return count == 0 && fsync(out.fd) == 0;
+        return count == 0;
     }
 }
 
@@ -217,7 +217,11 @@ static bool copy_below(int from, const Entry &entry, int to, const std::string &
 bool copy_tree(int from, const std::string &from_name, int to, const std::string &to_name, bool deep,
                std::vector<CopiedFile> &files)
 {
-    return copy_below(from, look(from, from_name), to, to_name, deep, "", files, 0);
+    if (!copy_below(from, look(from, from_name), to, to_name, deep, "", files, 0))
+        return false;
+    const Fd copy(openat(to, to_name.c_str(), O_RDONLY | O_NOFOLLOW | O_CLOEXEC));
+    // An fsync per file makes copying ten thousand small files thirty times slower.
+    return copy && (files.size() == 1 ? fsync(copy.fd) : syncfs(copy.fd)) == 0;
 }
 
 // rename() that fails with EEXIST when the name is taken; file systems without that flag still make hard links.
@@ -231,7 +235,7 @@ static bool rename_to_free_name(int from, const std::string &from_name, int to, 
 }
 
 int move_entry(int from, const std::string &from_name, int to, const std::string &to_name, Overwrite overwrite,
-               int attic, int64_t *freed)
+               int attic, int64_t *freed, std::string *aside)
 {
     if (rename_to_free_name(from, from_name, to, to_name))
         return 201;
@@ -248,15 +252,15 @@ int move_entry(int from, const std::string &from_name, int to, const std::string
         *freed += old.size;
         return 204;
     }
-    const std::string aside = temporary_name("old");
-    if (renameat(to, to_name.c_str(), attic, aside.c_str()) != 0)
+    const std::string name = temporary_name("old");
+    if (renameat(to, to_name.c_str(), attic, name.c_str()) != 0)
         return status_of_errno(errno);
     if (!rename_to_free_name(from, from_name, to, to_name)) {
         const int status = status_of_errno(errno);
-        renameat(attic, aside.c_str(), to, to_name.c_str());
+        renameat(attic, name.c_str(), to, to_name.c_str());
         return status;
     }
-    remove_tree(attic, aside, freed);
+    *aside = name;
     return 204;
 }
 

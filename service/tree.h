@@ -71,10 +71,11 @@ bool copy_tree(int from, const std::string &from_name, int to, const std::string
 
 enum class Overwrite { NO, YES };
 // Moves a file or folder to a name of another folder of the same file system. With Overwrite::NO the move and the
-// check that the name is free are one step. With Overwrite::YES what was there is gone afterwards, through `attic`, a
-// folder for removed things. The result is 201 (the name was free), 204 (it was not), 412 (taken) or an error's status;
-// nothing has changed after an error. *freed grows by the bytes of what was replaced.
+// check that the name is free are one step. With Overwrite::YES what was there is gone afterwards: a file at once
+// (*freed grows by its size), anything else waits for remove_tree in the folder `attic` under the name *aside. The
+// result is 201 (the name was free), 204 (it was not), 412 (taken) or an error's status; nothing has changed after an
+// error.
 int move_entry(int from, const std::string &from_name, int to, const std::string &to_name, Overwrite overwrite,
-               int attic, int64_t *freed);
+               int attic, int64_t *freed, std::string *aside);
 // A name that no other call has returned in this process, for the folder of temporary files.
 std::string temporary_name(const char *kind);
