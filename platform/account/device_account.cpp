@@ -104,6 +104,8 @@ int main(int argc, char **argv)
                                        : account_foreach_account_from_db(print, nullptr);
         account_disconnect();
     }
+    if (result == ACCOUNT_ERROR_RECORD_NOT_FOUND && command == "list")
+        return 0;
     if (result == ACCOUNT_ERROR_RECORD_NOT_FOUND)
         std::fprintf(stderr, "device-account: there is no account\n");
     else if (result != ACCOUNT_ERROR_NONE)
