@@ -105,16 +105,20 @@ void request_from_variant(GVariant *dictionary, app_control_s &request)
     GVariantIter *entries = nullptr;
     if (!g_variant_lookup(dictionary, "extra", "a(aybaay)", &entries))
         return;
-    const char *key = nullptr;
-    gboolean array = FALSE;
-    GVariantIter *texts = nullptr;
-    while (g_variant_iter_loop(entries, "(^&aybaay)", &key, &array, &texts)) {
+    while (GVariant *entry = g_variant_iter_next_value(entries)) {
+        const char *key = nullptr;
+        gboolean array = FALSE;
+        GVariantIter *texts = nullptr;
+        g_variant_get(entry, "(^&aybaay)", &key, &array, &texts);
         std::vector<std::string> values;
-        const char *value = nullptr;
-        while (g_variant_iter_loop(texts, "^&ay", &value))
-            values.emplace_back(value);
+        while (GVariant *text = g_variant_iter_next_value(texts)) {
+            values.emplace_back(g_variant_get_bytestring(text));
+            g_variant_unref(text);
+        }
         if (array || values.size() == 1)
             request.set(key, array, std::move(values));
+        g_variant_iter_free(texts);
+        g_variant_unref(entry);
     }
     g_variant_iter_free(entries);
 }
