@@ -419,7 +419,9 @@ static void __bind_catalogues()
 
 int main(int argc, char **argv)
 {
+    G_GNUC_BEGIN_IGNORE_DEPRECATIONS
     g_type_init();
+    G_GNUC_END_IGNORE_DEPRECATIONS
     app_set_id(VELORA_PACKAGE);
     __bind_catalogues();
     app_event_callback_s lifecycle = {};

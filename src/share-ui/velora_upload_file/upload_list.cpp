@@ -210,7 +210,6 @@ static void __language_changed_cb(void *, Evas_Object *obj, void *)
 Evas_Object *__genlist_create(UploadViewData *vd)
 {
     Evas_Object *genlist = elm_genlist_add(vd->ad->naviframe);
-    elm_genlist_realization_mode_set(genlist, EINA_TRUE);
     elm_object_style_set(genlist, "dialogue");
     elm_genlist_mode_set(genlist, ELM_LIST_COMPRESS);
     evas_object_smart_callback_add(genlist, "language,changed", __language_changed_cb, nullptr);

@@ -48,7 +48,7 @@ static void __send(UploadViewData *vd, const char *format, int index)
     _velora_common_pipe_send_msg(vd->pipe, text);
 }
 
-static bool __is_final(int state)
+static bool __is_end_state(int state)
 {
     return state == UPLOAD_STATE_DONE || state == UPLOAD_STATE_FAILED;
 }
@@ -61,7 +61,7 @@ static void __transfer_report(UploadViewData *vd, UploadItem *item, int state, i
     int seen = item->state;
     while (seen != UPLOAD_STATE_CANCELED && !item->state.compare_exchange_weak(seen, state))
         ;
-    __send(vd, __is_final(state) ? "store.%d" : "update.%d", item->index);
+    __send(vd, __is_end_state(state) ? "store.%d" : "update.%d", item->index);
     if (const int remaining = vd->total - vd->canceled; remaining > 0)
         __progress_noti_set_progress(vd->noti_id, (vd->success + vd->fail + progress / 100.0) / remaining);
 }
@@ -81,7 +81,7 @@ void __upload_file_cb(int state, int, int progress, int error, void *data)
     s_callbacks++;
     __transfer_report(vd, item, state, progress, error);
     s_callbacks--;
-    if (__is_final(state) || error != 0)
+    if (__is_end_state(state) || error != 0)
         s_wake.release();
 }
 
