@@ -423,6 +423,7 @@ int main(int argc, char **argv)
     g_type_init();
     G_GNUC_END_IGNORE_DEPRECATIONS
     app_set_id(VELORA_PACKAGE);
+    app_add_alias(VELORA_SHARE_PACKAGE);
     __bind_catalogues();
     app_event_callback_s lifecycle = {};
     lifecycle.create = __velora_app_create;

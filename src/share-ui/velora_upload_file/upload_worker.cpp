@@ -57,6 +57,8 @@ static void __transfer_report(UploadViewData *vd, UploadItem *item, int state, i
 {
     item->progress = progress;
     item->error = error;
+    if (error != 0)
+        VELORA_LOGE("upload failed[%d]: [%s]", error, item->path);
     // A cancel on the main loop may come just before the first report; it stands.
     int seen = item->state;
     while (seen != UPLOAD_STATE_CANCELED && !item->state.compare_exchange_weak(seen, state))
