@@ -74,7 +74,8 @@ def follow_upload(device, pictures, count):
             if shots == 0:
                 pictures.take("uploading-notification")
                 # Back to the application, by a tap on its ongoing notification.
-                device.tool("platform/notification/notifications", "tap", *ongoing.split("\t")[:2])
+                device.tool("platform/notification/notifications", "tap", "com.orvant.velora-share",
+                            ongoing.split("\t")[0])
                 shots = 1
             elif shots == 1 and count > 1:
                 pictures.take("uploading-queue")

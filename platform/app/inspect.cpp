@@ -62,6 +62,9 @@ void visit(const Walk &walk, Evas_Object *obj)
         add_markup(walk, "text", evas_object_textblock_text_markup_get(obj), place);
     else if (elm_object_widget_check(obj) && std::strcmp(elm_object_widget_type_get(obj), "Elm_Button") == 0)
         add_markup(walk, "Elm_Button", elm_object_text_get(obj), place);
+    for (const char *leaf : {"rectangle", "image", "text", "textblock", "line", "polygon", "vectors", "textgrid"})
+        if (std::strcmp(type, leaf) == 0)
+            return;
     Eina_List *members = evas_object_smart_members_get(obj);
     void *member = nullptr;
     EINA_LIST_FREE(members, member)

@@ -222,6 +222,7 @@ static bool __share_create(UploadViewData *vd)
     elm_object_style_set(vd->more_btn, "naviframe/more/default");
     evas_object_smart_callback_add(vd->more_btn, "clicked", __more_create_folder_cb, vd);
     elm_object_item_part_content_set(vd->nf_item, "toolbar_more_btn", vd->more_btn);
+    elm_object_disabled_set(vd->more_btn, EINA_TRUE); // its menu belongs to a queue
     if (cloud_content_sync_folder_get_root(ad->sync_handle, &vd->folder) != 0) {
         VELORA_LOGE("cloud_content_sync_folder_get_root failed");
         __leave(vd);
