@@ -192,7 +192,7 @@ static int store(Request &request)
         return status;
     upload.file = Fd();
     fsync(folder.fd);
-    request.account->used += upload.received - freed;
+    request.account->count(upload.received - freed);
     if (status == 201)
         service.metadata.forget(*request.account, request.path);
     const Entry entry = look(folder.fd, request.path.name());

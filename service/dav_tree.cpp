@@ -14,7 +14,7 @@ static void answer_after_removal(Request &request, int status, const std::string
     in_thread(
         request, [attic = request.service->temporary.fd, aside, freed] { remove_tree(attic, aside, freed.get()); },
         [&request, status, freed, counted] {
-            request.account->used -= counted ? *freed : 0;
+            request.account->count(counted ? -*freed : 0);
             request.answer(status);
         });
 }
@@ -133,7 +133,7 @@ struct Copy {
             status = move_entry(temporary, name, to.fd, target.name(), overwrite, temporary, &freed, &aside);
         if (status >= 300)
             return answer_after_removal(request, status, name, false);
-        account.used += size - freed;
+        account.count(size - freed);
         request.service->metadata.copied(account, request.path, target, deep, files);
         answer_after_removal(request, status, aside);
     }
@@ -194,7 +194,7 @@ void dav_copy_move(Request &request, bool move)
                                   request.service->temporary.fd, &freed, &aside);
     if (status >= 300)
         return request.answer(status);
-    request.account->used -= freed;
+    request.account->count(-freed);
     request.service->metadata.moved(*request.account, request.path, target);
     answer_after_removal(request, status, aside);
 }

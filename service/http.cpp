@@ -1,7 +1,8 @@
 #include "http.h"
 #include <cstring>
 #include <gio/gio.h>
-#include <gio/gunixsocketaddress.h>
+#include <netinet/in.h>
+#include <netinet/tcp.h>
 
 static const int64_t BODY_AT_MOST = 1 << 20;    // of requests that are not uploads
 static const int64_t WORTH_READING = 256 << 10; // what is read to the end to keep a connection alive
@@ -281,6 +282,13 @@ static void on_headers(SoupServer *, SoupServerMessage *message, const char *, G
     // Of a connection that broke the message may live on for a while, but its upload must not.
     g_signal_connect(message, "finished", G_CALLBACK(+[](SoupServerMessage *m, gpointer) { put_drop(request_of(m)); }),
                      nullptr);
+
+    // A peer that vanished without a word keeps its connection, and the room of its upload, for two minutes at most.
+    GSocket *socket = soup_server_message_get_socket(message);
+    g_socket_set_keepalive(socket, TRUE);
+    g_socket_set_option(socket, IPPROTO_TCP, TCP_KEEPIDLE, 60, nullptr);
+    g_socket_set_option(socket, IPPROTO_TCP, TCP_KEEPINTVL, 15, nullptr);
+    g_socket_set_option(socket, IPPROTO_TCP, TCP_KEEPCNT, 4, nullptr);
 
     const char *path = g_uri_get_path(soup_server_message_get_uri(message));
     request->is_dav = std::strcmp(path, "/1/account/info") != 0;
