@@ -31,6 +31,26 @@ TEST(Uploads, OnlyOneTakesAFreeName)
     EXPECT_EQ(cloud.used(), 12);
 }
 
+TEST(Uploads, ObeyLocksTakenMeanwhile)
+{
+    Cloud cloud;
+    Connection upload(cloud);
+    upload.put("/dav/f", 6);
+    upload.send("one");
+    ASSERT_TRUE(comes_true([&] { return cloud.temporary_files() == 1; }));
+    const std::string body = "<lockinfo xmlns='DAV:'><lockscope><exclusive/></lockscope><locktype><write/></locktype>"
+                             "</lockinfo>";
+    const Answer lock = cloud.ask("LOCK", "/dav/f", {"Depth: 0", "Timeout: Second-1"}, body);
+    EXPECT_EQ(lock.status, 201);
+    upload.send("one");
+    EXPECT_EQ(upload.status(), 423);
+    EXPECT_EQ(read_file(cloud.file("f")), "");
+    EXPECT_EQ(cloud.ask("PUT", "/dav/f", {"If: (" + lock.header("lock-token") + ")"}, "two").status, 204);
+    EXPECT_EQ(cloud.ask("LOCK", "/dav/f", {"Depth: 0"}, body).status, 423);
+    // A lock that nobody refreshes ends.
+    EXPECT_TRUE(comes_true([&] { return cloud.ask("PUT", "/dav/f", {}, "three").status == 204; }));
+}
+
 TEST(Uploads, CutOnesLeaveNothing)
 {
     Cloud cloud({"--quota", "100K"});
@@ -87,7 +107,8 @@ TEST(Uploads, StayWithinTheQuota)
         {"MOVE", "/dav/a", "/dav/c", 0, false, 201, 100}, {"DELETE", "/dav/c", "", 0, false, 204, 40},
         {"COPY", "/dav/d/", "/dav/c", 0, false, 201, 80}, {"COPY", "/dav/d/", "/dav/c", 0, false, 204, 80},
         {"MOVE", "/dav/d/", "/dav/c", 0, false, 204, 40}, {"PUT", "/dav/c/b", "", 10, false, 204, 10},
-        {"DELETE", "/dav/c/", "", 0, false, 204, 0},
+        {"DELETE", "/dav/c/", "", 0, false, 204, 0},      {"PUT", "/dav/all", "", 100, false, 201, 100},
+        {"DELETE", "/dav/all", "", 0, false, 204, 0},
     };
     for (const auto &step : steps) {
         SCOPED_TRACE(step.method + " " + step.path + " " + std::to_string(step.kilobytes));

@@ -220,7 +220,10 @@ TEST(Service, KnowsDigests)
     // They go with the file wherever it goes.
     EXPECT_EQ(cloud.ask("MOVE", "/dav/one/", {"Destination: /dav/two"}).status, 201);
     EXPECT_EQ(cloud.ask("COPY", "/dav/two/", {"Destination: /dav/three"}).status, 201);
-    EXPECT_EQ(cloud.ask("COPY", "/dav/two/abc", {"Destination: /dav/four"}).status, 201);
+    EXPECT_EQ(cloud.ask("COPY", "/dav/two/abc", {"Destination: /dav/five"}).status, 201);
+    EXPECT_EQ(cloud.ask("PUT", "/dav/four", {}, "xyz").status, 201);
+    EXPECT_EQ(cloud.ask("MOVE", "/dav/five", {"Destination: /dav/four"}).status, 204);
+    EXPECT_EQ(cloud.ask("MOVE", "/dav/two/abc", {"Destination: /dav/two"}).status, 403); // it would end itself
     cloud.stop(SIGKILL);
     cloud.start();
     for (const char *path : {"/dav/two/abc", "/dav/three/abc", "/dav/four"}) {
@@ -234,6 +237,9 @@ TEST(Service, KnowsDigests)
     cloud.ask("MKCOL", "/dav/one/");
     cloud.ask("PUT", "/dav/one/abc", {}, "xyz");
     EXPECT_EQ(cloud.ask("PROPFIND", "/dav/one/abc", {"Depth: 0"}).body.find("urn:test"), std::string::npos);
+    fs::remove(cloud.file("three/abc"));
+    cloud.ask("PUT", "/dav/three/abc", {}, "xyz");
+    EXPECT_EQ(cloud.ask("PROPFIND", "/dav/three/abc", {"Depth: 0"}).body.find("urn:test"), std::string::npos);
 
     // Protected properties stay, and the others of the same request with them.
     const Answer refused =
