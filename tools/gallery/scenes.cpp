@@ -181,8 +181,14 @@ Evas_Object *path_add(Evas_Object *parent)
     Elm_Object_Item *item = nullptr;
     for (const char *name : {"Velora", "Dokumente", "2014", "Rechnungen &amp; Belege", "Versicherungen", "November"})
         item = elm_toolbar_item_append(path, nullptr, name, nullptr, nullptr);
-    elm_toolbar_item_bring_in(item, ELM_TOOLBAR_ITEM_SCROLLTO_LAST);
     evas_object_show(path);
+    ecore_timer_add(
+        0.1,
+        [](void *last) {
+            elm_toolbar_item_bring_in(static_cast<Elm_Object_Item *>(last), ELM_TOOLBAR_ITEM_SCROLLTO_LAST);
+            return ECORE_CALLBACK_CANCEL;
+        },
+        item);
     return path;
 }
 
@@ -268,10 +274,12 @@ void selecting(Evas_Object *win)
     words_add(frame, page, true);
 }
 
-Evas_Object *popup_add(Evas_Object *win, const char *title, const char *text)
+Evas_Object *popup_add(Evas_Object *win, const char *title, const char *text, bool fill = false)
 {
     browse(win);
     Evas_Object *popup = elm_popup_add(win);
+    if (fill)
+        elm_popup_align_set(popup, ELM_NOTIFY_ALIGN_FILL, 1.0);
     if (title)
         elm_object_part_text_set(popup, "title,text", title);
     if (text)
@@ -293,9 +301,8 @@ void popup_1(Evas_Object *win)
 
 void popup_2(Evas_Object *win)
 {
-    Evas_Object *popup =
-        popup_add(win, "Hochladen anhalten", "Das Hochladen wird angehalten, aber die Datei wird nicht gelöscht.");
-    elm_popup_align_set(popup, ELM_NOTIFY_ALIGN_FILL, 1.0);
+    Evas_Object *popup = popup_add(win, "Hochladen anhalten",
+                                   "Das Hochladen wird angehalten, aber die Datei wird nicht gelöscht.", true);
     popup_button(popup, "button1", "Abbrechen");
     popup_button(popup, "button2", "Anhalten");
 }
@@ -403,20 +410,19 @@ void state_loading(Evas_Object *win)
 void icons(Evas_Object *win)
 {
     Evas_Object *frame = frame_add(win);
-    Evas_Object *box = elm_box_add(frame);
-    elm_box_layout_set(box, evas_object_box_layout_flow_horizontal, nullptr, nullptr);
-    expand(box);
-    for (const int size : {40, 56, 96})
+    Evas_Object *table = elm_table_add(frame);
+    int cell = 0;
+    for (const int size : {40, 56})
         for (const char *name : {"folder", "images", "video", "music", "amr", "pdf", "word", "ppt", "excel", "html",
                                  "text", "vcard", "vcalender", "rss", "tpk", "snb", "hwp", "etc"}) {
-            Evas_Object *image = picture_add(box, std::string("docshelf_icon_") + name + ".png");
+            Evas_Object *image = picture_add(table, std::string("docshelf_icon_") + name + ".png");
             const int side = ELM_SCALE_SIZE(size);
             evas_object_size_hint_min_set(image, side, side);
-            evas_object_size_hint_weight_set(image, 0, 0);
-            evas_object_size_hint_padding_set(image, 2, 2, 2, 2);
-            elm_box_pack_end(box, image);
+            evas_object_size_hint_max_set(image, side, side);
+            elm_table_pack(table, image, cell % 6, cell / 6, 1, 1);
+            ++cell;
         }
-    page_add(frame, "Symbole", box);
+    page_add(frame, "Symbole", table);
 }
 
 void controls(Evas_Object *win)
