@@ -274,12 +274,14 @@ void selecting(Evas_Object *win)
     words_add(frame, page, true);
 }
 
-Evas_Object *popup_add(Evas_Object *win, const char *title, const char *text, bool fill = false)
+Evas_Object *popup_add(Evas_Object *win, const char *title, const char *text, bool fill = false, bool scroll = false)
 {
     browse(win);
     Evas_Object *popup = elm_popup_add(win);
     if (fill)
         elm_popup_align_set(popup, ELM_NOTIFY_ALIGN_FILL, 1.0);
+    if (scroll)
+        elm_popup_scrollable_set(popup, EINA_TRUE);
     if (title)
         elm_object_part_text_set(popup, "title,text", title);
     if (text)
@@ -315,14 +317,30 @@ void popup_2_plain(Evas_Object *win)
     popup_button(popup, "button2", "Konto entfernen");
 }
 
-void popup_3(Evas_Object *win)
+void popup_3_with(Evas_Object *win, bool fill, bool scroll)
 {
     Evas_Object *popup = popup_add(win, "Keine Netzwerkverbindung",
                                    "Mobile Daten sind deaktiviert. Stellen Sie eine Verbindung mit einem WLAN her oder "
-                                   "aktivieren Sie mobile Daten und versuchen Sie es noch einmal.");
+                                   "aktivieren Sie mobile Daten und versuchen Sie es noch einmal.",
+                                   fill, scroll);
     popup_button(popup, "button1", "Abbrechen");
     popup_button(popup, "button2", "WLAN");
     popup_button(popup, "button3", "Einstellungen");
+}
+
+void popup_3(Evas_Object *win)
+{
+    popup_3_with(win, false, false);
+}
+
+void popup_3_fill(Evas_Object *win)
+{
+    popup_3_with(win, true, false);
+}
+
+void popup_3_scroll(Evas_Object *win)
+{
+    popup_3_with(win, false, true);
 }
 
 void processing(Evas_Object *win)
@@ -491,6 +509,8 @@ const std::vector<Scene> &gallery_scenes()
         {"popup-2-fill", popup_2},
         {"popup-2", popup_2_plain},
         {"popup-3", popup_3},
+        {"popup-3-fill", popup_3_fill},
+        {"popup-3-scroll", popup_3_scroll},
         {"processing", processing},
         {"processing-cancel", processing_cancel},
         {"processing-text", processing_text},
