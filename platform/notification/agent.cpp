@@ -1,9 +1,9 @@
 // notification-agent: shows the notifications of the store at the session's notification daemon and acts on taps, also
 // when the program that posted one has left. It ends when nothing is left to show, or with the bus.
+#include "app/target.h"
 #include "notification/courier.h"
 #include "notification/tap.h"
 #include <algorithm>
-#include <gio/gdesktopappinfo.h>
 #include <gio/gio.h>
 #include <map>
 #include <unistd.h>
@@ -85,11 +85,8 @@ std::string body(const notification_s &noti)
 
 std::string app_name(const std::string &package)
 {
-    GDesktopAppInfo *info = g_desktop_app_info_new((package + ".desktop").c_str());
-    std::string name = info ? g_app_info_get_name(G_APP_INFO(info)) : package;
-    if (info)
-        g_object_unref(info);
-    return name;
+    const AppInfo info = desktop_entry(package);
+    return info ? g_app_info_get_name(info.get()) : package;
 }
 
 // The arguments of Notify, of the Desktop Notifications Specification 1.2.
