@@ -89,7 +89,7 @@ std::string app_name(const std::string &package)
     return info ? g_app_info_get_name(info.get()) : package;
 }
 
-// The arguments of Notify, of the Desktop Notifications Specification 1.2.
+// The arguments of Notify, as desktop notifications 1.2 have them.
 GVariant *notify_arguments(const notification_s &noti, guint32 replaces)
 {
     const bool ongoing = noti.type == NOTIFICATION_TYPE_ONGOING;
@@ -294,7 +294,7 @@ guint32 bus_number(const char *method, GVariant *arguments)
 
 bool take_name()
 {
-    enum : guint32 { DO_NOT_QUEUE = 4, PRIMARY_OWNER = 1 }; // D-Bus Specification, RequestName
+    enum : guint32 { DO_NOT_QUEUE = 4, PRIMARY_OWNER = 1 }; // as D-Bus numbers them for RequestName
     return bus_number("RequestName", g_variant_new("(su)", NOTIFICATION_AGENT, static_cast<guint32>(DO_NOT_QUEUE))) ==
            PRIMARY_OWNER;
 }
