@@ -5,12 +5,13 @@
 #include "driver.h"
 #include "fake_app.h"
 #include "fake_cloud.h"
-#include "notification/notification.h"
+#include "posted.h"
 #include "temp_home.h"
 #include "vconf/vconf.h"
 #include "velora_upload_file/upload_internal.h"
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <clocale>
 #include <cstring>
 #include <fstream>
@@ -169,18 +170,13 @@ class UploadPage : public testing::Test {
     static std::vector<std::string> notifications()
     {
         std::vector<std::string> all;
-        notification_foreach(
-            VELORA_SHARE_PACKAGE,
-            [](notification_h noti, int, void *data) {
-                char *title = nullptr, *content = nullptr;
-                notification_get_text(noti, NOTIFICATION_TEXT_TYPE_TITLE, &title);
-                notification_get_text(noti, NOTIFICATION_TEXT_TYPE_CONTENT, &content);
-                const CString owned_title(title), owned_content(content);
-                std::string text = std::string(title) + ": " + content + tail(noti);
-                static_cast<std::vector<std::string> *>(data)->push_back(text);
-                return true;
-            },
-            &all);
+        for (const Posted &one : read_posted(VELORA_SHARE_PACKAGE)) {
+            all.push_back(one.title + ": " + one.content);
+            if (one.operation == APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD_RESULT)
+                all.back() += " " + one.display_type + ":";
+            for (const std::string &path : one.paths)
+                all.back() += std::string(" ") + __last_segment(path.c_str());
+        }
         return all;
     }
     static std::string uploaded(const std::string &path)
@@ -192,26 +188,6 @@ class UploadPage : public testing::Test {
     LogCatcher log;
 
   private:
-    static std::string tail(notification_h noti)
-    {
-        bundle *text = nullptr;
-        app_control_h request = nullptr;
-        notification_get_execute_option(noti, NOTIFICATION_EXECUTE_TYPE_SINGLE_LAUNCH, &text);
-        app_control_from_bundle(text, &request);
-        char *display_type = nullptr, **paths = nullptr;
-        int count = 0;
-        app_control_get_extra_data(request, "display_type", &display_type);
-        app_control_get_extra_data_array(request, "path", &paths, &count);
-        std::string result = display_type ? std::string(" ") + display_type + ":" : "";
-        for (int i = 0; i < count; i++) {
-            result += std::string(" ") + __last_segment(paths[i]);
-            free(paths[i]);
-        }
-        free(paths);
-        free(display_type);
-        app_control_destroy(request);
-        return result;
-    }
     static void add_account()
     {
         account_h account = nullptr;

@@ -6,6 +6,7 @@
 #include "velora_common/velora_local_data.h"
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <fstream>
 #include <map>
 #include <memory>

@@ -4,6 +4,7 @@
 #include "velora_common/velora_thread.h"
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <atomic>
 #include <cstdio>
 #include <cstring>

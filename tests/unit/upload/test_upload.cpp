@@ -1,7 +1,6 @@
 // Destination names, file types and sizes, and what the notifications of an upload hold.
-#include "app/app_control.h"
 #include "fake_app.h"
-#include "notification/notification.h"
+#include "posted.h"
 #include "temp_home.h"
 #include "vconf/vconf.h"
 #include "velora_upload_file/upload_internal.h"
@@ -13,13 +12,6 @@
 namespace {
 std::vector<std::string> folder_files; // of the open folder, in the database's order
 int folder_error;                      // what the enumeration reports with each of them
-
-std::string taken(char *text)
-{
-    std::string result = text ? text : "(null)";
-    free(text);
-    return result;
-}
 } // namespace
 
 int cloud_content_sync_folder_foreach_content_from_db(cloud_content_sync_h, cloud_content_sync_folder_h,
@@ -166,78 +158,9 @@ class Notifications : public testing::Test {
         tzset();
     }
 
-    struct Posted {
-        int id = 0;
-        notification_type_e type = NOTIFICATION_TYPE_NONE;
-        int flags = 0, places = 0;
-        notification_ly_type_e layout = NOTIFICATION_LY_NONE;
-        double progress = -1;
-        std::string title, content, info, when, icon, indicator;
-        std::string operation, app_id, activate, display_type; // of the request
-        std::vector<std::string> paths;
-    };
-
-    static void read_request(notification_h noti, Posted *posted)
-    {
-        bundle *text = nullptr;
-        app_control_h request = nullptr;
-        notification_get_execute_option(noti, NOTIFICATION_EXECUTE_TYPE_SINGLE_LAUNCH, &text);
-        ASSERT_EQ(app_control_from_bundle(text, &request), APP_CONTROL_ERROR_NONE);
-        const auto extra = [request](const char *key) {
-            char *value = nullptr;
-            app_control_get_extra_data(request, key, &value);
-            return taken(value);
-        };
-        char *value = nullptr;
-        app_control_get_operation(request, &value);
-        posted->operation = taken(value);
-        value = nullptr;
-        app_control_get_app_id(request, &value);
-        posted->app_id = taken(value);
-        posted->activate = extra("operation_type");
-        posted->display_type = extra("display_type");
-        char **paths = nullptr;
-        int count = 0;
-        app_control_get_extra_data_array(request, "path", &paths, &count);
-        for (int i = 0; i < count; i++)
-            posted->paths.push_back(taken(paths[i]));
-        free(paths);
-        app_control_destroy(request);
-    }
-
-    // Everything that our package has posted.
     static std::vector<Posted> all()
     {
-        std::vector<Posted> list;
-        notification_foreach(
-            VELORA_SHARE_PACKAGE,
-            [](notification_h noti, int id, void *data) {
-                Posted posted = {.id = id};
-                notification_get_type(noti, &posted.type);
-                notification_get_property(noti, &posted.flags);
-                notification_get_display_applist(noti, &posted.places);
-                notification_get_layout(noti, &posted.layout);
-                notification_get_progress(noti, &posted.progress);
-                for (const auto &[text, to] : {std::pair{NOTIFICATION_TEXT_TYPE_TITLE, &posted.title},
-                                               {NOTIFICATION_TEXT_TYPE_CONTENT, &posted.content},
-                                               {NOTIFICATION_TEXT_TYPE_INFO_1, &posted.info},
-                                               {NOTIFICATION_TEXT_TYPE_INFO_SUB_2, &posted.when}}) {
-                    char *value = nullptr;
-                    notification_get_text(noti, text, &value);
-                    *to = taken(value);
-                }
-                for (const auto &[image, to] : {std::pair{NOTIFICATION_IMAGE_TYPE_ICON, &posted.icon},
-                                                {NOTIFICATION_IMAGE_TYPE_ICON_FOR_INDICATOR, &posted.indicator}}) {
-                    char *value = nullptr;
-                    notification_get_image(noti, image, &value);
-                    *to = std::filesystem::path(taken(value)).filename();
-                }
-                read_request(noti, &posted);
-                static_cast<std::vector<Posted> *>(data)->push_back(posted);
-                return true;
-            },
-            &list);
-        return list;
+        return read_posted(VELORA_SHARE_PACKAGE);
     }
 
     TempHome home;
@@ -263,8 +186,8 @@ TEST_F(Notifications, TheOngoingOneShowsAndFollowsTheQueue)
     EXPECT_DOUBLE_EQ(noti.progress, 0.4);
     EXPECT_EQ(noti.title, "Velora");
     EXPECT_EQ(noti.content, "2 / 5");
-    EXPECT_EQ(noti.icon, "com.orvant.velora.png");
-    EXPECT_EQ(noti.indicator, "B03_velora.png");
+    EXPECT_TRUE(noti.icon.ends_with("/res/images/com.orvant.velora.png"));
+    EXPECT_TRUE(noti.indicator.ends_with("/res/images/B03_velora.png"));
     EXPECT_EQ(noti.operation, APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD);
     EXPECT_EQ(noti.app_id, VELORA_SHARE_PACKAGE);
     EXPECT_EQ(noti.activate, "Activate");
