@@ -4,6 +4,7 @@
 //
 // Run it from the build folder's program; ELM_SCALE sets the density. It needs no display.
 #include "scenes.h"
+#include "theme/theme.h"
 #include <Ecore_Evas.h>
 #include <Elementary.h>
 #include <cstdio>
@@ -126,6 +127,7 @@ int main(int argc, char **argv)
             Evas_Object *win = elm_win_add(nullptr, "gallery", ELM_WIN_BASIC);
             evas_object_resize(win, width, height);
             evas_object_show(win);
+            platform_theme_window_watch(win);
             scene.build(win);
             run_for(0.5);
             const fs::path file = out / (std::string(scene.name) + (dark ? "-dark.png" : ".png"));
