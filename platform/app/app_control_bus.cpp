@@ -15,7 +15,7 @@ constexpr char introspection[] = R"(<node>
 </interface>
 </node>)";
 
-enum { request_name_do_not_queue = 4, request_name_exists = 3 }; // D-Bus specification, RequestName
+enum { request_name_do_not_queue = 4, request_name_exists = 3 }; // as D-Bus numbers them for RequestName
 
 struct Receiver {
     std::string id;
@@ -35,6 +35,10 @@ Receiver &receiver()
 
 void finish_launch(GDBusMethodInvocation *invocation, const app_control_s *reply, app_control_result_e result)
 {
+    if (result == RESULT_LEAVING) {
+        g_dbus_method_invocation_return_dbus_error(invocation, BUS_ERROR_LEAVING, "the application is ending");
+        return;
+    }
     GVariantDict answer;
     GVariant *record = g_variant_ref_sink(request_to_variant(reply ? *reply : app_control_s()));
     g_variant_dict_init(&answer, record);

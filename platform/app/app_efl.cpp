@@ -2,14 +2,17 @@
 #include "app/bus.h"
 #include "app/command_line.h"
 #include "app/glib_loop.h"
+#include "app/inspect.h"
 #include "app/language.h"
 #include "app/target.h"
 #include "base/base.h"
 #include <Ecore_X.h>
+#include <Efreet.h>
 #include <Elementary.h>
 #include <algorithm>
 #include <cstdio>
-#include <cstring>
+#include <deque>
+#include <unistd.h>
 
 namespace {
 constexpr double service_wait = 60.0; // seconds without a request until a program started for one gives up
@@ -19,6 +22,7 @@ struct Application {
     void *user_data = nullptr;
     bool paused = false;
     Ecore_Timer *service_timer = nullptr;
+    std::deque<std::unique_ptr<app_control_s>> queue;
     std::vector<Evas_Object *> windows;        // watched ones
     std::vector<Evas_Object *> hidden_windows; // those of them that are iconified or hidden
 };
@@ -89,9 +93,10 @@ void watch_windows()
     }
 }
 
-void handle_request(void *data)
+void handle_request(void *)
 {
-    const std::unique_ptr<app_control_s> request(static_cast<app_control_h>(data));
+    const auto request = std::move(app.queue.front());
+    app.queue.pop_front();
     g_clear_pointer(&app.service_timer, ecore_timer_del);
     follow_language();
     if (app.callbacks->app_control)
@@ -99,9 +104,12 @@ void handle_request(void *data)
     watch_windows();
 }
 
+// Requests are handled from a job: the callback may take its time or run a loop, and one that ends the application
+// finds a running loop.
 void queue_request(app_control_h request)
 {
-    ecore_job_add(handle_request, request);
+    app.queue.emplace_back(request);
+    ecore_job_add(handle_request, nullptr);
 }
 
 Eina_Bool no_request_came(void *)
@@ -134,6 +142,16 @@ bool find_display()
     return true;
 }
 
+// EFL complains at length, with traces, about each bus that is missing. That is a state of the machine, not a fault.
+void quiet_without_bus()
+{
+    const char *address = std::getenv("DBUS_SYSTEM_BUS_ADDRESS");
+    const bool system_bus = (address && *address) || access("/run/dbus/system_bus_socket", F_OK) == 0;
+    if (!system_bus || !bus_connection())
+        set_default("EINA_LOG_LEVELS", "eldbus:0,eina_safety:0,ecore_system_upower:0,ecore_system_systemd:0,"
+                                       "elementary:1");
+}
+
 struct HandedOver {
     bool known = false;
     bool print = false;
@@ -156,7 +174,8 @@ int hand_over(CommandLine &line)
     if (!line.request.app_id)
         line.request.app_id = app_get_id();
     HandedOver outcome;
-    const int sent = app_control_send_launch_request(&line.request, line.print_reply ? reply_of_first : nullptr, &outcome);
+    const int sent =
+        app_control_send_launch_request(&line.request, line.print_reply ? reply_of_first : nullptr, &outcome);
     if (sent != APP_CONTROL_ERROR_NONE) {
         std::fprintf(stderr, "%s: the running instance does not answer\n", app_get_id());
         return 1;
@@ -182,13 +201,18 @@ app_control_h first_request(const CommandLine &line)
 
 int run(const CommandLine &line, int argc, char **argv)
 {
-    if (!find_display())
+    quiet_without_bus();
+    if (!find_display()) {
+        bus_stop(0);
         return 1;
+    }
     set_default("ELM_PROFILE", "mobile");
     set_default("ELM_SCALE", "1.8");
     language_apply();
+    efreet_cache_disable(); // or each start leaves a daemon behind that indexes icons nobody here asks for
     elm_init(argc, argv);
     glib_loop_start();
+    inspect_publish();
     if (const std::string theme = platform_data_file("theme/platform.edj"); !theme.empty())
         elm_theme_overlay_add(nullptr, theme.c_str());
 
@@ -197,7 +221,6 @@ int run(const CommandLine &line, int argc, char **argv)
         std::fprintf(stderr, "%s: the application refused to start\n", app_get_id());
         status = 1;
     } else {
-        // from a job, so that a request that ends the application finds a running loop
         if (line.service)
             app.service_timer = ecore_timer_add(service_wait, no_request_came, nullptr);
         else
@@ -205,6 +228,9 @@ int run(const CommandLine &line, int argc, char **argv)
         elm_run();
         tell(app.callbacks->terminate);
     }
+    for (const auto &request : app.queue)
+        request->answer->give(nullptr, RESULT_LEAVING);
+    app.queue.clear();
     bus_stop(10);
     glib_loop_stop();
     elm_shutdown();

@@ -9,6 +9,9 @@
 #include <utility>
 #include <vector>
 
+// Told to the sender of a request that an ending application has not looked at: start it anew. No public result.
+constexpr auto RESULT_LEAVING = static_cast<app_control_result_e>(1);
+
 // The way back to a sender who may wait. One answer is given; when the last holder goes away without, it is CANCELED.
 class Answer {
   public:

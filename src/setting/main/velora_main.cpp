@@ -101,15 +101,14 @@ static bool __read_exit_key(const char *key)
     return vconf_get_bool(key, &value) == 0 && value;
 }
 
-static void __send_reply(AppData *ad)
+static void __send_reply(AppData *ad, app_control_h request)
 {
     app_control_h reply = nullptr;
     if (app_control_create(&reply) != APP_CONTROL_ERROR_NONE)
         return;
     if (ad->reply_result && app_control_add_extra_data(reply, "result", ad->reply_result) != APP_CONTROL_ERROR_NONE)
         VELORA_LOGE("app_control_add_extra_data failed");
-    if (app_control_reply_to_launch_request(reply, ad->app_control, APP_CONTROL_RESULT_SUCCEEDED) !=
-        APP_CONTROL_ERROR_NONE)
+    if (app_control_reply_to_launch_request(reply, request, APP_CONTROL_RESULT_SUCCEEDED) != APP_CONTROL_ERROR_NONE)
         VELORA_LOGE("app_control_reply_to_launch_request failed");
     app_control_destroy(reply);
 }
@@ -139,7 +138,10 @@ void _velora_app_exit(AppData *ad)
     }
     const bool is_settings_waiting = __read_exit_key("db/private/ug-setting-cloud/is_exist");
     if (ad->app_control && (ad->is_share || is_settings_waiting || ad->launch_mode == LAUNCH_MODE_SETUP_WIZARD))
-        __send_reply(ad);
+        __send_reply(ad, ad->app_control);
+    for (GList *entry = ad->earlier_shares; entry; entry = entry->next)
+        __send_reply(ad, static_cast<app_control_h>(entry->data));
+    _velora_upload_view_end(); // only when something other than the view itself asked to leave
 
     __delete_object(&ad->popup);
     if (ad->pipe)
@@ -167,6 +169,9 @@ void _velora_app_exit(AppData *ad)
     if (ad->app_control)
         app_control_destroy(ad->app_control);
     ad->app_control = nullptr;
+    g_list_free_full(ad->earlier_shares,
+                     [](gpointer request) { app_control_destroy(static_cast<app_control_h>(request)); });
+    ad->earlier_shares = nullptr;
     _velora_upload_list_free(&ad->upload_list);
     std::free(ad->folder_path);
     ad->folder_path = nullptr;
@@ -388,12 +393,15 @@ static void __velora_app_reset(app_control_h request, void *data)
         VELORA_LOGE("ad is NULL");
         return;
     }
+    const bool was_share = ad->is_share;
     ad->exit_on_pause = 0;
     ad->is_share = false;
     __build_window_once(ad, __read_launch_mode(request));
     __set_theme(ad);
 
-    if (ad->app_control)
+    if (ad->app_control && was_share) // its sender still waits for the answer that every share gets
+        ad->earlier_shares = g_list_append(ad->earlier_shares, ad->app_control);
+    else if (ad->app_control)
         app_control_destroy(ad->app_control);
     ad->app_control = nullptr;
     app_control_clone(&ad->app_control, request);
@@ -423,6 +431,7 @@ int main(int argc, char **argv)
     g_type_init();
     G_GNUC_END_IGNORE_DEPRECATIONS
     app_set_id(VELORA_PACKAGE);
+    app_add_alias(VELORA_SHARE_PACKAGE);
     __bind_catalogues();
     app_event_callback_s lifecycle = {};
     lifecycle.create = __velora_app_create;

@@ -61,6 +61,7 @@ struct AppData {
     char **result_paths = nullptr;
     int result_path_count = 0;
     char *display_type = nullptr;
+    GList *earlier_shares = nullptr; // clones of shares that a later request came after; answered at exit
 };
 
 // Leaves the application: replies to the launch request when its sender expects an answer, deletes popup, pipe, cloud
