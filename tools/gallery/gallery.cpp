@@ -2,7 +2,7 @@
 //
 //   gallery OUTDIR [WIDTH HEIGHT [TEXT_PERCENT]]
 //
-// Run it from the build folder's program; ELM_SCALE sets the density. It needs no display.
+// ELM_SCALE sets the density. It needs no display. It fails when a theme lacks what a scene asks for.
 #include "scenes.h"
 #include "theme/theme.h"
 #include <Ecore_Evas.h>
@@ -140,5 +140,5 @@ int main(int argc, char **argv)
         }
     }
     elm_shutdown();
-    return failed ? 1 : 0;
+    return failed || gallery_missing ? 1 : 0;
 }
