@@ -129,7 +129,7 @@ int main(int argc, char **argv)
             evas_object_show(win);
             platform_theme_window_watch(win);
             scene.build(win);
-            run_for(0.5);
+            run_for(1.0);
             const fs::path file = out / (std::string(scene.name) + (dark ? "-dark.png" : ".png"));
             if (!save(win, file)) {
                 fprintf(stderr, "cannot save %s\n", file.c_str());
