@@ -3,6 +3,7 @@
 #include <string>
 
 struct app_bundle {
+    // A dictionary a{sv} in GVariant's text format. It is plain ASCII without NUL: other bytes are escaped.
     std::string text;
 };
 typedef app_bundle bundle;

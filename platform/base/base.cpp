@@ -1,5 +1,10 @@
 #include "base/base.h"
+#include <atomic>
 #include <filesystem>
+#include <fstream>
+#include <map>
+#include <mutex>
+#include <set>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -32,6 +37,59 @@ std::string platform_data_file(const std::string &name)
     if (const fs::path file = fs::path("/usr/share/orvant-platform") / name; fs::exists(file, failed))
         return file;
     return {};
+}
+
+static std::atomic<const char *> package{""};
+
+const char *platform_package()
+{
+    return package;
+}
+
+void platform_package_set(const char *name)
+{
+    // Texts are kept, because a reader in another thread may still hold an earlier one.
+    static std::mutex lock;
+    static std::set<std::string> names;
+    const std::lock_guard hold(lock);
+    package = names.insert(name ? name : "").first->c_str();
+}
+
+const std::string &platform_boot_id()
+{
+    static const std::string id = [] {
+        std::string line;
+        std::ifstream file("/proc/sys/kernel/random/boot_id");
+        std::getline(file, line);
+        return line;
+    }();
+    return id;
+}
+
+Db *platform_thread_db(const char *name, const char *schema)
+{
+    struct Connection {
+        Db db;
+        std::string path;
+        struct stat file = {};
+        pid_t process = 0;
+    };
+    static thread_local std::map<std::string, Connection> connections;
+    Connection &c = connections[name];
+    const std::string path = platform_data_dir() + "/" + name;
+    struct stat now = {};
+    const bool there = ::stat(path.c_str(), &now) == 0;
+    if (c.db && there && c.process == getpid() && c.path == path && c.file.st_ino == now.st_ino &&
+        c.file.st_dev == now.st_dev)
+        return &c.db;
+    if (c.db && c.process != getpid())
+        (void)c.db.handle.release(); // closing it here would drop the locks of the process it belongs to
+    c.db.handle.reset();
+    if (!c.db.open(path, schema) || ::stat(path.c_str(), &c.file) != 0)
+        return nullptr;
+    c.path = path;
+    c.process = getpid();
+    return &c.db;
 }
 
 bool Db::open(const std::string &path, const char *schema)

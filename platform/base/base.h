@@ -15,6 +15,15 @@ std::string platform_data_dir();
 // it; then /usr/share/orvant-platform. Empty when there is none. Any thread.
 std::string platform_data_file(const std::string &name);
 
+// The package under which this process owns accounts and notifications; "" until it was set. platform_package_set
+// copies its argument (null counts as ""). Any thread; the text of platform_package stays valid until the process ends.
+const char *platform_package();
+void platform_package_set(const char *package);
+
+// Names the current start of the machine, the kernel's boot_id; records that last until the next start carry it.
+// Any thread.
+const std::string &platform_boot_id();
+
 struct CFree {
     void operator()(void *p) const
     {
@@ -43,6 +52,12 @@ struct Db {
         return handle != nullptr;
     }
 };
+
+// The calling thread's connection to the database `name` in platform_data_dir(), opened when first asked for and closed
+// when the thread ends. It follows the file: after a change of folder, a deleted file or a fork it is opened afresh.
+// Null when the database cannot be opened. `name` and `schema` must be constants; the connection must not leave the
+// thread.
+Db *platform_thread_db(const char *name, const char *schema);
 
 // A prepared statement. Parameters count from 1, columns from 0; texts are copied by bind.
 struct Stmt {

@@ -1,0 +1,243 @@
+#include "assist/assist.h"
+#include "base/base.h"
+#include "vconf/vconf.h"
+#include <Elementary.h>
+#include <array>
+#include <cstring>
+#include <gio/gio.h>
+#include <string>
+#include <vector>
+
+using Color = std::array<int, 4>;
+
+struct ea_theme_color_table_s {
+    struct Entry {
+        std::string name;
+        Color light, dark;
+    };
+    std::vector<Entry> entries;
+};
+
+struct ea_theme_font_table_s {
+    struct Entry {
+        std::string name, font;
+        int size;
+    };
+    std::vector<Entry> entries;
+};
+
+namespace {
+bool enabled = false;
+
+bool parse(const char *text, std::string &value)
+{
+    value = text;
+    return *text != '\0';
+}
+
+bool parse(const char *text, Color &color)
+{
+    const size_t length = std::strlen(text);
+    if (text[0] != '#' || (length != 7 && length != 9) || std::strspn(text + 1, "0123456789abcdefABCDEF") != length - 1)
+        return false;
+    color[3] = 255;
+    for (size_t i = 0; 1 + 2 * i < length; i++)
+        color[i] = g_ascii_xdigit_value(text[1 + 2 * i]) * 16 + g_ascii_xdigit_value(text[2 + 2 * i]);
+    return true;
+}
+
+bool parse(const char *text, int &size)
+{
+    guint64 number = 0;
+    const bool good = g_ascii_string_to_unsigned(text, 10, 1, 1000, &number, nullptr);
+    size = static_cast<int>(number);
+    return good;
+}
+
+bool fill(ea_theme_color_table_s::Entry &entry, const std::string &attribute, const char *value)
+{
+    return attribute == "class"   ? parse(value, entry.name)
+           : attribute == "light" ? parse(value, entry.light)
+                                  : attribute == "dark" && parse(value, entry.dark);
+}
+
+bool fill(ea_theme_font_table_s::Entry &entry, const std::string &attribute, const char *value)
+{
+    return attribute == "class"  ? parse(value, entry.name)
+           : attribute == "font" ? parse(value, entry.font)
+                                 : attribute == "size" && parse(value, entry.size);
+}
+
+constexpr const char *outer_element(const ea_theme_color_table_s *)
+{
+    return "colors";
+}
+
+constexpr const char *outer_element(const ea_theme_font_table_s *)
+{
+    return "fonts";
+}
+
+template <class Table>
+void element(GMarkupParseContext *context, const char *name, const char **attributes, const char **values,
+             gpointer data, GError **error)
+{
+    auto *table = static_cast<Table *>(data);
+    const std::string outer = outer_element(table);
+    const GSList *stack = g_markup_parse_context_get_element_stack(context);
+    if (!stack->next && name == outer)
+        return;
+    typename Table::Entry entry{};
+    int filled = 0; // Markup has refused repeated attributes
+    bool good = stack->next && !stack->next->next && outer.compare(0, outer.size() - 1, name) == 0;
+    for (; good && *attributes; attributes++, values++, filled++)
+        good = fill(entry, *attributes, *values);
+    if (good && filled == 3)
+        table->entries.push_back(std::move(entry));
+    else
+        g_set_error(error, G_MARKUP_ERROR, G_MARKUP_ERROR_INVALID_CONTENT, "element %s is not as it should be", name);
+}
+
+template <class Table> Table *read_table(const char *path)
+{
+    if (!path)
+        return nullptr;
+    static const GMarkupParser parser = {element<Table>, nullptr, nullptr, nullptr, nullptr};
+    auto table = std::make_unique<Table>();
+    char *text = nullptr;
+    gsize length = 0;
+    GError *error = nullptr;
+    GMarkupParseContext *context =
+        g_markup_parse_context_new(&parser, G_MARKUP_PREFIX_ERROR_POSITION, table.get(), nullptr);
+    const bool good = g_file_get_contents(path, &text, &length, &error) &&
+                      g_markup_parse_context_parse(context, text, static_cast<gssize>(length), &error) &&
+                      g_markup_parse_context_end_parse(context, &error);
+    g_markup_parse_context_free(context);
+    g_free(text);
+    if (good)
+        return table.release();
+    g_warning("%s: %s", path, error->message);
+    g_error_free(error);
+    return nullptr;
+}
+
+bool dark_chosen()
+{
+    if (const char *name = g_getenv("ORVANT_THEME"); name && *name)
+        return std::strcmp(name, "dark") == 0;
+    int dark = 0;
+    return vconf_get_bool("db/setting/theme_dark", &dark) == 0 && dark;
+}
+
+bool screen_reader_on()
+{
+    GDBusConnection *bus = g_bus_get_sync(G_BUS_TYPE_SESSION, nullptr, nullptr);
+    if (!bus)
+        return false;
+    gboolean on = FALSE;
+    GVariant *reply =
+        g_dbus_connection_call_sync(bus, "org.a11y.Bus", "/org/a11y/bus", "org.freedesktop.DBus.Properties", "Get",
+                                    g_variant_new("(ss)", "org.a11y.Status", "ScreenReaderEnabled"),
+                                    G_VARIANT_TYPE("(v)"), G_DBUS_CALL_FLAGS_NO_AUTO_START, 1000, nullptr, nullptr);
+    if (reply) {
+        GVariant *value = nullptr;
+        g_variant_get(reply, "(v)", &value);
+        on = g_variant_is_of_type(value, G_VARIANT_TYPE_BOOLEAN) && g_variant_get_boolean(value);
+        g_variant_unref(value);
+        g_variant_unref(reply);
+    }
+    g_object_unref(bus);
+    return on;
+}
+} // namespace
+
+void ea_screen_reader_support_set(Evas_Object *win, bool supported)
+{
+    if (win && supported && screen_reader_on())
+        elm_config_atspi_mode_set(EINA_TRUE);
+}
+
+void ea_theme_changeable_ui_enabled_set(bool on)
+{
+    enabled = on;
+}
+
+ea_theme_color_table_h ea_theme_color_table_new(const char *path)
+{
+    return read_table<ea_theme_color_table_s>(path);
+}
+
+void ea_theme_color_table_free(ea_theme_color_table_h table)
+{
+    delete table;
+}
+
+void ea_theme_colors_set(ea_theme_color_table_h table, int style)
+{
+    if (!table || !enabled)
+        return;
+    const bool dark = style == 1 || dark_chosen();
+    for (const auto &entry : table->entries) {
+        const auto &[r, g, b, a] = dark ? entry.dark : entry.light;
+        edje_color_class_set(entry.name.c_str(), r, g, b, a, r, g, b, a, r, g, b, a);
+    }
+}
+
+void ea_theme_colors_unset(ea_theme_color_table_h table, int)
+{
+    if (!table)
+        return;
+    for (const auto &entry : table->entries)
+        edje_color_class_del(entry.name.c_str());
+}
+
+ea_theme_font_table_h ea_theme_font_table_new(const char *path)
+{
+    return read_table<ea_theme_font_table_s>(path);
+}
+
+void ea_theme_font_table_free(ea_theme_font_table_h table)
+{
+    delete table;
+}
+
+void ea_theme_fonts_set(ea_theme_font_table_h table)
+{
+    if (!table || !enabled)
+        return;
+    for (const auto &entry : table->entries)
+        edje_text_class_set(entry.name.c_str(), entry.font.c_str(), entry.size);
+}
+
+bool ea_theme_color_get(const char *color_class, int *r, int *g, int *b, int *a)
+{
+    if (!color_class || !r || !g || !b || !a)
+        return false;
+    int unused[8];
+    if (edje_color_class_get(color_class, r, g, b, a, unused, unused + 1, unused + 2, unused + 3, unused + 4,
+                             unused + 5, unused + 6, unused + 7))
+        return true;
+    *r = *g = *b = *a = 255;
+    return false;
+}
+
+bool ea_theme_font_get(const char *font_class, char **font, int *size)
+{
+    if (!font_class || !font || !size)
+        return false;
+    const char *name = nullptr;
+    Evas_Font_Size value = 0;
+    const bool found = edje_text_class_get(font_class, &name, &value) && name;
+    *font = found ? strdup(name) : nullptr;
+    *size = found ? value : 0;
+    return found;
+}
+
+void ea_theme_object_color_set(Evas_Object *obj, const char *color_class)
+{
+    int r = 0, g = 0, b = 0, a = 0;
+    if (!obj || !ea_theme_color_get(color_class, &r, &g, &b, &a))
+        return;
+    evas_color_argb_premul(a, &r, &g, &b);
+    evas_object_color_set(obj, r, g, b, a);
+}
