@@ -5,6 +5,7 @@
 #include <Efreet.h>
 #include <strings.h>
 #include <unistd.h>
+#include <utility>
 
 namespace {
 bool exited = false;

@@ -1,6 +1,7 @@
 // A small application for the contract tests: what it does with a request is in the request's operation.
 #include "app/app.h"
 #include <Elementary.h>
+#include <clocale>
 #include <cstdio>
 #include <string>
 #include <unistd.h>
@@ -49,6 +50,14 @@ void reset(app_control_h request, void *)
     }
     if (operation.ends_with("/echo") || operation.ends_with("share"))
         echo(request, request);
+    if (operation.ends_with("/language-and-leave")) {
+        app_control_h reply = nullptr;
+        app_control_create(&reply);
+        app_control_add_extra_data(reply, "list", getenv("LANGUAGE"));
+        app_control_add_extra_data(reply, "messages", setlocale(LC_MESSAGES, nullptr));
+        app_control_reply_to_launch_request(reply, request, APP_CONTROL_RESULT_SUCCEEDED);
+        app_control_destroy(reply);
+    }
     if (operation.ends_with("/fail"))
         app_control_reply_to_launch_request(nullptr, request, APP_CONTROL_RESULT_FAILED);
     if (operation.ends_with("/keep"))
