@@ -93,7 +93,8 @@ struct Program {
     std::string output, errors;
 };
 
-Program run_program(std::vector<std::string> words, const std::vector<std::pair<std::string, std::string>> &variables = {})
+Program run_program(std::vector<std::string> words,
+                    const std::vector<std::pair<std::string, std::string>> &variables = {})
 {
     char **environment = g_get_environ();
     for (const auto &[name, value] : variables)
