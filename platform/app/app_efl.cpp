@@ -2,6 +2,7 @@
 #include "app/bus.h"
 #include "app/command_line.h"
 #include "app/glib_loop.h"
+#include "app/inspect.h"
 #include "app/language.h"
 #include "app/target.h"
 #include "base/base.h"
@@ -211,6 +212,7 @@ int run(const CommandLine &line, int argc, char **argv)
     efreet_cache_disable(); // or each start leaves a daemon behind that indexes icons nobody here asks for
     elm_init(argc, argv);
     glib_loop_start();
+    inspect_publish();
     if (const std::string theme = platform_data_file("theme/platform.edj"); !theme.empty())
         elm_theme_overlay_add(nullptr, theme.c_str());
 

@@ -1,5 +1,21 @@
 #pragma once
 // The client of a cloud storage service: the account's folder tree in a local database, and transfers.
+//
+// The service is a WebDAV server (RFC 4918). It is found by its name in a description file, see README.md here.
+//
+// Threads. Every function may be called from any thread, also from within a callback. Transfer and refresh callbacks
+// run on the client's own thread, one per handle and one callback at a time; folder and content callbacks run on the
+// caller's thread, before the function returns. A callback that waits holds up the client's other transfers.
+//
+// Results. Functions answer one of cloud_content_sync_error_e; output arguments are written only when it is 0. What
+// can only be known later, a missing account included, is reported by the callback.
+//
+// Ownership. Strings given to the client are borrowed until the function returns. Strings it gives (char **) are the
+// caller's to free(). Folder and content handles that a function gives are the caller's to destroy; they stay usable
+// after the client's handle is destroyed.
+//
+// Names are bytes as the service has them: UTF-8 as a rule, but nothing forbids others. Server paths begin with "/",
+// are not percent-encoded, and do not end in "/" but for the root.
 
 typedef struct cloud_content_sync_s *cloud_content_sync_h;
 typedef struct cloud_content_sync_folder_s *cloud_content_sync_folder_h;
@@ -22,7 +38,7 @@ enum cloud_content_sync_error_e {
     CLOUD_CONTENT_SYNC_ERROR_BAD_NAME = 27,      // the service cannot store a file of this name
     CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED = 28, // the local file changed while it was sent
 };
-// States of a transfer and of a refresh.
+// States of a transfer and of a refresh. Callbacks bring RUNNING, DONE and FAILED; what is queued is silent.
 enum cloud_content_sync_state_e {
     CLOUD_CONTENT_SYNC_STATE_QUEUED = 1,
     CLOUD_CONTENT_SYNC_STATE_RUNNING = 2,
@@ -36,32 +52,51 @@ enum cloud_content_sync_content_type_e {
     CLOUD_CONTENT_TYPE_CAMERA = 4
 };
 
+// state: RUNNING any number of times, with `progress` 0 to 100 in percent of the bytes sent, which never goes back;
+// then exactly once DONE (progress 100) or FAILED (error not 0). file_count is 1. Client thread.
 typedef void (*cloud_content_sync_transfer_cb)(int state, int file_count, int progress, int error, void *user_data);
+// status: exactly once DONE, or FAILED with an error that is not 0. Client thread.
 typedef void (*cloud_content_sync_refresh_cb)(int status, int error, void *user_data);
-// Return true to go on with the next one. The handle is the library's; clone it to keep it.
+// Return true to go on with the next one. The handle is the library's; clone it to keep it. error is 0.
 typedef bool (*cloud_content_sync_folder_cb)(cloud_content_sync_folder_h folder, int error, void *user_data);
 typedef bool (*cloud_content_sync_content_cb)(cloud_content_sync_content_h content, int error, void *user_data);
 
+// Opens a client of the service; nothing is sent. NO_SERVICE without a usable description, DB_FAILED when the service's
+// database cannot be opened. Nobody needs to be signed in: requests then fail with NO_ACCOUNT.
 int cloud_content_sync_create(const char *service_name, cloud_content_sync_h *handle);
+// Ends all requests and frees the handle. No callback runs any more on return: one that is running is waited for,
+// unless this is called from within it. Transfers in progress are broken off by closing their connection.
 int cloud_content_sync_destroy(cloud_content_sync_h handle);
 
+// Whether a content type (one of IMAGE, VIDEO, CAMERA) is to be kept in step; kept in the service's database, at first
+// true.
 int cloud_content_sync_setting_get_type_activation(cloud_content_sync_h handle, int content_type, bool *value);
 int cloud_content_sync_setting_set_type_activation(cloud_content_sync_h handle, int content_type, bool value);
 
+// Fetches the account's whole tree and puts it in the place of what the database held; a refresh that fails changes
+// nothing. content_types: a sum of content types, not 0; folders and files of every type are fetched whatever it is. cb
+// may be null. Refreshes asked for while one runs are answered together by a second one. NO_ACCOUNT, NETWORK,
+// UNAUTHORIZED, SERVER, FORBIDDEN and DB_FAILED are reported by the callback.
 int cloud_content_sync_refresh_meta(cloud_content_sync_h handle, int content_types, cloud_content_sync_refresh_cb cb,
                                     void *user_data);
 // Whether the database already holds one whole refresh of the signed-in account.
 int cloud_content_sync_get_is_meta_complete(cloud_content_sync_h handle, bool *complete);
 
+// The root: path "/", named as the service. It is there before the first refresh as well.
 int cloud_content_sync_folder_get_root(cloud_content_sync_h handle, cloud_content_sync_folder_h *folder);
+// A folder of the database; a final "/" of the path is ignored. NOT_FOUND when there is none, INVALID_PARAMETER when
+// the path is not absolute or has an empty, "." or ".." segment.
 int cloud_content_sync_get_folder_by_server_path(cloud_content_sync_h handle, const char *path,
                                                  cloud_content_sync_folder_h *folder);
+// NOT_FOUND for the root, and when the parent is gone from the database.
 int cloud_content_sync_folder_get_parent(cloud_content_sync_folder_h folder, cloud_content_sync_folder_h *parent);
 int cloud_content_sync_folder_clone(cloud_content_sync_folder_h *copy, cloud_content_sync_folder_h folder);
 int cloud_content_sync_folder_destroy(cloud_content_sync_folder_h folder);
 int cloud_content_sync_folder_get_path(cloud_content_sync_folder_h folder, char **path);
 int cloud_content_sync_folder_get_name(cloud_content_sync_folder_h folder, char **name);
-// handle may be null: the folder knows its account.
+// One call per folder, or file, that the database holds directly below `folder`. The order is that of the names: case
+// and accents count little, numbers count by their value ("img2" before "img10"), and it is the same in every locale.
+// handle may be null: the folder knows its account. NOT_FOUND when the folder is gone from the database.
 int cloud_content_sync_folder_foreach_children_folder(cloud_content_sync_h handle, cloud_content_sync_folder_h folder,
                                                       cloud_content_sync_folder_cb cb, void *user_data);
 int cloud_content_sync_folder_foreach_content_from_db(cloud_content_sync_h handle, cloud_content_sync_folder_h folder,
@@ -69,17 +104,41 @@ int cloud_content_sync_folder_foreach_content_from_db(cloud_content_sync_h handl
 int cloud_content_sync_content_clone(cloud_content_sync_content_h *copy, cloud_content_sync_content_h content);
 int cloud_content_sync_content_destroy(cloud_content_sync_content_h content);
 int cloud_content_sync_content_get_name(cloud_content_sync_content_h content, char **name);
+// In bytes.
 int cloud_content_sync_content_get_size(cloud_content_sync_content_h content, long long *size);
+// IMAGE, VIDEO or NONE, by the extension of the name.
 int cloud_content_sync_content_get_content_type(cloud_content_sync_content_h content, int *type);
+// Always false and NOT_FOUND: thumbnails are not fetched.
 int cloud_content_sync_content_get_is_thumbnail_exist(cloud_content_sync_content_h content, bool *exists);
 int cloud_content_sync_content_get_thumbnail_path(cloud_content_sync_content_h content, char **path);
 
+// Stores a local file at server_path, whose folder must exist. Returns at once; *req_id (above 0) is written before the
+// first callback. Uploads of one handle run one after the other, in the order in which they were asked for.
+//
+// Nothing is ever overwritten: when the name is taken, by a file or a folder, the next free one is used ("a.jpg",
+// "a(1).jpg", "a(2).jpg"; "README", "README(1)"). DONE means that the service holds a file of the same size and
+// SHA-256; a service that offers no digests has the file read back. An answer that is lost is settled by looking, not
+// by sending again; one more attempt follows when nothing is there. The file is in the database before the last
+// callback.
+//
+// cb may be null. A null or empty argument answers INVALID_PARAMETER and there is no request; all else is reported by
+// the callback: NO_ACCOUNT, LOCAL_FILE, BAD_NAME (also for a server_path that is not absolute or has an empty, "." or
+// ".." segment), FORBIDDEN (also when the folder does not exist), STORAGE_FULL, CORRUPTED, UNAUTHORIZED, SERVER,
+// NETWORK (also when nothing moves for a minute, or no answer comes for five minutes after the last byte), and
+// LOCAL_CHANGED: what was stored of the changed file is then removed.
 int cloud_content_sync_upload(cloud_content_sync_h handle, const char *local_path, const char *server_path, int *req_id,
                               cloud_content_sync_transfer_cb cb, void *user_data);
-// Where a finished upload really landed (it may be the next free name). Known until the handle is destroyed.
+// Where a finished upload really landed (it may be the next free name). Known until the handle is destroyed, and within
+// the last callback already; NOT_FOUND for a request that has not succeeded.
 int cloud_content_sync_get_uploaded_path(cloud_content_sync_h handle, int req_id, char **server_path);
+// Ends a queued or running upload, which then has no last callback. No callback of it runs any more on return: one that
+// is running is waited for, unless this is called from within it. What it has stored so far is removed. NOT_FOUND
+// when there is no such request or it has had its last callback.
 int cloud_content_sync_cancel(cloud_content_sync_h handle, int req_id);
 
 // The credentials by which the device's user is known to a service, as a sign-in or a set-up tool leaves them.
-// user null: bearer token in secret; otherwise HTTP Basic.
+// user null: bearer token in secret (RFC 6750); otherwise HTTP Basic (RFC 7617). secret null: nobody is signed in any
+// more. They are kept in a file that its owner alone can read, and sent to the service's storage alone. Requests that
+// begin later use them. What the database holds of another account is removed. INVALID_PARAMETER for an empty user or
+// secret, for control characters, and for a user with a colon; NO_SERVICE; DB_FAILED when they cannot be stored.
 int cloud_content_sync_credentials_set(const char *service_name, const char *user, const char *secret);

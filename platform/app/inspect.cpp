@@ -1,0 +1,104 @@
+#include "app/inspect.h"
+#include "app/bus.h"
+#include <Elementary.h>
+#include <cstdlib>
+#include <cstring>
+#include <gio/gio.h>
+
+namespace {
+constexpr char interface_xml[] = "<node><interface name='com.orvant.Inspect'>"
+                                 "<method name='Visible'><arg type='a(ssiiii)' direction='out'/></method>"
+                                 "</interface></node>";
+
+struct Walk {
+    GVariantBuilder *out = nullptr;
+    int x = 0, y = 0; // of the window on the screen
+};
+
+bool is_in_sight(const Evas_Object *obj, Eina_Rectangle *place)
+{
+    int r = 0, g = 0, b = 0, a = 0;
+    evas_object_color_get(obj, &r, &g, &b, &a);
+    if (!evas_object_visible_get(obj) || a == 0)
+        return false;
+    evas_object_geometry_get(obj, &place->x, &place->y, &place->w, &place->h);
+    Eina_Rectangle seen = *place;
+    for (const Evas_Object *clip = evas_object_clip_get(obj); clip; clip = evas_object_clip_get(clip)) {
+        Eina_Rectangle area = {};
+        evas_object_geometry_get(clip, &area.x, &area.y, &area.w, &area.h);
+        evas_object_color_get(clip, &r, &g, &b, &a);
+        if (!evas_object_visible_get(clip) || a == 0 || !eina_rectangle_intersection(&seen, &area))
+            return false;
+    }
+    Eina_Rectangle canvas = {};
+    evas_output_size_get(evas_object_evas_get(obj), &canvas.w, &canvas.h);
+    return eina_rectangle_intersection(&seen, &canvas) && seen.w > 0 && seen.h > 0;
+}
+
+void add(const Walk &walk, const char *kind, const char *text, const Eina_Rectangle &place)
+{
+    if (text && *text && g_utf8_validate(text, -1, nullptr))
+        g_variant_builder_add(walk.out, "(ssiiii)", kind, text, walk.x + place.x, walk.y + place.y, place.w, place.h);
+}
+
+void add_markup(const Walk &walk, const char *kind, const char *markup, const Eina_Rectangle &place)
+{
+    if (!markup)
+        return;
+    char *text = evas_textblock_text_markup_to_utf8(nullptr, markup);
+    add(walk, kind, text, place);
+    std::free(text);
+}
+
+void visit(const Walk &walk, Evas_Object *obj)
+{
+    Eina_Rectangle place = {};
+    if (!is_in_sight(obj, &place))
+        return;
+    const char *type = evas_object_type_get(obj);
+    if (std::strcmp(type, "text") == 0)
+        add(walk, "text", evas_object_text_text_get(obj), place);
+    else if (std::strcmp(type, "textblock") == 0)
+        add_markup(walk, "text", evas_object_textblock_text_markup_get(obj), place);
+    else if (elm_object_widget_check(obj) && std::strcmp(elm_object_widget_type_get(obj), "Elm_Button") == 0)
+        add_markup(walk, "Elm_Button", elm_object_text_get(obj), place);
+    for (const char *leaf : {"rectangle", "image", "text", "textblock", "line", "polygon", "vectors", "textgrid"})
+        if (std::strcmp(type, leaf) == 0)
+            return;
+    Eina_List *members = evas_object_smart_members_get(obj);
+    void *member = nullptr;
+    EINA_LIST_FREE(members, member)
+    visit(walk, static_cast<Evas_Object *>(member));
+}
+
+void answer(GDBusConnection *, const gchar *, const gchar *, const gchar *, const gchar *, GVariant *,
+            GDBusMethodInvocation *invocation, gpointer)
+{
+    GVariantBuilder out;
+    g_variant_builder_init(&out, G_VARIANT_TYPE("a(ssiiii)"));
+    Eina_List *windows = ecore_evas_ecore_evas_list_get();
+    void *window = nullptr;
+    EINA_LIST_FREE(windows, window)
+    {
+        auto *ee = static_cast<Ecore_Evas *>(window);
+        Walk walk = {.out = &out};
+        ecore_evas_geometry_get(ee, &walk.x, &walk.y, nullptr, nullptr);
+        for (Evas_Object *obj = evas_object_bottom_get(ecore_evas_get(ee)); obj; obj = evas_object_above_get(obj))
+            visit(walk, obj);
+    }
+    g_dbus_method_invocation_return_value(invocation, g_variant_new("(a(ssiiii))", &out));
+}
+
+const GDBusInterfaceVTable methods = {answer, nullptr, nullptr, {}};
+} // namespace
+
+void inspect_publish()
+{
+    GDBusConnection *bus = bus_connection();
+    if (!std::getenv("ORVANT_INSPECT") || !bus)
+        return;
+    GDBusNodeInfo *node = g_dbus_node_info_new_for_xml(interface_xml, nullptr);
+    g_dbus_connection_register_object(bus, "/com/orvant/Inspect", node->interfaces[0], &methods, nullptr, nullptr,
+                                      nullptr);
+    g_dbus_node_info_unref(node);
+}

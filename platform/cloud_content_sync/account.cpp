@@ -1,0 +1,143 @@
+#include "cloud_content_sync/account.h"
+#include "cloud_content_sync/names.h"
+#include "cloud_content_sync/service.h"
+#include <sys/stat.h>
+#include <unordered_set>
+
+namespace cloud {
+
+static constexpr char SCHEMA[] = R"(
+CREATE TABLE IF NOT EXISTS setting(key TEXT PRIMARY KEY, value TEXT NOT NULL) WITHOUT ROWID;
+CREATE TABLE IF NOT EXISTS folder(path TEXT PRIMARY KEY, parent TEXT NOT NULL, name TEXT NOT NULL,
+    sort TEXT NOT NULL) WITHOUT ROWID;
+CREATE INDEX IF NOT EXISTS folder_order ON folder(parent, sort, name);
+CREATE TABLE IF NOT EXISTS content(parent TEXT NOT NULL, name TEXT NOT NULL, sort TEXT NOT NULL, size INTEGER NOT NULL,
+    mtime INTEGER NOT NULL, etag TEXT NOT NULL, PRIMARY KEY(parent, name)) WITHOUT ROWID;
+CREATE INDEX IF NOT EXISTS content_order ON content(parent, sort, name);
+)";
+static constexpr char INSERT_CONTENT[] =
+    "INSERT OR REPLACE INTO content(parent, name, sort, size, mtime, etag) VALUES(?, ?, ?, ?, ?, ?)";
+
+Account::Account(std::string service_name) : service(std::move(service_name)) {}
+
+bool Account::open()
+{
+    const std::string path = cloud_data_dir() + "/" + service + ".db";
+    std::scoped_lock lock(reading, writing);
+    return writer.open(path, SCHEMA) && chmod(path.c_str(), 0600) == 0 && reader.open(path, nullptr);
+}
+
+bool Account::folder_exists(const std::string &path)
+{
+    if (path == "/")
+        return true;
+    std::scoped_lock lock(reading);
+    return Stmt(reader, "SELECT 1 FROM folder WHERE path = ?").bind(1, path).row();
+}
+
+std::vector<FolderRow> Account::folders_of(const std::string &parent)
+{
+    std::scoped_lock lock(reading);
+    std::vector<FolderRow> rows;
+    Stmt stmt(reader, "SELECT path, name FROM folder WHERE parent = ? ORDER BY sort, name");
+    stmt.bind(1, parent);
+    while (stmt.row())
+        rows.push_back({stmt.text(0), stmt.text(1)});
+    return rows;
+}
+
+std::vector<ContentRow> Account::contents_of(const std::string &parent)
+{
+    std::scoped_lock lock(reading);
+    std::vector<ContentRow> rows;
+    Stmt stmt(reader, "SELECT name, size, mtime, etag FROM content WHERE parent = ? ORDER BY sort, name");
+    stmt.bind(1, parent);
+    while (stmt.row())
+        rows.push_back({parent, stmt.text(0), stmt.integer(1), stmt.integer(2), stmt.text(3)});
+    return rows;
+}
+
+static bool insert_content(Stmt &stmt, const ContentRow &row)
+{
+    stmt.reset();
+    return stmt.bind(1, row.parent)
+        .bind(2, row.name)
+        .bind(3, sort_key(row.name))
+        .bind(4, row.size)
+        .bind(5, row.mtime)
+        .bind(6, row.etag)
+        .done();
+}
+
+static bool write_tree(Db &db, const std::vector<FolderRow> &folders, const std::vector<ContentRow> &contents,
+                       const std::vector<ContentRow> &later, const std::string &identity)
+{
+    if (!db.run("DELETE FROM folder; DELETE FROM content"))
+        return false;
+    std::unordered_set<std::string> paths = {"/"};
+    Stmt folder(db, "INSERT OR REPLACE INTO folder(path, parent, name, sort) VALUES(?, ?, ?, ?)");
+    for (const FolderRow &row : folders) {
+        paths.insert(row.path);
+        folder.reset();
+        if (!folder.bind(1, row.path).bind(2, parent_of(row.path)).bind(3, row.name).bind(4, sort_key(row.name)).done())
+            return false;
+    }
+    Stmt content(db, INSERT_CONTENT);
+    for (const ContentRow &row : contents)
+        if (!insert_content(content, row))
+            return false;
+    for (const ContentRow &row : later)
+        if (paths.count(row.parent) && !insert_content(content, row))
+            return false;
+    Stmt complete(db, "INSERT OR REPLACE INTO setting(key, value) VALUES('complete_for', ?)");
+    return complete.bind(1, identity).done();
+}
+
+bool Account::replace(const std::vector<FolderRow> &folders, const std::vector<ContentRow> &contents,
+                      const std::vector<ContentRow> &later, const std::string &identity)
+{
+    std::scoped_lock lock(writing);
+    if (!writer.run("BEGIN IMMEDIATE"))
+        return false;
+    if (write_tree(writer, folders, contents, later, identity) && writer.run("COMMIT"))
+        return true;
+    writer.run("ROLLBACK");
+    return false;
+}
+
+bool Account::insert(const ContentRow &content)
+{
+    std::scoped_lock lock(writing);
+    Stmt stmt(writer, INSERT_CONTENT);
+    return insert_content(stmt, content);
+}
+
+std::string Account::complete_for()
+{
+    std::scoped_lock lock(reading);
+    Stmt stmt(reader, "SELECT value FROM setting WHERE key = 'complete_for'");
+    return stmt.row() ? stmt.text(0) : "";
+}
+
+bool Account::clear()
+{
+    std::scoped_lock lock(writing);
+    return writer.run("BEGIN IMMEDIATE; DELETE FROM folder; DELETE FROM content;"
+                      "DELETE FROM setting WHERE key = 'complete_for'; COMMIT");
+}
+
+bool Account::setting(const std::string &key, bool fallback)
+{
+    std::scoped_lock lock(reading);
+    Stmt stmt(reader, "SELECT value FROM setting WHERE key = ?");
+    return stmt.bind(1, key).row() ? stmt.integer(0) != 0 : fallback;
+}
+
+bool Account::set_setting(const std::string &key, bool value)
+{
+    std::scoped_lock lock(writing);
+    Stmt stmt(writer, "INSERT OR REPLACE INTO setting(key, value) VALUES(?, ?)");
+    return stmt.bind(1, key).bind(2, value ? "1" : "0").done();
+}
+
+} // namespace cloud

@@ -1,0 +1,56 @@
+#pragma once
+// The metadata database of one service: the account's folder tree as the last refresh and later uploads left it.
+#include "base/base.h"
+#include <mutex>
+#include <string>
+#include <vector>
+
+namespace cloud {
+
+struct FolderRow {
+    std::string path;
+    std::string name;
+};
+
+struct ContentRow {
+    std::string parent; // path of the folder
+    std::string name;
+    long long size = 0; // bytes
+    long long mtime = 0;
+    std::string etag;
+};
+
+// Two connections: readers are not held up while a refresh is written. Every function may be called from any thread.
+class Account {
+  public:
+    explicit Account(std::string service_name);
+    // Opens, and creates when it is missing, platform_data_dir()/cloud/SERVICE.db.
+    bool open();
+
+    const std::string service;
+
+    bool folder_exists(const std::string &path);
+    // In the order of sort_key().
+    std::vector<FolderRow> folders_of(const std::string &parent);
+    std::vector<ContentRow> contents_of(const std::string &parent);
+
+    // Puts what a refresh found in the place of everything that is there, in one transaction. `later` are files stored
+    // since the refresh began; those whose folder is gone are left out. The root is not a row of `folders`.
+    bool replace(const std::vector<FolderRow> &folders, const std::vector<ContentRow> &contents,
+                 const std::vector<ContentRow> &later, const std::string &identity);
+    bool insert(const ContentRow &content);
+
+    // The account (account_identity()) whose whole tree the database holds; empty when there is none.
+    std::string complete_for();
+    bool clear();
+
+    // Stored for the service; `fallback` when nothing is stored.
+    bool setting(const std::string &key, bool fallback);
+    bool set_setting(const std::string &key, bool value);
+
+  private:
+    std::mutex reading, writing;
+    Db reader, writer;
+};
+
+} // namespace cloud

@@ -1,0 +1,219 @@
+#include "cloud_content_sync/client.h"
+#include "cloud_content_sync/names.h"
+#include "cloud_content_sync/refresh.h"
+#include "cloud_content_sync/upload.h"
+#include <algorithm>
+#include <csignal>
+
+namespace cloud {
+
+static constexpr auto TICK = std::chrono::milliseconds(1000); // how often stalled transfers are looked for
+
+Client::Client(Service description, std::shared_ptr<Account> database)
+    : service(std::move(description)), account(std::move(database)), http(service)
+{
+}
+
+Client::~Client() = default;
+
+void Client::start()
+{
+    std::scoped_lock lock(mutex);
+    // The thread holds the client, so that stop() may be called from within a callback.
+    thread = std::thread([self = shared_from_this()] {
+        {
+            // start() has stored the thread's id when it lets go of the lock.
+            std::scoped_lock ready(self->mutex);
+        }
+        self->loop();
+    });
+    thread_id = thread.get_id();
+}
+
+void Client::stop()
+{
+    {
+        std::scoped_lock lock(mutex);
+        stopping = true;
+        live.clear();
+    }
+    http.wake();
+    if (on_own_thread())
+        thread.detach();
+    else
+        thread.join();
+}
+
+void Client::upload(UploadRequest request, int *id)
+{
+    {
+        std::scoped_lock lock(mutex);
+        request.id = ++last_id;
+        *id = request.id;
+        live.insert(request.id);
+        upload_queue.push_back(std::move(request));
+    }
+    http.wake();
+}
+
+bool Client::cancel(int id)
+{
+    bool was_live = false;
+    {
+        std::unique_lock lock(mutex);
+        was_live = live.erase(id) > 0;
+        if (!on_own_thread())
+            callback_ended.wait(lock, [&] { return calling != id; });
+    }
+    if (was_live)
+        http.wake();
+    return was_live;
+}
+
+void Client::refresh(RefreshRequest request)
+{
+    {
+        std::scoped_lock lock(mutex);
+        refresh_queue.push_back(request);
+    }
+    http.wake();
+}
+
+std::optional<std::string> Client::uploaded_path(int id)
+{
+    std::scoped_lock lock(mutex);
+    const auto found = landed.find(id);
+    return found == landed.end() ? std::nullopt : std::optional(found->second);
+}
+
+bool Client::is_wanted(int id)
+{
+    std::scoped_lock lock(mutex);
+    return live.count(id) > 0;
+}
+
+bool Client::is_stopping()
+{
+    std::scoped_lock lock(mutex);
+    return stopping;
+}
+
+bool Client::begin_callback(int id, bool is_last)
+{
+    std::scoped_lock lock(mutex);
+    if (!live.count(id))
+        return false;
+    if (is_last)
+        live.erase(id);
+    calling = id;
+    return true;
+}
+
+// The loop wakes to start what waits for its turn.
+void Client::end_callback()
+{
+    {
+        std::scoped_lock lock(mutex);
+        calling = 0;
+    }
+    callback_ended.notify_all();
+    http.wake();
+}
+
+void Client::report_progress(const UploadRequest &request, int percent)
+{
+    if (!begin_callback(request.id, false))
+        return;
+    if (request.cb)
+        request.cb(CLOUD_CONTENT_SYNC_STATE_RUNNING, 1, percent, CLOUD_CONTENT_SYNC_ERROR_NONE, request.user_data);
+    end_callback();
+}
+
+bool Client::report_done(const UploadRequest &request, const ContentRow &stored)
+{
+    if (!begin_callback(request.id, true))
+        return false;
+    account->insert(stored); // a failure costs nothing but the row until the next refresh
+    stored_meanwhile.push_back(stored);
+    {
+        std::scoped_lock lock(mutex);
+        landed[request.id] = join(stored.parent, stored.name);
+    }
+    if (request.cb)
+        request.cb(CLOUD_CONTENT_SYNC_STATE_DONE, 1, 100, CLOUD_CONTENT_SYNC_ERROR_NONE, request.user_data);
+    end_callback();
+    return true;
+}
+
+void Client::report_failed(const UploadRequest &request, int error)
+{
+    if (!begin_callback(request.id, true))
+        return http.wake();
+    if (request.cb)
+        request.cb(CLOUD_CONTENT_SYNC_STATE_FAILED, 1, 0, error, request.user_data);
+    end_callback();
+}
+
+void Client::report_refreshed(const RefreshRequest &request, int error)
+{
+    // Refreshes have no id to be cancelled by; stop() waits for this thread.
+    if (request.cb && !is_stopping())
+        request.cb(error ? CLOUD_CONTENT_SYNC_STATE_FAILED : CLOUD_CONTENT_SYNC_STATE_DONE, error, request.user_data);
+    http.wake();
+}
+
+// Uploads run one after the other, so that two of one name never race for it.
+void Client::step_upload()
+{
+    if (running_upload)
+        running_upload->step();
+    while (!running_upload || running_upload->has_ended()) {
+        running_upload.reset();
+        UploadRequest next;
+        {
+            std::scoped_lock lock(mutex);
+            if (stopping || upload_queue.empty())
+                return;
+            next = std::move(upload_queue.front());
+            upload_queue.pop_front();
+            if (!live.count(next.id))
+                continue;
+        }
+        running_upload = std::make_unique<Upload>(*this, std::move(next));
+        running_upload->start();
+    }
+}
+
+void Client::step_refresh()
+{
+    if (running_refresh && !running_refresh->has_ended())
+        return;
+    running_refresh.reset();
+    std::vector<RefreshRequest> requests;
+    {
+        std::scoped_lock lock(mutex);
+        if (stopping || refresh_queue.empty())
+            return;
+        requests.swap(refresh_queue);
+    }
+    stored_meanwhile.clear();
+    running_refresh = std::make_unique<Refresh>(*this, std::move(requests));
+    running_refresh->start();
+}
+
+void Client::loop()
+{
+    // Signals are the program's to handle, on its own threads; a connection that breaks must not raise SIGPIPE.
+    sigset_t all;
+    sigfillset(&all);
+    pthread_sigmask(SIG_BLOCK, &all, nullptr);
+    while (!is_stopping()) {
+        step_refresh();
+        step_upload();
+        http.run(TICK);
+    }
+    running_upload.reset();
+    running_refresh.reset();
+}
+
+} // namespace cloud

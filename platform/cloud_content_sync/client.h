@@ -1,0 +1,97 @@
+#pragma once
+// The client of one handle: its requests, and the one thread on which they run and call back.
+#include "cloud_content_sync/account.h"
+#include "cloud_content_sync/cloud_content_sync.h"
+#include "cloud_content_sync/http.h"
+#include "cloud_content_sync/service.h"
+#include <condition_variable>
+#include <deque>
+#include <map>
+#include <memory>
+#include <mutex>
+#include <optional>
+#include <set>
+#include <string>
+#include <thread>
+#include <vector>
+
+namespace cloud {
+
+class Refresh;
+class Upload;
+
+struct UploadRequest {
+    int id = 0;
+    std::string local_path;
+    std::string server_path;
+    cloud_content_sync_transfer_cb cb = nullptr;
+    void *user_data = nullptr;
+};
+
+struct RefreshRequest {
+    cloud_content_sync_refresh_cb cb = nullptr;
+    void *user_data = nullptr;
+};
+
+class Client : public std::enable_shared_from_this<Client> {
+  public:
+    Client(Service service, std::shared_ptr<Account> account);
+    ~Client();
+    Client(const Client &) = delete;
+    Client &operator=(const Client &) = delete;
+
+    // Any thread.
+    void start();
+    // No callback runs any more when this returns, but for the one from within which it is called.
+    void stop();
+    // *id is written before the request can call back.
+    void upload(UploadRequest request, int *id);
+    // False when no such request is queued or running. In both cases no callback of it runs any more on return, but for
+    // the one from within which this is called.
+    bool cancel(int id);
+    void refresh(RefreshRequest request);
+    std::optional<std::string> uploaded_path(int id);
+
+    const Service service;
+    const std::shared_ptr<Account> account;
+
+    // The client thread only, for Upload and Refresh.
+    Http http;
+    bool is_wanted(int id); // neither cancelled nor stopped
+    void report_progress(const UploadRequest &request, int percent);
+    // The request's last callback. False, and nothing done, when the request is not wanted any more.
+    bool report_done(const UploadRequest &request, const ContentRow &stored);
+    void report_failed(const UploadRequest &request, int error);
+    void report_refreshed(const RefreshRequest &request, int error);
+    // What uploads have stored since the running refresh began.
+    std::vector<ContentRow> stored_meanwhile;
+
+  private:
+    void loop();
+    void step_upload();
+    void step_refresh();
+    bool is_stopping();
+    bool begin_callback(int id, bool is_last);
+    void end_callback();
+    bool on_own_thread() const
+    {
+        return std::this_thread::get_id() == thread_id;
+    }
+
+    std::mutex mutex;
+    std::condition_variable callback_ended;
+    bool stopping = false;
+    int last_id = 0;
+    int calling = 0;    // request whose callback runs now
+    std::set<int> live; // queued or running, and not cancelled
+    std::deque<UploadRequest> upload_queue;
+    std::vector<RefreshRequest> refresh_queue;
+    std::map<int, std::string> landed;
+
+    std::unique_ptr<Upload> running_upload;   // client thread
+    std::unique_ptr<Refresh> running_refresh; // client thread
+    std::thread thread;
+    std::thread::id thread_id;
+};
+
+} // namespace cloud

@@ -1,0 +1,303 @@
+#include "cloud_content_sync/cloud_content_sync.h"
+#include "cloud_content_sync/client.h"
+#include "cloud_content_sync/names.h"
+#include <algorithm>
+#include <cstring>
+
+using cloud::Account;
+
+struct cloud_content_sync_s {
+    std::shared_ptr<cloud::Client> client;
+};
+
+// Folders and contents hold the account, so they outlive the client's handle.
+struct cloud_content_sync_folder_s {
+    std::shared_ptr<Account> account;
+    std::string path;
+    std::string name;
+};
+
+struct cloud_content_sync_content_s {
+    cloud::ContentRow row;
+};
+
+static constexpr int DONE = CLOUD_CONTENT_SYNC_ERROR_NONE;
+static constexpr int INVALID = CLOUD_CONTENT_SYNC_ERROR_INVALID_PARAMETER;
+static constexpr int NOT_FOUND = CLOUD_CONTENT_SYNC_ERROR_NOT_FOUND;
+
+static int give(const std::string &text, char **out)
+{
+    // Names come from file systems: they hold no NUL.
+    *out = strdup(text.c_str());
+    if (!*out)
+        std::abort();
+    return DONE;
+}
+
+int cloud_content_sync_create(const char *service_name, cloud_content_sync_h *handle)
+{
+    if (!service_name || !handle || !cloud::service_name_is_valid(service_name))
+        return INVALID;
+    auto service = cloud::service_find(service_name);
+    if (!service)
+        return CLOUD_CONTENT_SYNC_ERROR_NO_SERVICE;
+    auto account = std::make_shared<Account>(service_name);
+    if (!account->open())
+        return CLOUD_CONTENT_SYNC_ERROR_DB_FAILED;
+    auto client = std::make_shared<cloud::Client>(std::move(*service), std::move(account));
+    client->start();
+    *handle = new cloud_content_sync_s{std::move(client)};
+    return DONE;
+}
+
+int cloud_content_sync_destroy(cloud_content_sync_h handle)
+{
+    if (!handle)
+        return INVALID;
+    handle->client->stop();
+    delete handle;
+    return DONE;
+}
+
+static bool is_one_type(int type)
+{
+    return type == CLOUD_CONTENT_TYPE_IMAGE || type == CLOUD_CONTENT_TYPE_VIDEO || type == CLOUD_CONTENT_TYPE_CAMERA;
+}
+
+static std::string activation_key(int content_type)
+{
+    return "activation." + std::to_string(content_type);
+}
+
+int cloud_content_sync_setting_get_type_activation(cloud_content_sync_h handle, int content_type, bool *value)
+{
+    if (!handle || !value || !is_one_type(content_type))
+        return INVALID;
+    *value = handle->client->account->setting(activation_key(content_type), true);
+    return DONE;
+}
+
+int cloud_content_sync_setting_set_type_activation(cloud_content_sync_h handle, int content_type, bool value)
+{
+    if (!handle || !is_one_type(content_type))
+        return INVALID;
+    return handle->client->account->set_setting(activation_key(content_type), value)
+               ? DONE
+               : CLOUD_CONTENT_SYNC_ERROR_DB_FAILED;
+}
+
+int cloud_content_sync_refresh_meta(cloud_content_sync_h handle, int content_types, cloud_content_sync_refresh_cb cb,
+                                    void *user_data)
+{
+    constexpr int ALL = CLOUD_CONTENT_TYPE_IMAGE | CLOUD_CONTENT_TYPE_VIDEO | CLOUD_CONTENT_TYPE_CAMERA;
+    if (!handle || content_types == 0 || (content_types & ~ALL))
+        return INVALID;
+    handle->client->refresh({cb, user_data});
+    return DONE;
+}
+
+int cloud_content_sync_get_is_meta_complete(cloud_content_sync_h handle, bool *complete)
+{
+    if (!handle || !complete)
+        return INVALID;
+    const auto credentials = cloud::credentials_load(handle->client->service.name);
+    *complete = credentials && handle->client->account->complete_for() ==
+                                   cloud::account_identity(handle->client->service, *credentials);
+    return DONE;
+}
+
+static cloud_content_sync_folder_h folder_at(const std::shared_ptr<Account> &account, const std::string &path)
+{
+    return new cloud_content_sync_folder_s{account, path, path == "/" ? account->service : cloud::name_of(path)};
+}
+
+int cloud_content_sync_folder_get_root(cloud_content_sync_h handle, cloud_content_sync_folder_h *folder)
+{
+    if (!handle || !folder)
+        return INVALID;
+    *folder = folder_at(handle->client->account, "/");
+    return DONE;
+}
+
+int cloud_content_sync_get_folder_by_server_path(cloud_content_sync_h handle, const char *path,
+                                                 cloud_content_sync_folder_h *folder)
+{
+    if (!handle || !path || !folder)
+        return INVALID;
+    std::string plain = path;
+    if (plain.size() > 1 && plain.back() == '/')
+        plain.pop_back();
+    if (!cloud::path_is_valid(plain))
+        return INVALID;
+    if (!handle->client->account->folder_exists(plain))
+        return NOT_FOUND;
+    *folder = folder_at(handle->client->account, plain);
+    return DONE;
+}
+
+int cloud_content_sync_folder_get_parent(cloud_content_sync_folder_h folder, cloud_content_sync_folder_h *parent)
+{
+    if (!folder || !parent)
+        return INVALID;
+    const std::string path = cloud::parent_of(folder->path);
+    if (folder->path == "/" || !folder->account->folder_exists(path))
+        return NOT_FOUND;
+    *parent = folder_at(folder->account, path);
+    return DONE;
+}
+
+int cloud_content_sync_folder_clone(cloud_content_sync_folder_h *copy, cloud_content_sync_folder_h folder)
+{
+    if (!copy || !folder)
+        return INVALID;
+    *copy = new cloud_content_sync_folder_s(*folder);
+    return DONE;
+}
+
+int cloud_content_sync_folder_destroy(cloud_content_sync_folder_h folder)
+{
+    delete folder;
+    return folder ? DONE : INVALID;
+}
+
+int cloud_content_sync_folder_get_path(cloud_content_sync_folder_h folder, char **path)
+{
+    return folder && path ? give(folder->path, path) : INVALID;
+}
+
+int cloud_content_sync_folder_get_name(cloud_content_sync_folder_h folder, char **name)
+{
+    return folder && name ? give(folder->name, name) : INVALID;
+}
+
+int cloud_content_sync_folder_foreach_children_folder(cloud_content_sync_h, cloud_content_sync_folder_h folder,
+                                                      cloud_content_sync_folder_cb cb, void *user_data)
+{
+    if (!folder || !cb)
+        return INVALID;
+    if (!folder->account->folder_exists(folder->path))
+        return NOT_FOUND;
+    // The callback may destroy `folder`, and no lock is held while it runs.
+    const std::shared_ptr<Account> account = folder->account;
+    for (cloud::FolderRow &row : account->folders_of(folder->path)) {
+        cloud_content_sync_folder_s child{account, std::move(row.path), std::move(row.name)};
+        if (!cb(&child, DONE, user_data))
+            break;
+    }
+    return DONE;
+}
+
+int cloud_content_sync_folder_foreach_content_from_db(cloud_content_sync_h, cloud_content_sync_folder_h folder,
+                                                      cloud_content_sync_content_cb cb, void *user_data)
+{
+    if (!folder || !cb)
+        return INVALID;
+    if (!folder->account->folder_exists(folder->path))
+        return NOT_FOUND;
+    for (cloud::ContentRow &row : folder->account->contents_of(folder->path)) {
+        cloud_content_sync_content_s content{std::move(row)};
+        if (!cb(&content, DONE, user_data))
+            break;
+    }
+    return DONE;
+}
+
+int cloud_content_sync_content_clone(cloud_content_sync_content_h *copy, cloud_content_sync_content_h content)
+{
+    if (!copy || !content)
+        return INVALID;
+    *copy = new cloud_content_sync_content_s(*content);
+    return DONE;
+}
+
+int cloud_content_sync_content_destroy(cloud_content_sync_content_h content)
+{
+    delete content;
+    return content ? DONE : INVALID;
+}
+
+int cloud_content_sync_content_get_name(cloud_content_sync_content_h content, char **name)
+{
+    return content && name ? give(content->row.name, name) : INVALID;
+}
+
+int cloud_content_sync_content_get_size(cloud_content_sync_content_h content, long long *size)
+{
+    if (!content || !size)
+        return INVALID;
+    *size = content->row.size;
+    return DONE;
+}
+
+int cloud_content_sync_content_get_content_type(cloud_content_sync_content_h content, int *type)
+{
+    if (!content || !type)
+        return INVALID;
+    *type = cloud::content_type_of(content->row.name);
+    return DONE;
+}
+
+int cloud_content_sync_content_get_is_thumbnail_exist(cloud_content_sync_content_h content, bool *exists)
+{
+    if (!content || !exists)
+        return INVALID;
+    *exists = false;
+    return DONE;
+}
+
+int cloud_content_sync_content_get_thumbnail_path(cloud_content_sync_content_h content, char **path)
+{
+    return content && path ? NOT_FOUND : INVALID;
+}
+
+int cloud_content_sync_upload(cloud_content_sync_h handle, const char *local_path, const char *server_path, int *req_id,
+                              cloud_content_sync_transfer_cb cb, void *user_data)
+{
+    if (!handle || !local_path || !*local_path || !server_path || !*server_path || !req_id)
+        return INVALID;
+    handle->client->upload({0, local_path, server_path, cb, user_data}, req_id);
+    return DONE;
+}
+
+int cloud_content_sync_get_uploaded_path(cloud_content_sync_h handle, int req_id, char **server_path)
+{
+    if (!handle || !server_path)
+        return INVALID;
+    const auto path = handle->client->uploaded_path(req_id);
+    return path ? give(*path, server_path) : NOT_FOUND;
+}
+
+int cloud_content_sync_cancel(cloud_content_sync_h handle, int req_id)
+{
+    if (!handle)
+        return INVALID;
+    return handle->client->cancel(req_id) ? DONE : NOT_FOUND;
+}
+
+static bool has_control_characters(const std::string &text)
+{
+    return std::any_of(text.begin(), text.end(), [](unsigned char c) { return c < 0x20 || c == 0x7F; });
+}
+
+int cloud_content_sync_credentials_set(const char *service_name, const char *user, const char *secret)
+{
+    if (!service_name || !cloud::service_name_is_valid(service_name))
+        return INVALID;
+    const auto service = cloud::service_find(service_name);
+    if (!service)
+        return CLOUD_CONTENT_SYNC_ERROR_NO_SERVICE;
+    const cloud::Credentials credentials{user ? user : "", secret ? secret : ""};
+    // A colon would end the user's name early (RFC 7617, 2).
+    const bool bad_user = user && (!*user || has_control_characters(credentials.user) || std::strchr(user, ':'));
+    if (bad_user || (secret && !*secret) || has_control_characters(credentials.secret))
+        return INVALID;
+    Account account(service_name);
+    if (!account.open())
+        return CLOUD_CONTENT_SYNC_ERROR_DB_FAILED;
+    // What was known of another account goes before the new credentials come.
+    const bool same_account = secret && account.complete_for() == cloud::account_identity(*service, credentials);
+    if (!same_account && !account.clear())
+        return CLOUD_CONTENT_SYNC_ERROR_DB_FAILED;
+    return cloud::credentials_store(service_name, secret ? &credentials : nullptr) ? DONE
+                                                                                   : CLOUD_CONTENT_SYNC_ERROR_DB_FAILED;
+}

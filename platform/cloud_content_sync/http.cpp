@@ -1,0 +1,245 @@
+#include "cloud_content_sync/http.h"
+#include "cloud_content_sync/cloud_content_sync.h"
+#include "cloud_content_sync/names.h"
+#include <algorithm>
+#include <cstdlib>
+#include <cstring>
+#include <glib.h>
+#include <string_view>
+
+namespace cloud {
+
+static constexpr long CONNECT_SECONDS = 15;
+static constexpr long BUFFER_BYTES = 256 * 1024;
+
+static size_t read_cb(char *buffer, size_t size, size_t count, void *data)
+{
+    auto *transfer = static_cast<Transfer *>(data);
+    transfer->last_activity = std::chrono::steady_clock::now();
+    return transfer->read(buffer, size * count);
+}
+
+// libcurl asks for the start again when a kept connection turned out dead. Whether the service took the body by then is
+// for the caller to find out, so it is never sent a second time from here.
+static int seek_cb(void *data, curl_off_t, int)
+{
+    static_cast<Transfer *>(data)->was_resent = true;
+    return CURL_SEEKFUNC_FAIL;
+}
+
+static size_t write_cb(char *bytes, size_t size, size_t count, void *data)
+{
+    auto *transfer = static_cast<Transfer *>(data);
+    transfer->last_activity = std::chrono::steady_clock::now();
+    long status = 0;
+    curl_easy_getinfo(transfer->easy.get(), CURLINFO_RESPONSE_CODE, &status);
+    if (!transfer->write || status < 200 || status > 299)
+        return size * count;
+    return transfer->write(bytes, size * count) ? size * count : 0;
+}
+
+static void take_header(std::string_view line, const char *name, std::string &value)
+{
+    const size_t size = std::strlen(name);
+    if (line.size() <= size || line[size] != ':' || g_ascii_strncasecmp(line.data(), name, size) != 0)
+        return;
+    line.remove_prefix(size + 1);
+    const size_t first = line.find_first_not_of(" \t");
+    const size_t last = line.find_last_not_of(" \t\r\n");
+    value = first == line.npos || last == line.npos || last < first ? "" : line.substr(first, last - first + 1);
+}
+
+static size_t header_cb(char *bytes, size_t size, size_t count, void *data)
+{
+    auto *transfer = static_cast<Transfer *>(data);
+    transfer->last_activity = std::chrono::steady_clock::now();
+    const std::string_view line(bytes, size * count);
+    if (line.substr(0, 5) == "HTTP/") {
+        transfer->etag.clear();
+        transfer->repr_digest.clear();
+    }
+    take_header(line, "ETag", transfer->etag);
+    take_header(line, "Repr-Digest", transfer->repr_digest);
+    return size * count;
+}
+
+bool Transfer::never_sent() const
+{
+    switch (result) {
+    case CURLE_COULDNT_RESOLVE_HOST:
+    case CURLE_COULDNT_RESOLVE_PROXY:
+    case CURLE_COULDNT_CONNECT:
+    case CURLE_SSL_CONNECT_ERROR:
+    case CURLE_PEER_FAILED_VERIFICATION:
+    case CURLE_SSL_CACERT_BADFILE:
+    case CURLE_UNSUPPORTED_PROTOCOL:
+    case CURLE_URL_MALFORMAT:
+        return true;
+    default:
+        return false;
+    }
+}
+
+int Transfer::error() const
+{
+    if (result == CURLE_WRITE_ERROR || result == CURLE_WEIRD_SERVER_REPLY || result == CURLE_UNSUPPORTED_PROTOCOL)
+        return CLOUD_CONTENT_SYNC_ERROR_SERVER;
+    if (result != CURLE_OK)
+        return CLOUD_CONTENT_SYNC_ERROR_NETWORK;
+    switch (status) {
+    case 401:
+        return CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED;
+    case 403:
+    case 409:
+    case 423:
+        return CLOUD_CONTENT_SYNC_ERROR_FORBIDDEN;
+    case 400:
+    case 414:
+        return CLOUD_CONTENT_SYNC_ERROR_BAD_NAME;
+    case 507:
+        return CLOUD_CONTENT_SYNC_ERROR_STORAGE_FULL;
+    default:
+        return CLOUD_CONTENT_SYNC_ERROR_SERVER;
+    }
+}
+
+Http::Http(const Service &description) : service(description), multi(nullptr, curl_multi_cleanup)
+{
+    static const CURLcode initialised = curl_global_init(CURL_GLOBAL_DEFAULT);
+    multi.reset(initialised == CURLE_OK ? curl_multi_init() : nullptr);
+    if (!multi)
+        std::abort();
+}
+
+Http::~Http()
+{
+    while (!transfers.empty())
+        abort(transfers.begin()->second.get());
+}
+
+static void set_credentials(CURL *easy, const Credentials &credentials)
+{
+    if (credentials.user.empty()) {
+        curl_easy_setopt(easy, CURLOPT_HTTPAUTH, CURLAUTH_BEARER);
+        curl_easy_setopt(easy, CURLOPT_XOAUTH2_BEARER, credentials.secret.c_str());
+    } else {
+        curl_easy_setopt(easy, CURLOPT_HTTPAUTH, CURLAUTH_BASIC);
+        curl_easy_setopt(easy, CURLOPT_USERNAME, credentials.user.c_str());
+        curl_easy_setopt(easy, CURLOPT_PASSWORD, credentials.secret.c_str());
+    }
+}
+
+static void set_body(CURL *easy, Transfer &transfer)
+{
+    if (transfer.read) {
+        curl_easy_setopt(easy, CURLOPT_UPLOAD, 1L);
+        curl_easy_setopt(easy, CURLOPT_INFILESIZE_LARGE, static_cast<curl_off_t>(transfer.body_size));
+        curl_easy_setopt(easy, CURLOPT_READFUNCTION, read_cb);
+        curl_easy_setopt(easy, CURLOPT_READDATA, &transfer);
+        curl_easy_setopt(easy, CURLOPT_SEEKFUNCTION, seek_cb);
+        curl_easy_setopt(easy, CURLOPT_SEEKDATA, &transfer);
+        curl_easy_setopt(easy, CURLOPT_UPLOAD_BUFFERSIZE, BUFFER_BYTES);
+        // Nothing has to be rewound to send an empty body twice, so libcurl would do it unasked on a dead connection.
+        if (transfer.body_size == 0)
+            curl_easy_setopt(easy, CURLOPT_FRESH_CONNECT, 1L);
+    } else if (!transfer.body.empty()) {
+        curl_easy_setopt(easy, CURLOPT_POSTFIELDSIZE, static_cast<long>(transfer.body.size()));
+        curl_easy_setopt(easy, CURLOPT_POSTFIELDS, transfer.body.c_str());
+    }
+    curl_easy_setopt(easy, CURLOPT_CUSTOMREQUEST, transfer.method.c_str());
+}
+
+Transfer *Http::start(std::unique_ptr<Transfer> owned, const Credentials &credentials)
+{
+    Transfer &transfer = *owned;
+    CURL *easy = curl_easy_init();
+    if (!easy)
+        std::abort();
+    transfer.easy.reset(easy);
+    transfer.stall_limit = std::chrono::seconds(service.stall_seconds);
+    transfer.last_activity = std::chrono::steady_clock::now();
+
+    curl_easy_setopt(easy, CURLOPT_URL, (service.storage + percent_encode(transfer.path)).c_str());
+    curl_easy_setopt(easy, CURLOPT_PATH_AS_IS, 1L);
+    curl_easy_setopt(easy, CURLOPT_PROTOCOLS_STR, "http,https");
+    curl_easy_setopt(easy, CURLOPT_FOLLOWLOCATION, 0L);
+    curl_easy_setopt(easy, CURLOPT_NOSIGNAL, 1L);
+    curl_easy_setopt(easy, CURLOPT_QUICK_EXIT, 1L); // an abort does not wait for the name resolver
+    curl_easy_setopt(easy, CURLOPT_CONNECTTIMEOUT, CONNECT_SECONDS);
+    curl_easy_setopt(easy, CURLOPT_BUFFERSIZE, BUFFER_BYTES);
+    curl_easy_setopt(easy, CURLOPT_WRITEFUNCTION, write_cb);
+    curl_easy_setopt(easy, CURLOPT_WRITEDATA, &transfer);
+    curl_easy_setopt(easy, CURLOPT_HEADERFUNCTION, header_cb);
+    curl_easy_setopt(easy, CURLOPT_HEADERDATA, &transfer);
+    if (!service.ca_file.empty())
+        curl_easy_setopt(easy, CURLOPT_CAINFO, service.ca_file.c_str());
+    set_credentials(easy, credentials);
+    set_body(easy, transfer);
+
+    transfer.headers.emplace_back("Expect:");
+    for (const std::string &header : transfer.headers)
+        transfer.header_list.reset(curl_slist_append(transfer.header_list.release(), header.c_str()));
+    curl_easy_setopt(easy, CURLOPT_HTTPHEADER, transfer.header_list.get());
+
+    transfers[easy] = std::move(owned);
+    if (curl_multi_add_handle(multi.get(), easy) != CURLM_OK)
+        std::abort();
+    return &transfer;
+}
+
+void Http::abort(Transfer *transfer)
+{
+    const auto found = transfer ? transfers.find(transfer->easy.get()) : transfers.end();
+    if (found == transfers.end())
+        return;
+    curl_multi_remove_handle(multi.get(), found->first);
+    transfers.erase(found);
+}
+
+void Http::finish(CURL *easy, CURLcode result)
+{
+    const auto found = transfers.find(easy);
+    if (found == transfers.end())
+        return;
+    const std::unique_ptr<Transfer> transfer = std::move(found->second);
+    transfers.erase(found);
+    curl_multi_remove_handle(multi.get(), easy);
+    transfer->result = result;
+    curl_easy_getinfo(easy, CURLINFO_RESPONSE_CODE, &transfer->status);
+    transfer->done(*transfer);
+}
+
+void Http::dispatch()
+{
+    int left = 0;
+    while (const CURLMsg *message = curl_multi_info_read(multi.get(), &left))
+        if (message->msg == CURLMSG_DONE)
+            finish(message->easy_handle, message->data.result);
+}
+
+void Http::end_stalled()
+{
+    const auto now = std::chrono::steady_clock::now();
+    std::vector<CURL *> stalled;
+    for (const auto &[easy, transfer] : transfers)
+        if (now - transfer->last_activity > std::max(transfer->stall_limit, std::chrono::seconds(1)))
+            stalled.push_back(easy);
+    for (CURL *easy : stalled)
+        finish(easy, CURLE_OPERATION_TIMEDOUT);
+}
+
+void Http::run(std::chrono::milliseconds wait)
+{
+    int running = 0;
+    curl_multi_perform(multi.get(), &running);
+    dispatch();
+    end_stalled();
+    curl_multi_poll(multi.get(), nullptr, 0, static_cast<int>(wait.count()), nullptr);
+}
+
+void Http::wake()
+{
+    curl_multi_wakeup(multi.get());
+}
+
+} // namespace cloud

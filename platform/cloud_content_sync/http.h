@@ -1,0 +1,78 @@
+#pragma once
+// HTTP requests of one thread: a libcurl multi handle whose connections are kept alive between requests. Redirects are
+// never followed, so the credentials never leave the host of the service's description.
+#include "cloud_content_sync/service.h"
+#include <chrono>
+#include <curl/curl.h>
+#include <functional>
+#include <map>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace cloud {
+
+// Answers of `read` besides a number of bytes.
+inline constexpr size_t READ_FAILED = CURL_READFUNC_ABORT;
+
+struct Transfer {
+    // The request.
+    std::string method;
+    std::string path; // server path below the storage's root; a folder's ends in "/"
+    std::vector<std::string> headers;
+    std::string body;
+    std::function<size_t(char *, size_t)> read; // instead of body: source of exactly body_size bytes, or READ_FAILED
+    long long body_size = 0;
+    std::function<bool(const char *, size_t)> write; // takes the answer's body when its status is 2xx; false ends it
+    std::function<void(Transfer &)> done;            // called once, unless the transfer is aborted
+
+    // What came of it.
+    CURLcode result = CURLE_OK;
+    long status = 0;
+    std::string etag;
+    std::string repr_digest;
+    bool was_resent = false; // libcurl found the connection dead and wanted to send the body a second time
+
+    // Kept by Http.
+    std::chrono::seconds stall_limit{60};
+    std::chrono::steady_clock::time_point last_activity;
+    std::unique_ptr<CURL, decltype(&curl_easy_cleanup)> easy{nullptr, curl_easy_cleanup};
+    std::unique_ptr<curl_slist, decltype(&curl_slist_free_all)> header_list{nullptr, curl_slist_free_all};
+
+    bool is_success() const
+    {
+        return result == CURLE_OK && status >= 200 && status < 300;
+    }
+    // The request cannot have reached the service.
+    bool never_sent() const;
+    // One of cloud_content_sync_error_e for a request that did not succeed.
+    int error() const;
+};
+
+class Http {
+  public:
+    explicit Http(const Service &service);
+    ~Http();
+    Http(const Http &) = delete;
+    Http &operator=(const Http &) = delete;
+
+    // The transfer stays valid until its done() has returned, or until it is aborted.
+    Transfer *start(std::unique_ptr<Transfer> transfer, const Credentials &credentials);
+    // Ends a transfer and closes its connection; done() is not called. Null is allowed.
+    void abort(Transfer *transfer);
+    // Moves data, calls the done() of what has ended, and waits for more to do, at most `wait`.
+    void run(std::chrono::milliseconds wait);
+    // Ends the wait of run(), or of the next one. Any thread.
+    void wake();
+
+  private:
+    void dispatch();
+    void end_stalled();
+    void finish(CURL *easy, CURLcode result);
+
+    const Service service;
+    std::unique_ptr<CURLM, decltype(&curl_multi_cleanup)> multi;
+    std::map<CURL *, std::unique_ptr<Transfer>> transfers;
+};
+
+} // namespace cloud

@@ -1,0 +1,350 @@
+#include "cloud_content_sync/upload.h"
+#include "cloud_content_sync/names.h"
+#include <algorithm>
+#include <cerrno>
+#include <fcntl.h>
+#include <unistd.h>
+
+namespace cloud {
+
+static constexpr int NAMES_MAX = 1000;
+static constexpr int PUTS_MAX = 20; // each sends the whole body
+static constexpr int LOOKS_MAX = 2;
+// After the last byte the service may need time to store a large file.
+static constexpr auto ANSWER_LIMIT = std::chrono::seconds(300);
+// A cancelled upload waits this long for the answer that says whether there is something to remove.
+static constexpr auto CANCELLED_LIMIT = std::chrono::seconds(15);
+
+Upload::Upload(Client &owner, UploadRequest request) : client(owner), wanted(std::move(request)) {}
+
+Upload::~Upload()
+{
+    client.http.abort(transfer_now);
+    if (fd >= 0)
+        close(fd);
+}
+
+void Upload::start()
+{
+    const auto known = credentials_load(client.service.name);
+    if (!known)
+        return finish(CLOUD_CONTENT_SYNC_ERROR_NO_ACCOUNT);
+    credentials = *known;
+    target = wanted.server_path;
+    if (!path_is_valid(target) || target == "/")
+        return finish(CLOUD_CONTENT_SYNC_ERROR_BAD_NAME);
+    if (!open_local())
+        return finish(CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE);
+    percent = 0;
+    client.report_progress(wanted, percent);
+    put();
+}
+
+bool Upload::open_local()
+{
+    // A FIFO without a writer would block the open of a plain O_RDONLY.
+    fd = open(wanted.local_path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
+    return fd >= 0 && fstat(fd, &local) == 0 && S_ISREG(local.st_mode);
+}
+
+bool Upload::local_changed() const
+{
+    struct stat now = {};
+    return fstat(fd, &now) != 0 || now.st_size != local.st_size || now.st_mtim.tv_sec != local.st_mtim.tv_sec ||
+           now.st_mtim.tv_nsec != local.st_mtim.tv_nsec;
+}
+
+void Upload::step()
+{
+    if (ended || is_removing)
+        return;
+    if (!client.is_wanted(wanted.id)) {
+        if (is_putting && transfer_now && whole_file_read()) {
+            // The service may have stored it already; its answer tells.
+            transfer_now->stall_limit = std::min<std::chrono::seconds>(transfer_now->stall_limit, CANCELLED_LIMIT);
+            return;
+        }
+        client.http.abort(transfer_now);
+        transfer_now = nullptr;
+        return created ? remove_stored(0) : finish(0);
+    }
+    const int now = local.st_size > 0 ? static_cast<int>(sent * 100 / local.st_size) : 0;
+    if (is_putting && now > percent) {
+        percent = now;
+        client.report_progress(wanted, percent);
+    }
+}
+
+size_t Upload::read(char *buffer, size_t size)
+{
+    const auto left = static_cast<size_t>(local.st_size - sent);
+    ssize_t got = 0;
+    do
+        got = ::pread(fd, buffer, std::min(size, left), sent);
+    while (got < 0 && errno == EINTR);
+    if (got < 0 || (got == 0 && left > 0)) {
+        read_error = got < 0 ? CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE : CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED;
+        return READ_FAILED;
+    }
+    g_checksum_update(checksum.get(), reinterpret_cast<const guchar *>(buffer), got);
+    sent += got;
+    if (whole_file_read() && transfer_now)
+        transfer_now->stall_limit = std::max<std::chrono::seconds>(transfer_now->stall_limit, ANSWER_LIMIT);
+    return static_cast<size_t>(got);
+}
+
+void Upload::request(std::unique_ptr<Transfer> transfer, void (Upload::*then)(const Transfer &))
+{
+    transfer->done = [this, then](Transfer &done) {
+        transfer_now = nullptr;
+        (this->*then)(done);
+    };
+    transfer_now = client.http.start(std::move(transfer), credentials);
+}
+
+void Upload::put()
+{
+    if (++puts > PUTS_MAX)
+        return finish(CLOUD_CONTENT_SYNC_ERROR_SERVER);
+    checksum.reset(g_checksum_new(G_CHECKSUM_SHA256));
+    sent = 0;
+    auto transfer = std::make_unique<Transfer>();
+    transfer->method = "PUT";
+    transfer->path = target;
+    // RFC 9110, 13.1.2: nothing of that name may exist. RFC 9530, 4: the digest of what is stored is welcome.
+    transfer->headers = {"If-None-Match: *", "Content-Type: application/octet-stream", "Want-Repr-Digest: sha-256=10"};
+    transfer->body_size = local.st_size;
+    transfer->read = [this](char *buffer, size_t size) { return read(buffer, size); };
+    is_putting = true;
+    request(std::move(transfer), &Upload::put_ended);
+}
+
+void Upload::put_ended(const Transfer &transfer)
+{
+    is_putting = false;
+    if (whole_file_read())
+        digest = g_checksum_get_string(checksum.get());
+    if (transfer.is_success())
+        return stored(transfer);
+    if (read_error)
+        return finish(read_error);
+    if (transfer.result != CURLE_OK)
+        return put_unanswered(transfer);
+    if (transfer.status == 412 && lost_reply)
+        return look(true, &Upload::settled);
+    if (transfer.status == 412)
+        return try_next_name();
+    if (transfer.status == 405 || transfer.status == 409)
+        return look(false, &Upload::occupied);
+    finish(transfer.error());
+}
+
+void Upload::put_unanswered(const Transfer &transfer)
+{
+    const bool stalled_midway = transfer.result == CURLE_OPERATION_TIMEDOUT && !whole_file_read();
+    if (transfer.never_sent() || stalled_midway || !client.is_wanted(wanted.id))
+        return finish(transfer.error());
+    if (lost_reply)
+        return finish(CLOUD_CONTENT_SYNC_ERROR_NETWORK); // the second attempt was lost as well
+    lost_reply = true;
+    look(true, &Upload::settled);
+}
+
+// After an attempt without an answer: is it there?
+void Upload::settled(const Look &result)
+{
+    if (result.error)
+        return finish(result.error);
+    if (result.found == Found::SAME)
+        return verified(result);
+    if (result.found == Found::ABSENT)
+        return put();
+    try_next_name();
+}
+
+// After a refusal that a folder of that name explains.
+void Upload::occupied(const Look &result)
+{
+    if (!result.error && result.found != Found::ABSENT)
+        return try_next_name();
+    // The destination folder is missing, or the service forbids the name.
+    finish(CLOUD_CONTENT_SYNC_ERROR_FORBIDDEN);
+}
+
+void Upload::try_next_name()
+{
+    if (++names_tried > NAMES_MAX)
+        return finish(CLOUD_CONTENT_SYNC_ERROR_FORBIDDEN);
+    target = join(parent_of(target), next_free_name(name_of(target)));
+    lost_reply = false;
+    // Looking costs less than sending a body in vain.
+    look(false, &Upload::next_name_looked_at);
+}
+
+void Upload::next_name_looked_at(const Look &result)
+{
+    if (result.error)
+        return finish(result.error);
+    if (result.found == Found::ABSENT)
+        return put();
+    try_next_name();
+}
+
+// "sha-256=:BASE64:" among other digests (RFC 9530, 3); the digest in hexadecimal digits, or "".
+static std::string sha256_of(const std::string &repr_digest)
+{
+    static constexpr char START[] = "sha-256=:";
+    const size_t start = repr_digest.find(START);
+    if (start == repr_digest.npos)
+        return "";
+    const size_t begin = start + sizeof START - 1;
+    const size_t end = repr_digest.find(':', begin);
+    if (end == repr_digest.npos)
+        return "";
+    gsize size = 0;
+    g_autofree guchar *bytes = g_base64_decode(repr_digest.substr(begin, end - begin).c_str(), &size);
+    std::string hex;
+    for (gsize i = 0; i < size; i++) {
+        static constexpr char DIGITS[] = "0123456789abcdef";
+        hex.append({DIGITS[bytes[i] >> 4], DIGITS[bytes[i] & 15]});
+    }
+    return hex;
+}
+
+void Upload::stored(const Transfer &transfer)
+{
+    // 201: made by this request; 200 and 204 would mean that something was there and the condition was ignored.
+    created = transfer.status == 201;
+    stored_etag = transfer.etag;
+    if (!client.is_wanted(wanted.id))
+        return created ? remove_stored(0) : finish(0);
+    if (local_changed())
+        return remove_stored(CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED);
+    if (!whole_file_read())
+        return remove_stored(CLOUD_CONTENT_SYNC_ERROR_CORRUPTED);
+    const std::string answered = sha256_of(transfer.repr_digest);
+    if (answered.empty())
+        return look(true, &Upload::verified);
+    verified({answered == digest ? Found::SAME : Found::DIFFERENT, 0});
+}
+
+void Upload::verified(const Look &result)
+{
+    if (result.error)
+        return finish(result.error);
+    // What differs may be another client's by now, so it stays.
+    if (result.found != Found::SAME)
+        return finish(CLOUD_CONTENT_SYNC_ERROR_CORRUPTED);
+    if (local_changed())
+        return remove_stored(CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED);
+    const ContentRow row{parent_of(target), name_of(target), local.st_size, time(nullptr), stored_etag};
+    if (!client.report_done(wanted, row))
+        return remove_stored(0); // cancelled in the last moment
+    ended = true;
+}
+
+void Upload::look(bool by_digest, LookDone then)
+{
+    look_by_digest = by_digest;
+    look_done = then;
+    look_attempts++;
+    auto reader = std::make_shared<MultistatusReader>(client.service.root_path);
+    auto transfer = std::make_unique<Transfer>();
+    transfer->method = "PROPFIND";
+    transfer->path = target;
+    transfer->headers = {"Depth: 0", "Content-Type: application/xml; charset=utf-8"};
+    transfer->body = propfind_body(by_digest);
+    transfer->write = [reader](const char *data, size_t size) { return reader->feed(data, size); };
+    transfer->done = [this, reader](Transfer &done) {
+        transfer_now = nullptr;
+        looked(done, *reader);
+    };
+    transfer_now = client.http.start(std::move(transfer), credentials);
+}
+
+void Upload::finish_look(const Look &result)
+{
+    look_attempts = 0;
+    (this->*look_done)(result);
+}
+
+void Upload::looked(const Transfer &transfer, MultistatusReader &reader)
+{
+    if (transfer.result != CURLE_OK && look_attempts < LOOKS_MAX)
+        return look(look_by_digest, look_done);
+    if (transfer.result == CURLE_OK && transfer.status == 404)
+        return finish_look({Found::ABSENT, 0});
+    // Services redirect the path of a folder that lacks its final "/".
+    if (transfer.result == CURLE_OK && transfer.status >= 300 && transfer.status < 400)
+        return finish_look({Found::DIFFERENT, 0});
+    if (transfer.result != CURLE_OK || transfer.status != 207)
+        return finish_look({Found::ABSENT, transfer.error()});
+    if (!reader.finish() || reader.entries.empty())
+        return finish_look({Found::ABSENT, CLOUD_CONTENT_SYNC_ERROR_SERVER});
+    const DavEntry &entry = reader.entries.front();
+    const bool may_be_same = !entry.is_folder && whole_file_read() && (entry.size < 0 || entry.size == local.st_size);
+    if (!look_by_digest || !may_be_same)
+        return finish_look({Found::DIFFERENT, 0});
+    if (entry.sha256.empty())
+        return read_back();
+    finish_look({entry.sha256 == digest ? Found::SAME : Found::DIFFERENT, 0});
+}
+
+// The service knows no digests: the file is read back.
+void Upload::read_back()
+{
+    struct Sum {
+        std::unique_ptr<GChecksum, decltype(&g_checksum_free)> checksum{g_checksum_new(G_CHECKSUM_SHA256),
+                                                                        g_checksum_free};
+        long long size = 0;
+    };
+    auto sum = std::make_shared<Sum>();
+    auto transfer = std::make_unique<Transfer>();
+    transfer->method = "GET";
+    transfer->path = target;
+    transfer->write = [this, sum](const char *data, size_t size) {
+        sum->size += static_cast<long long>(size);
+        g_checksum_update(sum->checksum.get(), reinterpret_cast<const guchar *>(data), static_cast<gssize>(size));
+        return sum->size <= local.st_size;
+    };
+    transfer->done = [this, sum](Transfer &done) {
+        transfer_now = nullptr;
+        if (sum->size > local.st_size)
+            return finish_look({Found::DIFFERENT, 0});
+        if (done.result == CURLE_OK && done.status == 404)
+            return finish_look({Found::ABSENT, 0});
+        if (done.result != CURLE_OK || done.status != 200)
+            return finish_look({Found::ABSENT, done.error()});
+        const bool same = digest == g_checksum_get_string(sum->checksum.get());
+        finish_look({same ? Found::SAME : Found::DIFFERENT, 0});
+    };
+    transfer_now = client.http.start(std::move(transfer), credentials);
+}
+
+// Takes back what this request has stored, then ends with `error` (0: cancelled, nobody is told).
+void Upload::remove_stored(int error)
+{
+    if (!created)
+        return finish(error);
+    is_removing = true;
+    auto transfer = std::make_unique<Transfer>();
+    transfer->method = "DELETE";
+    transfer->path = target;
+    // A weak validator never matches (RFC 9110, 13.1.1).
+    if (!stored_etag.empty() && stored_etag.compare(0, 2, "W/") != 0)
+        transfer->headers = {"If-Match: " + stored_etag};
+    transfer->done = [this, error](Transfer &) {
+        transfer_now = nullptr;
+        finish(error);
+    };
+    transfer_now = client.http.start(std::move(transfer), credentials);
+}
+
+void Upload::finish(int error)
+{
+    ended = true;
+    // After a cancel nobody is there to be told.
+    client.report_failed(wanted, error);
+}
+
+} // namespace cloud

@@ -1,0 +1,86 @@
+#pragma once
+// One upload, from the opening of the local file to its last callback.
+#include "cloud_content_sync/client.h"
+#include "cloud_content_sync/dav.h"
+#include <glib.h>
+#include <sys/stat.h>
+
+namespace cloud {
+
+// All functions on the client thread.
+class Upload {
+  public:
+    Upload(Client &client, UploadRequest request);
+    ~Upload();
+    Upload(const Upload &) = delete;
+    Upload &operator=(const Upload &) = delete;
+
+    void start();
+    // Reports progress and takes note of a cancel. It is called often, and never from within a libcurl callback, so
+    // what it calls may do as it likes.
+    void step();
+    bool has_ended() const
+    {
+        return ended;
+    }
+
+  private:
+    // What a look at a server path found.
+    enum class Found { ABSENT, SAME, DIFFERENT };
+    struct Look {
+        Found found = Found::ABSENT;
+        int error = 0; // not zero: the service could not be asked, `found` means nothing
+    };
+    using LookDone = void (Upload::*)(const Look &);
+
+    bool open_local();
+    bool local_changed() const;
+    size_t read(char *buffer, size_t size);
+    void put();
+    void put_ended(const Transfer &transfer);
+    void put_unanswered(const Transfer &transfer);
+    void stored(const Transfer &transfer);
+    void verified(const Look &look);
+    void settled(const Look &look);
+    void occupied(const Look &look);
+    void try_next_name();
+    void next_name_looked_at(const Look &look);
+    // Compares what is stored under `target` with what was sent; by_digest false: only whether something is there.
+    void look(bool by_digest, LookDone then);
+    void looked(const Transfer &transfer, MultistatusReader &reader);
+    void read_back();
+    void finish_look(const Look &result);
+    void request(std::unique_ptr<Transfer> transfer, void (Upload::*ended)(const Transfer &));
+    void remove_stored(int error);
+    void finish(int error);
+    bool whole_file_read() const
+    {
+        return sent == local.st_size;
+    }
+
+    Client &client;
+    const UploadRequest wanted;
+    Credentials credentials;
+    int fd = -1;
+    struct stat local = {};
+    std::unique_ptr<GChecksum, decltype(&g_checksum_free)> checksum{nullptr, g_checksum_free};
+    std::string digest; // hexadecimal, once the file was read whole
+    std::string target; // server path of the current attempt
+    long long sent = 0; // bytes of the current attempt
+    int percent = -1;   // last one reported
+    int read_error = 0;
+    int puts = 0;
+    bool lost_reply = false; // an attempt for `target` ended without an answer
+    bool created = false;    // this request made what is stored under `target`
+    std::string stored_etag;
+    int names_tried = 0;
+    int look_attempts = 0;
+    bool look_by_digest = false;
+    LookDone look_done = nullptr;
+    Transfer *transfer_now = nullptr;
+    bool is_putting = false;
+    bool is_removing = false;
+    bool ended = false;
+};
+
+} // namespace cloud

@@ -1,0 +1,172 @@
+#include "notification/store.h"
+#include "base/base.h"
+
+namespace {
+
+// `boot` names the start of the machine after which a volatile notification is void. AUTOINCREMENT keeps the id of a
+// deleted notification from becoming another one's while somebody still holds it.
+constexpr const char *SCHEMA =
+    "CREATE TABLE IF NOT EXISTS notification ("
+    " id INTEGER PRIMARY KEY AUTOINCREMENT, package TEXT NOT NULL, type INTEGER NOT NULL, flags INTEGER NOT NULL,"
+    " layout INTEGER NOT NULL, places INTEGER NOT NULL, progress REAL NOT NULL, title TEXT, content TEXT, info TEXT,"
+    " info_sub TEXT, icon TEXT, indicator TEXT, launch TEXT, boot TEXT, closed INTEGER NOT NULL DEFAULT 0)";
+
+Db *store()
+{
+    return platform_thread_db("notifications.db", SCHEMA);
+}
+
+void bind(Stmt &statement, int index, const notification_s::Text &text)
+{
+    if (text)
+        statement.bind(index, *text);
+}
+
+notification_s::Text read(const Stmt &statement, int column)
+{
+    if (statement.null(column))
+        return std::nullopt;
+    return statement.text(column);
+}
+
+// Runs a change of one notification; true when there was one.
+bool change(Db &db, Stmt &statement, bool &failed)
+{
+    failed = !statement.done();
+    return !failed && sqlite3_changes(db.handle.get()) > 0;
+}
+
+} // namespace
+
+int text_index(int type)
+{
+    switch (type) {
+    case NOTIFICATION_TEXT_TYPE_TITLE:
+        return 0;
+    case NOTIFICATION_TEXT_TYPE_CONTENT:
+        return 1;
+    case NOTIFICATION_TEXT_TYPE_INFO_1:
+        return 2;
+    case NOTIFICATION_TEXT_TYPE_INFO_SUB_2:
+        return 3;
+    default:
+        return -1;
+    }
+}
+
+bool store_insert(notification_s &noti)
+{
+    Db *db = store();
+    if (!db)
+        return false;
+    Stmt(*db, "DELETE FROM notification WHERE boot <> ?1").bind(1, platform_boot_id()).done();
+    Stmt insert(*db, "INSERT INTO notification (package, type, flags, layout, places, progress, title, content, info,"
+                     " info_sub, icon, indicator, launch, boot)"
+                     " VALUES (?1, ?2, ?3, ?4, ?5, ?6, ?7, ?8, ?9, ?10, ?11, ?12, ?13, ?14) RETURNING id");
+    insert.bind(1, noti.package);
+    int index = 2;
+    for (const int number : {noti.type, noti.flags, noti.layout, noti.places})
+        insert.bind(index++, static_cast<long long>(number));
+    insert.bind(index++, noti.progress);
+    for (const auto &text : noti.texts)
+        bind(insert, index++, text);
+    for (const auto &image : noti.images)
+        bind(insert, index++, image);
+    if (noti.launch)
+        insert.bind(index, noti.launch->text);
+    if (noti.flags & NOTIFICATION_PROP_VOLATILE_DISPLAY)
+        insert.bind(index + 1, platform_boot_id());
+    if (!insert.row())
+        return false;
+    const int id = static_cast<int>(insert.integer(0));
+    if (!insert.done())
+        return false;
+    noti.id = id;
+    return true;
+}
+
+std::vector<notification_s> store_list(const char *package, int id)
+{
+    std::vector<notification_s> list;
+    Db *db = store();
+    if (!db)
+        return list;
+    Stmt select(*db, "SELECT id, package, type, flags, layout, places, progress, title, content, info, info_sub, icon,"
+                     " indicator, launch, closed FROM notification WHERE (?1 IS NULL OR package = ?1)"
+                     " AND (?2 = 0 OR id = ?2) AND (boot IS NULL OR boot = ?3) ORDER BY id");
+    select.bind(1, package).bind(2, static_cast<long long>(id)).bind(3, platform_boot_id());
+    while (select.row()) {
+        notification_s &noti = list.emplace_back();
+        noti.id = static_cast<int>(select.integer(0));
+        noti.package = select.text(1);
+        int column = 2;
+        for (int *number : {&noti.type, &noti.flags, &noti.layout, &noti.places})
+            *number = static_cast<int>(select.integer(column++));
+        noti.progress = select.real(column++);
+        for (auto &text : noti.texts)
+            text = read(select, column++);
+        for (auto &image : noti.images)
+            image = read(select, column++);
+        if (const auto launch = read(select, column++))
+            noti.launch = bundle{*launch};
+        noti.closed = select.integer(column) != 0;
+    }
+    return list;
+}
+
+bool store_set_content(const std::string &package, int id, const char *content, bool &failed)
+{
+    Db *db = store();
+    failed = !db;
+    if (!db)
+        return false;
+    Stmt update(*db, "UPDATE notification SET content = ?3 WHERE id = ?1 AND package = ?2");
+    update.bind(1, static_cast<long long>(id)).bind(2, package).bind(3, content);
+    return change(*db, update, failed);
+}
+
+bool store_set_progress(const std::string &package, int id, double progress, bool &failed)
+{
+    Db *db = store();
+    failed = !db;
+    if (!db)
+        return false;
+    Stmt update(*db, "UPDATE notification SET progress = ?3 WHERE id = ?1 AND package = ?2");
+    update.bind(1, static_cast<long long>(id)).bind(2, package).bind(3, progress);
+    return change(*db, update, failed);
+}
+
+bool store_delete(const std::string &package, int id, bool &failed)
+{
+    Db *db = store();
+    failed = !db;
+    if (!db)
+        return false;
+    Stmt remove(*db, "DELETE FROM notification WHERE id = ?1 AND package = ?2");
+    remove.bind(1, static_cast<long long>(id)).bind(2, package);
+    return change(*db, remove, failed);
+}
+
+bool store_delete_type(const std::string &package, int type)
+{
+    Db *db = store();
+    if (!db)
+        return false;
+    Stmt remove(*db, "DELETE FROM notification WHERE package = ?1 AND (?2 = -1 OR type = ?2)");
+    return remove.bind(1, package).bind(2, static_cast<long long>(type)).done();
+}
+
+void store_set_closed(int id)
+{
+    if (Db *db = store())
+        Stmt(*db, "UPDATE notification SET closed = 1 WHERE id = ?1").bind(1, static_cast<long long>(id)).done();
+}
+
+long long store_version()
+{
+    Db *db = store();
+    if (!db)
+        return 0;
+    Stmt version(*db, "PRAGMA data_version");
+    return version.row() ? version.integer(0) : 0;
+}

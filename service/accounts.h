@@ -1,0 +1,54 @@
+#pragma once
+// The accounts: who may sign in, by what, and how much each may store. Main thread only.
+#include "base/base.h"
+#include "tree.h"
+#include <map>
+#include <set>
+
+struct Account {
+    long long id = 0;
+    std::string email, display_name;
+    int64_t quota = 0;    // bytes
+    int64_t used = 0;     // bytes of the regular files in the folder
+    int64_t reserved = 0; // bytes that uploads under way may still add
+    Fd folder;            // the account's root folder
+
+    // Counts bytes that came (or went). What people do to the tree by hand is only seen by the next start's recount.
+    void count(int64_t bytes)
+    {
+        used = std::max<int64_t>(0, used + bytes);
+    }
+    // Bytes that may still be stored.
+    int64_t left() const
+    {
+        return std::max<int64_t>(0, quota - used - reserved);
+    }
+};
+
+class Accounts {
+  public:
+    // `db` and `files`, the folder that holds one folder per account, are borrowed for the object's life. False when
+    // the tables cannot be made.
+    bool open(Db &database, int files);
+    // Adds the account, or sets only the quota of one that exists (quota < 0: leaves it). False and a reason for
+    // people when the address or the password is no good or the database fails.
+    bool add(const std::string &email, const std::string &password, int64_t quota, std::string &reason);
+    // A new token of 256 random bits; only its SHA-256 is kept. Empty when there is no such account.
+    std::string issue_token(const std::string &email);
+    // Reads the value of an Authorization header (RFC 6750 Bearer, RFC 7617 Basic; null is allowed). Null when it
+    // proves nothing. The account stays valid and at its address for the object's life.
+    Account *authorize(const char *header);
+
+  private:
+    Account *by_id(long long id);
+    Account *by_token(const std::string &token);
+    Account *by_password(const std::string &email, const std::string &password);
+
+    Db *db = nullptr;
+    int root = -1;
+    std::map<long long, Account> loaded;
+    // Passwords that were right before, so that not every request of a Basic client pays for the slow hash: a keyed
+    // hash, with a key of this process, of the password and the hash it was checked against.
+    std::string key;
+    std::set<std::string> proved;
+};

@@ -1,0 +1,105 @@
+#pragma once
+// What the handlers of requests share. All of it runs on the main loop.
+#include "locks.h"
+#include "metadata.h"
+#include <ctime>
+#include <functional>
+#include <libsoup/soup.h>
+
+// Disturbances that tests ask for; see README.md.
+struct Faults {
+    int fail_count = 0, fail_status = 500; // the next fail_count PUT requests are answered with fail_status
+    unsigned delay = 0;                    // milliseconds to wait after each 64 KiB of a PUT's body
+    int lose_reply = 0;                    // the PUT (counted down) whose answer is lost
+};
+
+struct Service {
+    Db db;
+    Accounts accounts;
+    Metadata metadata;
+    Locks locks;
+    Fd files, temporary; // the folders of the accounts and of unfinished work, on one file system
+    Faults faults;
+    int busy = 0; // jobs on other threads
+};
+
+struct Upload;
+struct Request {
+    Service *service = nullptr;
+    SoupServerMessage *message = nullptr; // borrowed: the request lives as long as the message
+    Account *account = nullptr;           // borrowed
+    Path path;                            // empty for addresses outside /dav/
+    bool is_dav = false;
+    std::vector<std::string> tokens; // of locks, that the request has named
+    Upload *upload = nullptr;        // owned; of a PUT whose body is being received
+    int jobs = 0;                    // on other threads, for this request
+    int64_t body_bytes = 0;          // received so far, of methods other than PUT
+
+    const char *method() const
+    {
+        return soup_server_message_get_method(message);
+    }
+    // The value of a header of the request, or null.
+    const char *header(const char *name) const
+    {
+        return soup_message_headers_get_one(soup_server_message_get_request_headers(message), name);
+    }
+    void set_header(const char *name, const std::string &value) const
+    {
+        soup_message_headers_replace(soup_server_message_get_response_headers(message), name, value.c_str());
+    }
+    // Answers with the status and no body, or with a body that `type` describes.
+    void answer(int status) const
+    {
+        soup_server_message_set_status(message, static_cast<guint>(status), nullptr);
+    }
+    void answer(int status, const char *type, const std::string &body) const;
+    // The folder that holds path.name(), empty and errno when it cannot be opened. The path is not the root.
+    Fd parent() const
+    {
+        return open_folder(account->folder.fd, path, path.parts.size() - 1);
+    }
+    // The whole body; not of an upload.
+    std::string body() const;
+    // What is at the path; kind NONE when nothing is.
+    Entry look_up() const;
+};
+
+// Sends every request below `server` to the handlers. The service is borrowed for the server's life.
+void serve(SoupServer *server, Service *service);
+// Ends a request whose body is still arriving: at once when much of it may be left, else with the end of the body.
+void refuse(Request &request, int status);
+// The status that the If-Match, If-None-Match and If-(Un)Modified-Since headers demand for a resource (RFC 9110, 13): 0
+// to go on, 412, or 304 for GET and HEAD. An entry of kind NONE is a resource that does not exist.
+int check_conditions(const Request &request, const Entry &entry);
+// Reads the If header and keeps its tokens. 0 to go on, 412 when it does not hold, 400 when it cannot be read.
+int check_if_header(Request &request);
+// What a change touches: the content or properties of a resource; also its name, and so the folder it is in; also what
+// is below it.
+enum class Reach { CONTENT, NAME, NAME_AND_BELOW };
+// Whether locks allow the change to somebody with the request's tokens; if not the answer is 423.
+bool may_change(Request &request, const Path &path, Reach reach);
+// Runs `work` on another thread while the request waits, then `done` on the main loop; `done` answers, or calls this
+// again. Both run also when the client has gone meanwhile. `work` must touch nothing that the main loop uses.
+void in_thread(Request &request, std::function<void()> work, std::function<void()> done);
+std::string http_date(int64_t nanoseconds);
+// The value of a Repr-Digest header (RFC 9530) for 64 hexadecimal digits.
+std::string repr_digest(const std::string &sha256_hex);
+std::string content_type(const std::string &name);
+
+// One handler per method. They answer the request.
+void dav_options(Request &request);
+void dav_get(Request &request); // and HEAD
+void dav_delete(Request &request);
+void dav_mkcol(Request &request);
+void dav_copy_move(Request &request, bool move);
+void dav_propfind(Request &request);
+void dav_proppatch(Request &request);
+void dav_lock(Request &request);
+void dav_unlock(Request &request);
+// PUT: begin when the headers are there, chunk by chunk, finish with the end of the body; dropped when the connection
+// broke before that.
+void put_begin(Request &request);
+void put_chunk(Request &request, GBytes *chunk);
+void put_finish(Request &request);
+void put_drop(Request &request);

@@ -1,0 +1,14 @@
+#pragma once
+// What the application shell's own files share. Main loop only.
+#include "velora_common/velora_app_data.h"
+
+// Builds window, background, conformant, layout and naviframe into AppData, once per process; first_mode is the mode
+// of the first request. Each failure is logged and leaves the later fields null.
+void __create_main_view(AppData *ad, int first_mode);
+
+// Reads the colour and font tables and applies them to the theme.
+void __changeable_colors_set(AppData *ad);
+void __changeable_font_set(AppData *ad);
+
+// Sets is_landscape from the window's rotation, unless the person has locked the rotation.
+void __velora_update_landscape_mode(AppData *ad);

@@ -1,0 +1,116 @@
+// Names of files, and the destination that takes no name which the folder already has.
+#include "velora_upload_file/upload_internal.h"
+#include <Ecore_File.h>
+#include <cstdlib>
+#include <cstring>
+#include <string>
+
+// The last dot of the name's last component, or null.
+static const char *__find_last_dot(const char *name)
+{
+    for (const char *c = name + std::strlen(name); c > name;) {
+        --c;
+        if (*c == '.')
+            return c;
+        if (*c == '/')
+            return nullptr;
+    }
+    return nullptr;
+}
+
+char *__get_file_ext_name(const char *name)
+{
+    if (!name) {
+        VELORA_LOGE("Invalid argument");
+        return nullptr;
+    }
+    const char *dot = __find_last_dot(name);
+    return dot ? g_strdup(dot + 1) : nullptr;
+}
+
+char *__get_file_base_name(const char *name)
+{
+    if (!name) {
+        VELORA_LOGE("Invalid argument");
+        return nullptr;
+    }
+    const char *dot = __find_last_dot(name);
+    return dot ? g_strndup(name, static_cast<gsize>(dot - name)) : nullptr;
+}
+
+// A base such as "photo(3)" with a counter of 1 or more: its stem, and the counter. 0 when it has none.
+static long __get_counter(const std::string &base, std::string *stem)
+{
+    if (base.empty() || base.back() != ')')
+        return 0;
+    const size_t open = base.rfind('(', base.size() - 1);
+    if (open == std::string::npos)
+        return 0;
+    const long counter = std::strtol(base.c_str() + open + 1, nullptr, 10);
+    if (counter < 1 || counter >= INT32_MAX) // the next number must be one that can be written
+        return 0;
+    *stem = base.substr(0, open);
+    return counter;
+}
+
+// The name that follows `base`.`ext`; a name without a dot has no ext and keeps none.
+static char *__check_file_name_postfix(const char *base, const char *ext)
+{
+    std::string stem;
+    const long counter = __get_counter(base, &stem);
+    const std::string tail = ext ? std::string(".") + ext : std::string();
+    std::string head = counter ? stem : std::string(base);
+    const std::string number = "(" + std::to_string(counter + 1) + ")";
+    // No file system takes more than 255 bytes: the head gives way, by whole characters.
+    constexpr size_t most = 255;
+    while (head.size() + number.size() + tail.size() > most && !head.empty()) {
+        size_t cut = head.size() - 1;
+        while (cut > 0 && (static_cast<unsigned char>(head[cut]) & 0xC0) == 0x80)
+            cut--;
+        head.resize(cut);
+    }
+    return g_strdup((head + number + tail).c_str());
+}
+
+static bool __check_same_file_cb(cloud_content_sync_content_h content, int error, void *data)
+{
+    auto *vd = static_cast<UploadViewData *>(data);
+    if (error != 0) {
+        VELORA_LOGE("__content_info_cb failed");
+        return true;
+    }
+    if (!content || !vd) {
+        VELORA_LOGE("Invalid argument");
+        return true;
+    }
+    char *name = nullptr;
+    cloud_content_sync_content_get_name(content, &name);
+    if (name && g_strcmp0(name, vd->new_name) == 0) {
+        char *base = __get_file_base_name(name);
+        char *ext = __get_file_ext_name(name);
+        g_free(vd->new_name);
+        vd->new_name = __check_file_name_postfix(base ? base : name, base ? ext : nullptr);
+        g_free(base);
+        g_free(ext);
+    }
+    std::free(name);
+    return true;
+}
+
+char *__get_upload_server_path(UploadViewData *vd, const char *local_path)
+{
+    vd->new_name = g_strdup(ecore_file_file_get(local_path));
+    char *previous = nullptr;
+    while (g_strcmp0(vd->new_name, previous) != 0) {
+        g_free(previous);
+        previous = g_strdup(vd->new_name);
+        if (vd->folder)
+            cloud_content_sync_folder_foreach_content_from_db(nullptr, vd->folder, __check_same_file_cb, vd);
+    }
+    const char *folder = vd->ad->folder_path ? vd->ad->folder_path : "/";
+    char *destination = g_strdup_printf(std::strcmp(folder, "/") == 0 ? "%s%s" : "%s/%s", folder, vd->new_name);
+    g_free(previous);
+    g_free(vd->new_name);
+    vd->new_name = nullptr;
+    return destination;
+}

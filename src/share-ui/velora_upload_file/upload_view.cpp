@@ -1,0 +1,370 @@
+// The upload view's life: built by a share or a result, left by Back, Cancel or a failure.
+#include "velora_common/velora_local_data.h"
+#include "velora_common/velora_network.h"
+#include "velora_common/velora_paths.h"
+#include "velora_common/velora_popup.h"
+#include "velora_common/velora_thread.h"
+#include "velora_upload_file/upload_internal.h"
+#include <Ecore_File.h>
+#include <cstdlib>
+#include <cstring>
+
+std::atomic<UploadViewData *> s_vd = nullptr;
+
+const char *__last_segment(const char *path)
+{
+    const char *slash = path ? std::strrchr(path, '/') : nullptr;
+    return slash ? slash + 1 : path;
+}
+
+UploadItem *__upload_item_find(UploadViewData *vd, int index)
+{
+    return index < 0 ? nullptr
+                     : static_cast<UploadItem *>(g_list_nth_data(vd->ad->upload_list, static_cast<guint>(index)));
+}
+
+UploadItem *__upload_item_find_running(UploadViewData *vd, int index)
+{
+    if (!vd->thread)
+        return __upload_item_find(vd, index);
+    for (UploadItem *item : vd->run)
+        if (item->index == index)
+            return item;
+    return nullptr;
+}
+
+void __title_set(UploadViewData *vd, const char *id)
+{
+    elm_object_item_domain_translatable_part_text_set(vd->nf_item, "elm.text.title", VELORA_SHARE_DOMAIN, id);
+}
+
+void __pipe_ensure(UploadViewData *vd)
+{
+    if (!vd->pipe)
+        vd->pipe = _velora_common_pipe_add(__pipe_cb, vd);
+}
+
+void __destroy_view(UploadViewData *vd)
+{
+    VELORA_LOGI("__destroy_view is called!");
+    if (!vd) {
+        VELORA_LOGE("vd is NULL");
+        return;
+    }
+    evas_object_smart_callback_del_full(vd->ad->naviframe, "elm,action,more_event", __more_create_folder_cb, vd);
+    __delete_all_callback_ctxpopup();
+    __worker_stop(vd);
+    if (vd->pathinfo_timer)
+        ecore_timer_del(vd->pathinfo_timer);
+    _velora_upload_list_free(&vd->ad->upload_list);
+    if (vd->noti_id != -1)
+        __progress_noti_delete(vd->noti_id);
+    if (vd->folder)
+        cloud_content_sync_folder_destroy(vd->folder);
+    _velora_common_local_data_disconnect();
+    if (vd->pipe)
+        _velora_common_pipe_del(vd->pipe);
+    if (vd->select_all_genlist)
+        remove_genlist_item(vd->select_all_genlist);
+    remove_genlist_item(vd->genlist);
+    __item_classes_free(vd);
+    __local_thumbnails_free();
+    s_vd = nullptr;
+    delete vd;
+}
+
+void _velora_upload_view_end()
+{
+    if (s_vd)
+        __destroy_view(s_vd);
+}
+
+void _velora_upload_view_abandon()
+{
+    if (s_vd)
+        __worker_stop(s_vd);
+}
+
+static void __exit_job(void *data)
+{
+    _velora_app_exit(static_cast<AppData *>(data));
+}
+
+void __leave(UploadViewData *vd)
+{
+    AppData *ad = vd->ad;
+    __destroy_view(vd);
+    ecore_job_add(__exit_job, ad);
+}
+
+static void __popup_exit_cb(void *data, Evas_Object *, void *)
+{
+    auto *vd = static_cast<UploadViewData *>(data);
+    if (!vd) {
+        VELORA_LOGE("data is NULL");
+        return;
+    }
+    if (vd != s_vd) // pressed twice
+        return;
+    _velora_app_popup_delete(vd->ad);
+    __leave(vd);
+}
+
+static void __popup_hide_cb(void *data, Evas_Object *, void *)
+{
+    auto *vd = static_cast<UploadViewData *>(data);
+    if (!vd) {
+        VELORA_LOGE("data is NULL");
+        return;
+    }
+    _velora_app_popup_delete(vd->ad);
+    _velora_upload_list_free(&vd->ad->upload_list);
+    elm_win_lower(vd->ad->win_main);
+}
+
+// Lowers the window while a worker runs; otherwise ends the view and the application.
+static void __go_away(UploadViewData *vd)
+{
+    if (vd->thread)
+        elm_win_lower(vd->ad->win_main);
+    else
+        __leave(vd);
+}
+
+static Eina_Bool __btn_back_cb(void *, Elm_Object_Item *)
+{
+    UploadViewData *vd = s_vd;
+    if (!vd) {
+        VELORA_LOGE("view is destroyed");
+        return EINA_FALSE;
+    }
+    if (vd->is_select_mode)
+        __selection_cancel(vd);
+    else if (vd->is_upload_started)
+        __go_away(vd);
+    else if (__is_at_root(vd))
+        __leave(vd);
+    else
+        __folder_go_up(vd);
+    return EINA_FALSE;
+}
+
+static void __btn_cancel_cb(void *data, Evas_Object *, void *)
+{
+    auto *vd = static_cast<UploadViewData *>(data);
+    if (!vd) {
+        VELORA_LOGE("data is NULL");
+        return;
+    }
+    evas_object_del(vd->done_btn);
+    evas_object_del(vd->cancel_btn);
+    vd->done_btn = vd->cancel_btn = nullptr;
+    __go_away(vd);
+}
+
+// The menu's entries belong to a queue: before Done, and after its end, there is nothing to offer.
+static void __more_create_folder_cb(void *data, Evas_Object *, void *)
+{
+    auto *vd = static_cast<UploadViewData *>(data);
+    if (!vd) {
+        VELORA_LOGE("data is NULL");
+        return;
+    }
+    if (vd == s_vd && vd->is_upload_started && vd->more_btn)
+        __more_menu_open(vd);
+}
+
+Evas_Object *__title_button_create(UploadViewData *vd, const char *style, const char *id, const char *part,
+                                   Evas_Smart_Cb cb)
+{
+    Evas_Object *button = elm_button_add(vd->ad->naviframe);
+    elm_object_style_set(button, style);
+    elm_object_domain_translatable_text_set(button, VELORA_SHARE_DOMAIN, id);
+    evas_object_smart_callback_add(button, "clicked", cb, vd);
+    elm_object_item_part_content_set(vd->nf_item, part, button);
+    return button;
+}
+
+static void __push_on_naviframe(UploadViewData *vd)
+{
+    vd->layout = elm_layout_add(vd->ad->naviframe);
+    elm_layout_file_set(vd->layout, _velora_common_app_file("res/edje/velora.edj").c_str(), "main");
+    if (vd->ad->launch_mode != LAUNCH_MODE_UPLOAD_RESULT)
+        __path_bar_create(vd);
+    else
+        elm_theme_extension_add(nullptr, _velora_common_app_file("res/edje/velora_genlist.edj").c_str());
+    __item_classes_create(vd);
+    vd->genlist = __genlist_create(vd);
+
+    static const char title[] = "IDS_KQ_HEADER_UPLOAD_TO_ABB2";
+    Evas_Object *back = elm_button_add(vd->ad->naviframe);
+    elm_object_style_set(back, "naviframe/end_btn/default");
+    vd->nf_item = elm_naviframe_item_push(vd->ad->naviframe, title, back, nullptr, vd->layout, nullptr);
+    __title_set(vd, title);
+    elm_naviframe_item_pop_cb_set(vd->nf_item, __btn_back_cb, vd);
+    evas_object_smart_callback_add(
+        back, "clicked",
+        [](void *nf, Evas_Object *, void *) { elm_naviframe_item_pop(static_cast<Evas_Object *>(nf)); },
+        vd->ad->naviframe);
+}
+
+static bool __cloud_client_create(UploadViewData *vd)
+{
+    AppData *ad = vd->ad;
+    if (ad->sync_handle)
+        return true;
+    if (cloud_content_sync_create(VELORA_SERVICE, &ad->sync_handle) == 0)
+        return true;
+    VELORA_LOGE("cloud_content_sync_create failed");
+    ad->sync_handle = nullptr;
+    _velora_app_popup_delete(ad);
+    ad->popup = _velora_common_create_warning_popup(ad->win_main, "IDS_CLOUD_BODY_SERVER_ERROR_OCCURRED_TRY_LATER",
+                                                    __popup_exit_cb, vd);
+    return false;
+}
+
+// False when the root folder cannot be had: the view is gone then.
+static bool __share_create(UploadViewData *vd)
+{
+    AppData *ad = vd->ad;
+    vd->more_btn = elm_button_add(ad->naviframe);
+    elm_object_style_set(vd->more_btn, "naviframe/more/default");
+    evas_object_smart_callback_add(vd->more_btn, "clicked", __more_create_folder_cb, vd);
+    evas_object_smart_callback_add(ad->naviframe, "elm,action,more_event", __more_create_folder_cb, vd);
+    elm_object_item_part_content_set(vd->nf_item, "toolbar_more_btn", vd->more_btn);
+    elm_object_disabled_set(vd->more_btn, EINA_TRUE); // its menu belongs to a queue
+    if (cloud_content_sync_folder_get_root(ad->sync_handle, &vd->folder) != 0) {
+        VELORA_LOGE("cloud_content_sync_folder_get_root failed");
+        __leave(vd);
+        return false;
+    }
+    __folder_path_take(vd);
+    VELORA_LOGI("path: %s", ad->folder_path);
+    vd->cancel_btn = __title_button_create(vd, "naviframe/title_text_left", "IDS_TPLATFORM_ACBUTTON_CANCEL_ABB",
+                                           "title_left_text_btn", __btn_cancel_cb);
+    vd->done_btn = __title_button_create(vd, "naviframe/title_text_right", "IDS_TPLATFORM_ACBUTTON_DONE_ABB",
+                                         "title_right_text_btn", __btn_upload_cb);
+    return true;
+}
+
+// Prepares the items of a result; false when one is missing.
+static bool __result_items_prepare(UploadViewData *vd)
+{
+    for (int i = 0; i < vd->ad->result_path_count; i++) {
+        UploadItem *item = __upload_item_find(vd, i);
+        if (!item) {
+            VELORA_LOGE("upload_item is NULL");
+            return false;
+        }
+        item->index = i;
+        item->size = ecore_file_size(item->path);
+        g_free(item->server_path);
+        item->server_path = __get_upload_server_path(vd, item->path);
+    }
+    return true;
+}
+
+static void __result_create(UploadViewData *vd)
+{
+    _velora_app_popup_delete(vd->ad);
+    if (!__result_items_prepare(vd))
+        return;
+    vd->is_upload_started = true;
+    __title_set(vd, "IDS_KQ_HEADER_VELORA_UPLOADS_ABB");
+    elm_object_signal_emit(vd->layout, "elm.navi.hide", "elm");
+    __result_rows_append(vd, false);
+    __pipe_ensure(vd);
+}
+
+static void __uploaded_genlist(UploadViewData *vd)
+{
+    remove_genlist_item(vd->genlist);
+    vd->ad->exit_on_pause = 1;
+    __result_rows_append(vd, true);
+}
+
+static void __reenter(UploadViewData *vd)
+{
+    _velora_app_popup_delete(vd->ad);
+    if (vd->ad->launch_mode != LAUNCH_MODE_UPLOAD_RESULT)
+        return;
+    if (__result_items_prepare(vd))
+        __uploaded_genlist(vd);
+}
+
+void _velora_upload_view_create(AppData *ad)
+{
+    if (!ad) {
+        VELORA_LOGE("ad is NULL");
+        return;
+    }
+    ad->is_welcome_shown = false;
+    if (s_vd)
+        s_vd.load()->is_end_handled = false;
+    if (!_velora_common_check_network(ad)) {
+        VELORA_LOGE("network error");
+        return;
+    }
+    _velora_common_local_data_connect();
+    if (s_vd) {
+        __reenter(s_vd);
+        return;
+    }
+    VELORA_LOGI("Create velora upload file view");
+    auto *vd = new UploadViewData;
+    s_vd = vd;
+    vd->ad = ad;
+    __push_on_naviframe(vd);
+    if (!__cloud_client_create(vd))
+        return;
+    if (ad->launch_mode == LAUNCH_MODE_UPLOAD_RESULT) {
+        __result_create(vd);
+        return;
+    }
+    if (ad->launch_mode == LAUNCH_MODE_SHARE && !__share_create(vd))
+        return;
+    __pipe_ensure(vd);
+    __meta_refresh_start(vd);
+    if (ad->is_meta_refreshed)
+        _velora_upload_view_update();
+    else
+        ad->popup = _velora_common_create_processing_popup(ad->win_main, __popup_hide_cb, vd);
+}
+
+static void __nothing_to_upload(UploadViewData *vd)
+{
+    if (vd->is_upload_started || vd->ad->upload_list || vd->ad->popup)
+        return;
+    vd->ad->popup =
+        _velora_common_create_warning_popup(vd->ad->win_main, "IDS_VELORA_BODY_NO_FILES", __popup_exit_cb, vd);
+}
+
+void _velora_upload_view_update()
+{
+    UploadViewData *vd = s_vd;
+    if (!vd) {
+        VELORA_LOGE("vd is NULL");
+        return;
+    }
+    remove_genlist_item(vd->genlist);
+    if (vd->thread) {
+        GList *entry = vd->ad->upload_list;
+        for (int i = 0; i < vd->total; i++, entry = entry->next) {
+            if (!entry) {
+                VELORA_LOGE("upload_item is NULL");
+                return;
+            }
+            auto *item = static_cast<UploadItem *>(entry->data);
+            if (item->state != UPLOAD_STATE_DONE && item->state != UPLOAD_STATE_CANCELED)
+                __upload_row_append(vd, item, i);
+        }
+    }
+    if (vd->is_upload_started) {
+        __state_show(vd, VIEW_STATE_NONE);
+        return;
+    }
+    const int rows = __folder_list_append(vd);
+    const ViewState unreachable = __meta_state();
+    __state_show(vd, rows > 0 ? VIEW_STATE_NONE : unreachable != VIEW_STATE_NONE ? unreachable : VIEW_STATE_EMPTY);
+    __nothing_to_upload(vd);
+}

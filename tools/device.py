@@ -1,0 +1,240 @@
+"""A device of one's own for demos and end-to-end tests: its folders, its bus, its display, a service with an account,
+and the means to look at the application and to click in it. Everything it starts it ends."""
+
+import base64
+import os
+import re
+import shutil
+import signal
+import subprocess
+import tempfile
+import time
+import urllib.error
+import urllib.parse
+import urllib.request
+
+EMAIL, PASSWORD = "demo@velora.example", "velora-demo"
+APP = "com.orvant.velora"
+
+
+class Trouble(Exception):
+    """Something a person should read, as one line."""
+
+
+def wait_for(what, condition, seconds=20.0, pause=0.05):
+    """The first true result of condition(); Trouble when there is none in time."""
+    end = time.monotonic() + seconds
+    while True:
+        result = condition()
+        if result:
+            return result
+        if time.monotonic() > end:
+            raise Trouble(f"waited {seconds:.0f} s in vain for {what}")
+        time.sleep(pause)
+
+
+class Device:
+    def __init__(self, build, data=None, size="480x800", language=None, scale=None, dark=False,
+                 keep_display=False):
+        self.build, self.size = build, size
+        self.home = tempfile.mkdtemp(prefix="velora-")
+        self.data = data or os.path.join(self.home, "cloud")
+        self.processes = []
+        self.env = dict(os.environ)
+        if not keep_display:
+            for name in ("DISPLAY", "WAYLAND_DISPLAY"):
+                self.env.pop(name, None)
+        self.env.update(
+            HOME=self.home,
+            XDG_CONFIG_HOME=os.path.join(self.home, "config"),
+            XDG_DATA_HOME=os.path.join(self.home, "share"),
+            XDG_CACHE_HOME=os.path.join(self.home, "cache"),
+            XDG_RUNTIME_DIR=os.path.join(self.home, "run"),
+            PLATFORM_DATA_DIR=os.path.join(self.home, "device"),
+            CLOUD_SERVICES_DIR=os.path.join(self.home, "services"),
+            VELORA_MEDIA_ROOT=os.path.join(self.home, "media"),
+            ORVANT_INSPECT="1",
+        )
+        if language:
+            self.env["LANGUAGE"] = language
+            self.env["LANG"] = "C.UTF-8"
+        if scale:
+            self.env["ELM_SCALE"] = str(scale)
+        if dark:
+            self.env["ORVANT_THEME"] = "dark"
+        for name in ("XDG_CONFIG_HOME", "XDG_DATA_HOME", "XDG_CACHE_HOME", "CLOUD_SERVICES_DIR", "VELORA_MEDIA_ROOT"):
+            os.makedirs(self.env[name], exist_ok=True)
+        os.makedirs(self.env["XDG_RUNTIME_DIR"], mode=0o700, exist_ok=True)
+        self.log = os.path.join(self.home, "log.txt")
+
+    def program(self, path):
+        return os.path.join(self.build, path)
+
+    def start(self, command, **options):
+        options.setdefault("stderr", open(self.log, "ab"))
+        process = subprocess.Popen(command, env=self.env, start_new_session=True, **options)
+        self.processes.append(process)
+        return process
+
+    def run(self, *command, **options):
+        """The standard output of a command that must succeed."""
+        options.setdefault("timeout", 60)
+        done = subprocess.run(command, env=self.env, capture_output=True, **options)
+        if done.returncode != 0:
+            words = done.stderr.decode(errors="replace").strip().splitlines()
+            raise Trouble(f"{os.path.basename(command[0])} failed: {words[-1] if words else done.returncode}")
+        return done.stdout.decode(errors="surrogateescape")
+
+    def tool(self, path, *arguments, **options):
+        return self.run(self.program(path), *arguments, **options)
+
+    # the session
+
+    def start_bus(self):
+        bus = self.start(["dbus-daemon", "--session", "--nofork", "--print-address=1"], stdout=subprocess.PIPE)
+        self.env["DBUS_SESSION_BUS_ADDRESS"] = bus.stdout.readline().decode().strip()
+
+    def start_display(self):
+        display = self.start(
+            ["Xvfb", "-displayfd", "1", "-screen", "0", f"{self.size}x24", "-nolisten", "tcp"],
+            stdout=subprocess.PIPE, stderr=subprocess.DEVNULL)
+        self.env["DISPLAY"] = ":" + display.stdout.readline().decode().strip()
+        # No frames and no menus: the window is the screen, as on a phone.
+        rules = os.path.join(self.home, "openbox.xml")
+        with open(rules, "w", encoding="utf-8") as file:
+            file.write('<openbox_config xmlns="http://openbox.org/3.4/rc"><applications>'
+                       '<application class="*" type="normal"><decor>no</decor><maximized>yes</maximized></application>'
+                       '<application class="*" type="dialog"><decor>no</decor><maximized>yes</maximized></application>'
+                       "</applications></openbox_config>")
+        self.start(["openbox", "--sm-disable", "--config-file", rules], stdout=subprocess.DEVNULL,
+                   stderr=subprocess.DEVNULL)
+        wait_for("the window manager", lambda: subprocess.run(
+            ["xdotool", "get_desktop"], env=self.env, capture_output=True).returncode == 0)
+
+    def start_notification_daemon(self):
+        if not shutil.which("dunst"):
+            return
+        rules = os.path.join(self.home, "dunstrc")
+        width = int(self.size.split("x")[0]) - 32
+        with open(rules, "w", encoding="utf-8") as file:
+            file.write(f"[global]\nwidth = {width}\norigin = top-center\noffset = 0x16\nfont = Sans 12\n"
+                       "frame_width = 1\ncorner_radius = 8\nmax_icon_size = 48\nmarkup = full\nformat = \"<b>%s</b>\\n%b\"\n"
+                       "mouse_left_click = do_action, close_current\n")
+        self.start(["dunst", "-conf", rules], stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL)
+        wait_for("the notification daemon", lambda: "org.freedesktop.Notifications" in self.run(
+            "gdbus", "call", "--session", "--dest", "org.freedesktop.DBus", "--object-path", "/", "--method",
+            "org.freedesktop.DBus.ListNames"))
+
+    # the service and the account
+
+    def start_service(self, *options):
+        cloud = self.start([self.program("service/velora-cloud"), "--root", self.data, "--listen", "127.0.0.1:0",
+                            "--add-account", f"{EMAIL}:{PASSWORD}", *options], stdout=subprocess.PIPE)
+        for line in cloud.stdout:
+            found = re.match(r"listening on (http://\S+)", line.decode())
+            if found:
+                break
+        else:
+            raise Trouble("velora-cloud does not start; its words are in " + self.log)
+        self.service = cloud
+        self.web = found.group(1).rstrip("/")
+        with open(os.path.join(self.env["CLOUD_SERVICES_DIR"], "Velora.conf"), "w", encoding="utf-8") as file:
+            file.write(f"[Service]\nWeb={self.web}/\nApi={self.web}/\nStorage={self.web}/dav/\n")
+        return cloud
+
+    def sign_in(self):
+        token = self.tool("service/velora-cloud", "--root", self.data, "--token", EMAIL).split()[-1]
+        self.tool("platform/cloud_content_sync/cloud-account", "set", "Velora", input=token.encode() + b"\n")
+        self.tool("platform/account/device-account", "add", "--package", APP, "--domain", "Velora", "--user", EMAIL)
+
+    def setting(self, key, value):
+        self.tool("platform/vconf/settings-store", "set", key, value)
+
+    def _ask(self, method, path, body=None, headers=None):
+        request = urllib.request.Request(self.web + "/dav" + urllib.parse.quote(path, errors="surrogateescape"),
+                                         data=body, method=method, headers=headers or {})
+        secret = base64.b64encode(f"{EMAIL}:{PASSWORD}".encode()).decode()
+        request.add_header("Authorization", "Basic " + secret)
+        return urllib.request.urlopen(request, timeout=60)
+
+    def make_folder(self, path):
+        """Makes a cloud folder and those above it."""
+        above = ""
+        for segment in path.strip("/").split("/"):
+            above += "/" + segment
+            try:
+                self._ask("MKCOL", above)
+            except urllib.error.HTTPError as error:
+                if error.code != 405:  # 405: it is there
+                    raise Trouble(f"the service does not make the folder {above}: {error}") from error
+
+    def put(self, path, body):
+        self._ask("PUT", path, body, {"Content-Type": "application/octet-stream"})
+
+    def get(self, path):
+        return self._ask("GET", path)
+
+    def all_files(self):
+        """The cloud paths of all files, from the service's plain tree."""
+        top = os.path.join(self.data, "files", EMAIL)
+        return {os.path.join("/", os.path.relpath(os.path.join(folder, name), top))
+                for folder, _, names in os.walk(top) for name in names}
+
+    # what a person sees and does
+
+    def visible(self):
+        """What the application shows: (kind, text, x, y, width, height), bottom to top; nothing while it is not there."""
+        done = subprocess.run(["gdbus", "call", "--session", "--dest", APP, "--object-path", "/com/orvant/Inspect",
+                               "--method", "com.orvant.Inspect.Visible"], env=self.env, capture_output=True, timeout=20)
+        if done.returncode != 0:
+            return []
+        rows = re.findall(r"\('((?:[^'\\]|\\.)*)', (?:'((?:[^'\\]|\\.)*)'|\"((?:[^\"\\]|\\.)*)\"), "
+                          r"(-?\d+), (-?\d+), (-?\d+), (-?\d+)\)", done.stdout.decode(errors="replace"))
+        return [(kind, re.sub(r"\\(.)", r"\1", single or double), *map(int, place))
+                for kind, single, double, *place in rows]
+
+    def find(self, text, kind=None):
+        found = [entry for entry in self.visible() if entry[1] == text and kind in (None, entry[0])]
+        return found[-1] if found else None
+
+    def click(self, text, kind=None, seconds=20.0):
+        """A pointer click in the middle of a text or widget, once it is there and lies still."""
+        place = wait_for(f'"{text}" on screen', lambda: self.find(text, kind), seconds)
+        while True:
+            time.sleep(0.15)
+            now = self.find(text, kind)
+            if now == place:
+                break
+            place = now or place
+        _, _, x, y, width, height = place
+        self.run("xdotool", "mousemove", str(x + width // 2), str(y + height // 2), "sleep", "0.05", "mousedown", "1",
+                 "sleep", "0.05", "mouseup", "1")
+
+    def key(self, name):
+        self.run("xdotool", "key", name)
+
+    def picture(self, path):
+        time.sleep(0.3)  # what is on its way to the screen
+        self.run("import", "-window", "root", path)
+
+    def launch(self, operation, *arguments, **options):
+        """Sends a launch request as another application would; the process prints the reply."""
+        return self.start([self.program("platform/app/velora-launch"), "--operation", operation, *arguments],
+                          stdout=subprocess.PIPE, **options)
+
+    def notifications(self):
+        return self.tool("platform/notification/notifications", "list").splitlines()
+
+    def end(self):
+        for process in reversed(self.processes):
+            if process.poll() is None:
+                try:
+                    os.killpg(process.pid, signal.SIGTERM)
+                except ProcessLookupError:
+                    pass
+        for process in reversed(self.processes):
+            try:
+                process.wait(5)
+            except subprocess.TimeoutExpired:
+                os.killpg(process.pid, signal.SIGKILL)
+        shutil.rmtree(self.home, ignore_errors=True)
