@@ -284,6 +284,11 @@ TEST_F(Bus, OpensOrdinaryPrograms)
     app_control_foreach_app_matched(request, collect, &ids);
     EXPECT_EQ(ids, (std::vector<std::string>{"second-viewer", "first-viewer"})); // the user's default first
     ids.clear();
+    app_set_id("second-viewer");
+    app_control_foreach_app_matched(request, collect, &ids);
+    app_set_id("com.example.test");
+    EXPECT_EQ(ids, std::vector<std::string>{"first-viewer"}); // nobody views for himself
+    ids.clear();
     app_control_set_mime(request, "image/x-unknown");
     EXPECT_EQ(app_control_foreach_app_matched(request, collect, &ids), APP_CONTROL_ERROR_NONE);
     EXPECT_TRUE(ids.empty());
