@@ -212,7 +212,7 @@ TEST(CommandLine, CarriesAReply)
 
 TEST(CommandLine, MakesTheFirstRequest)
 {
-    const std::string here = g_get_current_dir();
+    const std::string here = take(g_get_current_dir());
     const struct {
         std::vector<std::string> words;
         std::string operation, uri, error;

@@ -9,6 +9,7 @@
 namespace {
 app_control_h kept = nullptr;
 int requests = 0;
+bool slow_end = false;
 Evas_Object *window = nullptr;
 
 void say(const char *what)
@@ -67,7 +68,8 @@ void reset(app_control_h request, void *)
         app_control_destroy(kept);
         kept = nullptr;
     }
-    if (operation.ends_with("/reply-and-leave"))
+    slow_end = operation.ends_with("/slow-end-reply-and-leave");
+    if (operation.ends_with("reply-and-leave"))
         echo(request, request);
     if (operation.ends_with("leave"))
         elm_exit();
@@ -85,7 +87,11 @@ int main(int argc, char **argv)
         say("create");
         return true;
     };
-    callbacks.terminate = [](void *) { say("terminate"); };
+    callbacks.terminate = [](void *) {
+        say("terminate");
+        if (slow_end)
+            usleep(300'000); // saving, say, while the next request comes in
+    };
     callbacks.pause = [](void *) { say("pause"); };
     callbacks.resume = [](void *) { say("resume"); };
     callbacks.app_control = reset;
