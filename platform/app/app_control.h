@@ -6,7 +6,7 @@
 // end with NUL: a file name comes through as it is, UTF-8 or not.
 //
 // Over the session bus an application owns its id as its bus name and answers there to org.freedesktop.Application
-// (Desktop Entry Specification 1.5, "D-Bus Activation") and to
+// (desktop entries of freedesktop.org, 1.5, "D-Bus Activation") and to
 //   com.orvant.AppControl.Launch (in a{sv} request, out a{sv} reply)
 // whose answer comes when the application replies. Without a bus a request is handed over on the command line.
 //

@@ -15,7 +15,7 @@ constexpr char introspection[] = R"(<node>
 </interface>
 </node>)";
 
-enum { request_name_do_not_queue = 4, request_name_exists = 3 }; // D-Bus specification, RequestName
+enum { request_name_do_not_queue = 4, request_name_exists = 3 }; // as D-Bus numbers them for RequestName
 
 struct Receiver {
     std::string id;

@@ -3,8 +3,8 @@
 //
 // The service is a WebDAV server (RFC 4918). It is found by its name in a description file, see README.md here.
 //
-// Threads. Every function may be called from any thread, also from within a callback. Transfer and refresh callbacks run
-// on the client's own thread, one per handle and one callback at a time; folder and content callbacks run on the
+// Threads. Every function may be called from any thread, also from within a callback. Transfer and refresh callbacks
+// run on the client's own thread, one per handle and one callback at a time; folder and content callbacks run on the
 // caller's thread, before the function returns. A callback that waits holds up the client's other transfers.
 //
 // Results. Functions answer one of cloud_content_sync_error_e; output arguments are written only when it is 0. What
@@ -52,8 +52,8 @@ enum cloud_content_sync_content_type_e {
     CLOUD_CONTENT_TYPE_CAMERA = 4
 };
 
-// state: RUNNING any number of times, with `progress` 0 to 100 in percent of the bytes sent, which never goes back; then
-// exactly once DONE (progress 100) or FAILED (error not 0). file_count is 1. Client thread.
+// state: RUNNING any number of times, with `progress` 0 to 100 in percent of the bytes sent, which never goes back;
+// then exactly once DONE (progress 100) or FAILED (error not 0). file_count is 1. Client thread.
 typedef void (*cloud_content_sync_transfer_cb)(int state, int file_count, int progress, int error, void *user_data);
 // status: exactly once DONE, or FAILED with an error that is not 0. Client thread.
 typedef void (*cloud_content_sync_refresh_cb)(int status, int error, void *user_data);
@@ -64,8 +64,8 @@ typedef bool (*cloud_content_sync_content_cb)(cloud_content_sync_content_h conte
 // Opens a client of the service; nothing is sent. NO_SERVICE without a usable description, DB_FAILED when the service's
 // database cannot be opened. Nobody needs to be signed in: requests then fail with NO_ACCOUNT.
 int cloud_content_sync_create(const char *service_name, cloud_content_sync_h *handle);
-// Ends all requests and frees the handle. No callback runs any more on return: one that is running is waited for, unless
-// this is called from within it. Transfers in progress are broken off by closing their connection.
+// Ends all requests and frees the handle. No callback runs any more on return: one that is running is waited for,
+// unless this is called from within it. Transfers in progress are broken off by closing their connection.
 int cloud_content_sync_destroy(cloud_content_sync_h handle);
 
 // Whether a content type (one of IMAGE, VIDEO, CAMERA) is to be kept in step; kept in the service's database, at first
@@ -84,8 +84,8 @@ int cloud_content_sync_get_is_meta_complete(cloud_content_sync_h handle, bool *c
 
 // The root: path "/", named as the service. It is there before the first refresh as well.
 int cloud_content_sync_folder_get_root(cloud_content_sync_h handle, cloud_content_sync_folder_h *folder);
-// A folder of the database; a final "/" of the path is ignored. NOT_FOUND when there is none, INVALID_PARAMETER when the
-// path is not absolute or has an empty, "." or ".." segment.
+// A folder of the database; a final "/" of the path is ignored. NOT_FOUND when there is none, INVALID_PARAMETER when
+// the path is not absolute or has an empty, "." or ".." segment.
 int cloud_content_sync_get_folder_by_server_path(cloud_content_sync_h handle, const char *path,
                                                  cloud_content_sync_folder_h *folder);
 // NOT_FOUND for the root, and when the parent is gone from the database.
@@ -116,15 +116,16 @@ int cloud_content_sync_content_get_thumbnail_path(cloud_content_sync_content_h c
 // first callback. Uploads of one handle run one after the other, in the order in which they were asked for.
 //
 // Nothing is ever overwritten: when the name is taken, by a file or a folder, the next free one is used ("a.jpg",
-// "a(1).jpg", "a(2).jpg"; "README", "README(1)"). DONE means that the service holds a file of the same size and SHA-256;
-// a service that offers no digests has the file read back. An answer that is lost is settled by looking, not by sending
-// again; one more attempt follows when nothing is there. The file is in the database before the last callback.
+// "a(1).jpg", "a(2).jpg"; "README", "README(1)"). DONE means that the service holds a file of the same size and
+// SHA-256; a service that offers no digests has the file read back. An answer that is lost is settled by looking, not
+// by sending again; one more attempt follows when nothing is there. The file is in the database before the last
+// callback.
 //
-// cb may be null. A null or empty argument answers INVALID_PARAMETER and there is no request; all else is reported by the
-// callback: NO_ACCOUNT, LOCAL_FILE, BAD_NAME (also for a server_path that is not absolute or has an empty, "." or ".."
-// segment), FORBIDDEN (also when the folder does not exist), STORAGE_FULL, CORRUPTED, UNAUTHORIZED, SERVER, NETWORK
-// (also when nothing moves for a minute, or no answer comes for five minutes after the last byte), and LOCAL_CHANGED:
-// what was stored of the changed file is then removed.
+// cb may be null. A null or empty argument answers INVALID_PARAMETER and there is no request; all else is reported by
+// the callback: NO_ACCOUNT, LOCAL_FILE, BAD_NAME (also for a server_path that is not absolute or has an empty, "." or
+// ".." segment), FORBIDDEN (also when the folder does not exist), STORAGE_FULL, CORRUPTED, UNAUTHORIZED, SERVER,
+// NETWORK (also when nothing moves for a minute, or no answer comes for five minutes after the last byte), and
+// LOCAL_CHANGED: what was stored of the changed file is then removed.
 int cloud_content_sync_upload(cloud_content_sync_h handle, const char *local_path, const char *server_path, int *req_id,
                               cloud_content_sync_transfer_cb cb, void *user_data);
 // Where a finished upload really landed (it may be the next free name). Known until the handle is destroyed, and within

@@ -1,9 +1,9 @@
 // notification-agent: shows the notifications of the store at the session's notification daemon and acts on taps, also
 // when the program that posted one has left. It ends when nothing is left to show, or with the bus.
+#include "app/target.h"
 #include "notification/courier.h"
 #include "notification/tap.h"
 #include <algorithm>
-#include <gio/gdesktopappinfo.h>
 #include <gio/gio.h>
 #include <map>
 #include <unistd.h>
@@ -85,14 +85,11 @@ std::string body(const notification_s &noti)
 
 std::string app_name(const std::string &package)
 {
-    GDesktopAppInfo *info = g_desktop_app_info_new((package + ".desktop").c_str());
-    std::string name = info ? g_app_info_get_name(G_APP_INFO(info)) : package;
-    if (info)
-        g_object_unref(info);
-    return name;
+    const AppInfo info = desktop_entry(package);
+    return info ? g_app_info_get_name(info.get()) : package;
 }
 
-// The arguments of Notify, of the Desktop Notifications Specification 1.2.
+// The arguments of Notify, as desktop notifications 1.2 have them.
 GVariant *notify_arguments(const notification_s &noti, guint32 replaces)
 {
     const bool ongoing = noti.type == NOTIFICATION_TYPE_ONGOING;
@@ -297,7 +294,7 @@ guint32 bus_number(const char *method, GVariant *arguments)
 
 bool take_name()
 {
-    enum : guint32 { DO_NOT_QUEUE = 4, PRIMARY_OWNER = 1 }; // D-Bus Specification, RequestName
+    enum : guint32 { DO_NOT_QUEUE = 4, PRIMARY_OWNER = 1 }; // as D-Bus numbers them for RequestName
     return bus_number("RequestName", g_variant_new("(su)", NOTIFICATION_AGENT, static_cast<guint32>(DO_NOT_QUEUE))) ==
            PRIMARY_OWNER;
 }

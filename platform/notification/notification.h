@@ -3,7 +3,7 @@
 //
 // Notifications are kept in a store that all of the user's programs share, the SQLite database "notifications.db" in
 // platform_data_dir(), and stay after the program that posted them has left. On a session bus with a notification
-// daemon (org.freedesktop.Notifications, Desktop Notifications Specification 1.2) a small program, notification-agent,
+// daemon (org.freedesktop.Notifications, desktop notifications 1.2) a small program, notification-agent,
 // shows what the store holds and acts on taps; this library starts it when it does not run. Without a bus or a daemon
 // everything works on the store alone.
 //

@@ -108,8 +108,7 @@ static void __send_reply(AppData *ad, app_control_h request)
         return;
     if (ad->reply_result && app_control_add_extra_data(reply, "result", ad->reply_result) != APP_CONTROL_ERROR_NONE)
         VELORA_LOGE("app_control_add_extra_data failed");
-    if (app_control_reply_to_launch_request(reply, request, APP_CONTROL_RESULT_SUCCEEDED) !=
-        APP_CONTROL_ERROR_NONE)
+    if (app_control_reply_to_launch_request(reply, request, APP_CONTROL_RESULT_SUCCEEDED) != APP_CONTROL_ERROR_NONE)
         VELORA_LOGE("app_control_reply_to_launch_request failed");
     app_control_destroy(reply);
 }

@@ -52,8 +52,9 @@ struct UploadViewData {
     std::atomic<bool> is_uploading = false;
 
     Elm_Object_Item *nf_item = nullptr;
-    Evas_Object *state = nullptr;  // what the list area says when there is no list
-    std::vector<UploadItem *> run; // the items of the running (or last) worker, kept alive for it
+    Evas_Object *more_menu = nullptr; // is AppData's popup while it is open
+    Evas_Object *state = nullptr;     // what the list area says when there is no list
+    std::vector<UploadItem *> run;    // the items of the running (or last) worker, kept alive for it
 };
 
 // The record of a row, freed with it.
@@ -93,6 +94,8 @@ void __destroy_view(UploadViewData *vd);
 // Takes the view down and leaves the application, after the callback that asked for it has returned.
 void __leave(UploadViewData *vd);
 void __title_set(UploadViewData *vd, const char *id);
+Evas_Object *__title_button_create(UploadViewData *vd, const char *style, const char *id, const char *part,
+                                   Evas_Smart_Cb cb);
 void __pipe_ensure(UploadViewData *vd);
 
 // upload_state.cpp: the look of an empty folder, a failed refresh and the like.
@@ -181,3 +184,18 @@ void __upload_row_append(UploadViewData *vd, UploadItem *item, int index);
 void __result_rows_append(UploadViewData *vd, bool is_reentry);
 Elm_Object_Item *__row_append(UploadViewData *vd, Elm_Genlist_Item_Class *itc, ItemData *record, Evas_Smart_Cb cb);
 void __velora_uploading_item_selected(void *data, Evas_Object *obj, void *event_info);
+Elm_Genlist_Item_Class *__item_class_create(const char *style, Elm_Gen_Item_Text_Get_Cb text_get,
+                                            Elm_Gen_Item_Content_Get_Cb content_get);
+
+// upload_select.cpp: the more menu and the selection mode.
+void __more_menu_open(UploadViewData *vd);
+void __delete_all_callback_ctxpopup();
+void __ctx_delete_cb(void *data, Evas_Object *obj, void *event_info);
+void __remove_all_selete_item(UploadViewData *vd);
+// Leaves the selection mode with nothing selected.
+void __selection_cancel(UploadViewData *vd);
+void __selection_row_tapped(UploadViewData *vd, ItemData *record, Elm_Object_Item *row);
+// Counts again when an upload has ended and lost its flag.
+void __selection_title_refresh(UploadViewData *vd);
+// A layout with a check for the end of a row; *check is the check.
+Evas_Object *__check_create(Evas_Object *parent, bool is_on, Evas_Object **check);

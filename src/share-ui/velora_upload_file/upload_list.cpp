@@ -110,6 +110,15 @@ static Evas_Object *__cancel_button_create(Evas_Object *parent, ItemData *record
     return layout;
 }
 
+static Evas_Object *__selection_check_create(Evas_Object *parent, const ItemData *record)
+{
+    Evas_Object *check = nullptr;
+    Evas_Object *layout = __check_create(parent, __selection_get(record->index), &check);
+    evas_object_pass_events_set(check, EINA_TRUE); // a tap on it selects the row
+    evas_object_repeat_events_set(layout, EINA_TRUE);
+    return layout;
+}
+
 static Evas_Object *__progress_create(Evas_Object *parent, const UploadItem *item)
 {
     Evas_Object *bar = elm_progressbar_add(parent);
@@ -139,7 +148,7 @@ static Evas_Object *__ud_genlist_uploading_content_get(void *data, Evas_Object *
             VELORA_LOGI("upload_item->state is [%d]", state);
             return nullptr;
         }
-        return __cancel_button_create(obj, record);
+        return vd->is_select_mode ? __selection_check_create(obj, record) : __cancel_button_create(obj, record);
     }
     return __is_part(part, "elm.swallow.progressbar") ? __progress_create(obj, item) : nullptr;
 }
@@ -171,8 +180,8 @@ static void __gl_del(void *data, Evas_Object *)
     delete record;
 }
 
-static Elm_Genlist_Item_Class *__item_class_create(const char *style, Elm_Gen_Item_Text_Get_Cb text_get,
-                                                   Elm_Gen_Item_Content_Get_Cb content_get)
+Elm_Genlist_Item_Class *__item_class_create(const char *style, Elm_Gen_Item_Text_Get_Cb text_get,
+                                            Elm_Gen_Item_Content_Get_Cb content_get)
 {
     Elm_Genlist_Item_Class *itc = elm_genlist_item_class_new();
     itc->item_style = style;
@@ -234,6 +243,8 @@ void __velora_uploading_item_selected(void *data, Evas_Object *, void *event_inf
     }
     VELORA_LOGI("select item style is [%d]", record->type);
     auto *row = static_cast<Elm_Object_Item *>(event_info);
+    if (record->type == ITEM_TYPE_UPLOADING && vd->is_select_mode)
+        __selection_row_tapped(vd, record, row);
     if (record->type != ITEM_TYPE_FAILED)
         return;
     if (row) {

@@ -20,6 +20,7 @@ static Eina_Bool __idler_load_cb(void *data)
     if (pending <= 0)
         return ECORE_CALLBACK_CANCEL;
     char text[32];
+    __delete_all_callback_ctxpopup();
     std::snprintf(text, sizeof text, "%d / %d", vd->success.load(), vd->total - vd->canceled);
     if (vd->noti_id > 0) {
         __progress_noti_set_content(vd->noti_id, text);
@@ -67,6 +68,8 @@ void __btn_upload_cb(void *data, Evas_Object *, void *)
     __title_set(vd, "IDS_KQ_HEADER_VELORA_UPLOADS_ABB");
     vd->is_upload_started = true;
     vd->total = static_cast<int>(g_list_length(ad->upload_list));
+    if (vd->more_btn)
+        elm_object_disabled_set(vd->more_btn, vd->total == 0);
     ecore_idler_add(__idler_load_cb, vd);
     if (ad->xwin && ecore_x_display_get())
         ecore_x_icccm_transient_for_unset(ad->xwin);
@@ -95,6 +98,8 @@ static void __run_ended(UploadViewData *vd)
         evas_object_del(vd->more_btn);
     vd->more_btn = nullptr;
     _velora_app_popup_delete(vd->ad);
+    if (vd->done_btn) // the selection mode is on, with nothing left to select
+        __remove_all_selete_item(vd);
 }
 
 static void __row_store(UploadItem *item, int index)
@@ -136,7 +141,8 @@ static void __row_refresh_progress(const UploadItem *item)
 static void __item_message(UploadViewData *vd, const char *message)
 {
     char **pieces = g_strsplit(message, ".", -1);
-    if (!pieces[0] || !pieces[1] || !*pieces[1]) {
+    const bool is_number = pieces[0] && pieces[1] && *pieces[1];
+    if (!is_number) {
         VELORA_LOGE("split_str is NULL");
         g_strfreev(pieces);
         return;
@@ -145,9 +151,10 @@ static void __item_message(UploadViewData *vd, const char *message)
     UploadItem *item = __upload_item_find_running(vd, index);
     if (!item)
         VELORA_LOGE("upload_item is NULL");
-    else if (std::strcmp(pieces[0], "store") == 0)
+    else if (std::strcmp(pieces[0], "store") == 0) {
         __row_store(item, index);
-    else if (std::strcmp(pieces[0], "update") == 0)
+        __selection_title_refresh(vd);
+    } else if (std::strcmp(pieces[0], "update") == 0)
         __row_refresh_progress(item);
     g_strfreev(pieces);
 }

@@ -51,6 +51,8 @@ void __destroy_view(UploadViewData *vd)
         VELORA_LOGE("vd is NULL");
         return;
     }
+    evas_object_smart_callback_del_full(vd->ad->naviframe, "elm,action,more_event", __more_create_folder_cb, vd);
+    __delete_all_callback_ctxpopup();
     __worker_stop(vd);
     if (vd->pathinfo_timer)
         ecore_timer_del(vd->pathinfo_timer);
@@ -136,7 +138,9 @@ static Eina_Bool __btn_back_cb(void *, Elm_Object_Item *)
         VELORA_LOGE("view is destroyed");
         return EINA_FALSE;
     }
-    if (vd->is_upload_started)
+    if (vd->is_select_mode)
+        __selection_cancel(vd);
+    else if (vd->is_upload_started)
         __go_away(vd);
     else if (__is_at_root(vd))
         __leave(vd);
@@ -158,15 +162,20 @@ static void __btn_cancel_cb(void *data, Evas_Object *, void *)
     __go_away(vd);
 }
 
-// The menu's entries belong to a queue: before Done there is nothing to offer.
+// The menu's entries belong to a queue: before Done, and after its end, there is nothing to offer.
 static void __more_create_folder_cb(void *data, Evas_Object *, void *)
 {
-    if (!data)
+    auto *vd = static_cast<UploadViewData *>(data);
+    if (!vd) {
         VELORA_LOGE("data is NULL");
+        return;
+    }
+    if (vd == s_vd && vd->is_upload_started && vd->more_btn)
+        __more_menu_open(vd);
 }
 
-static Evas_Object *__title_button_create(UploadViewData *vd, const char *style, const char *id, const char *part,
-                                          Evas_Smart_Cb cb)
+Evas_Object *__title_button_create(UploadViewData *vd, const char *style, const char *id, const char *part,
+                                   Evas_Smart_Cb cb)
 {
     Evas_Object *button = elm_button_add(vd->ad->naviframe);
     elm_object_style_set(button, style);
@@ -221,6 +230,7 @@ static bool __share_create(UploadViewData *vd)
     vd->more_btn = elm_button_add(ad->naviframe);
     elm_object_style_set(vd->more_btn, "naviframe/more/default");
     evas_object_smart_callback_add(vd->more_btn, "clicked", __more_create_folder_cb, vd);
+    evas_object_smart_callback_add(ad->naviframe, "elm,action,more_event", __more_create_folder_cb, vd);
     elm_object_item_part_content_set(vd->nf_item, "toolbar_more_btn", vd->more_btn);
     elm_object_disabled_set(vd->more_btn, EINA_TRUE); // its menu belongs to a queue
     if (cloud_content_sync_folder_get_root(ad->sync_handle, &vd->folder) != 0) {
