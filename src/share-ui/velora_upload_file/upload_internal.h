@@ -135,6 +135,9 @@ void __retry_popup_show(ItemData *record);
 void *__thread_upload_file(void *vd);
 void *__velora_upload_fail_reboot(void *run);
 void __upload_file_cb(int state, int ignored, int progress, int error, void *item);
+// The name under which an item went up, or is to go up: another client may have taken the wanted one meanwhile. Any
+// thread.
+std::string __landed_name(const UploadViewData *vd, const UploadItem *item);
 // Lets the worker look at its transfer at once. Any thread.
 void __worker_wake();
 // Starts a worker on vd->run when none is marked; waits for the last moments of the one before.

@@ -115,7 +115,7 @@ static void __row_store(UploadItem *item, int index)
     UploadViewData *vd = s_vd;
     record->vd = vd;
     g_free(record->name);
-    record->name = g_strdup(__last_segment(item->server_path));
+    record->name = g_strdup(__landed_name(vd, item).c_str());
     record->index = index;
     g_free(record->path);
     record->path = g_strdup(item->path);

@@ -11,6 +11,8 @@
 
 std::atomic<UploadViewData *> s_vd = nullptr;
 
+static void __more_create_folder_cb(void *data, Evas_Object *obj, void *event_info);
+
 const char *__last_segment(const char *path)
 {
     const char *slash = path ? std::strrchr(path, '/') : nullptr;

@@ -4,6 +4,7 @@
 #include "velora_upload_file/upload_internal.h"
 #include <chrono>
 #include <cstdio>
+#include <cstdlib>
 #include <memory>
 #include <semaphore>
 #include <thread>
@@ -34,6 +35,17 @@ void __selection_set(int index, bool selected)
 {
     if (index >= 0 && index < s_selected_count)
         s_selected[static_cast<size_t>(index)] = selected;
+}
+
+std::string __landed_name(const UploadViewData *vd, const UploadItem *item)
+{
+    std::string name = __last_segment(item->server_path);
+    char *path = nullptr;
+    if (item->state == UPLOAD_STATE_DONE && item->request &&
+        cloud_content_sync_get_uploaded_path(vd->ad->sync_handle, item->request, &path) == 0 && path)
+        name = __last_segment(path);
+    std::free(path);
+    return name;
 }
 
 void __worker_wake()
@@ -107,6 +119,7 @@ static bool __transfer(UploadViewData *vd, UploadItem *item)
     const int refused =
         cloud_content_sync_upload(vd->ad->sync_handle, item->path, item->server_path, &req_id, __upload_file_cb, item);
     vd->req_id = req_id;
+    item->request = req_id;
     if (refused != 0) // no request, so no callback
         __transfer_report(vd, item, UPLOAD_STATE_FAILED, 0, refused);
     else if (item->state == UPLOAD_STATE_CANCELED) // before the main loop could know the request
@@ -132,7 +145,7 @@ struct RunResult {
 
 static void __count_result(UploadViewData *vd, UploadItem *item, RunResult *result)
 {
-    const char *name = __last_segment(item->server_path);
+    const std::string name = __landed_name(vd, item);
     if (item->error == UPLOAD_ERROR_STORAGE_FULL) {
         // Every file that is not up counts as failed, but only those that were tried are listed.
         vd->fail = vd->total - vd->canceled - vd->success;
@@ -221,7 +234,7 @@ void *__velora_upload_fail_reboot(void *data)
     if (!__transfer(vd, item))
         return nullptr;
     vd->is_uploading = false;
-    const std::string name = __last_segment(item->server_path);
+    const std::string name = __landed_name(vd, item);
     const bool is_storage_full = item->error == UPLOAD_ERROR_STORAGE_FULL;
     if (item->state == UPLOAD_STATE_FAILED)
         __result_noti(name, "IDS_CLOUD_POP_UPLOAD_FAILED", "fail",
