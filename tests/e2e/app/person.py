@@ -82,12 +82,14 @@ class Person(Device):
         """Leaves with the back key, from wherever the window is."""
         self.raise_window()
         self.key("Escape")
-        self.ends()
+        return self.ends()
 
     # seeing
 
     def texts(self):
-        return [text for _, text, *_ in self.visible()]
+        texts = [text for _, text, *_ in self.visible()]
+        check(not any("IDS_" in text for text in texts), f"a text without its translation: {texts!r}")
+        return texts
 
     def sees(self, *texts, seconds=20):
         """Waits until each of the texts is part of one on the screen."""
