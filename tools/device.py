@@ -1,6 +1,7 @@
 """A device of one's own for demos and end-to-end tests: its folders, its bus, its display, a service with an account,
 and the means to look at the application and to click in it. Everything it starts it ends."""
 
+import ast
 import base64
 import os
 import re
@@ -121,10 +122,6 @@ class Device:
         return bool(self.env.get("WAYLAND_DISPLAY")) and os.path.exists(socket)
 
     def start_display(self):
-        display = self.start(
-            ["Xvfb", "-displayfd", "1", "-screen", "0", f"{self.size}x24", "-nolisten", "tcp"],
-            stdout=subprocess.PIPE, stderr=subprocess.DEVNULL)
-        self.env["DISPLAY"] = ":" + display.stdout.readline().decode().strip()
         # No frames and no menus: the window is the screen, as on a phone.
         rules = os.path.join(self.home, "openbox.xml")
         with open(rules, "w", encoding="utf-8") as file:
@@ -133,12 +130,27 @@ class Device:
                        '<application class="*" type="dialog"><decor>no</decor><maximized>yes</maximized></application>'
                        '</applications><keyboard><keybind key="A-F4"><action name="Close"/></keybind></keyboard>'
                        "</openbox_config>")
-        self.start(["openbox", "--sm-disable", "--config-file", rules], stdout=subprocess.DEVNULL,
-                   stderr=subprocess.DEVNULL)
-        wait_for("the window manager", lambda: subprocess.run(
-            ["xdotool", "get_desktop"], env=self.env, capture_output=True).returncode == 0)
+        for attempt in range(3):
+            server = self.start(
+                ["Xvfb", "-displayfd", "1", "-screen", "0", f"{self.size}x24", "-nolisten", "tcp"],
+                stdout=subprocess.PIPE, stderr=subprocess.DEVNULL)
+            self.env["DISPLAY"] = ":" + server.stdout.readline().decode().strip()
+            manager = self.start(["openbox", "--sm-disable", "--config-file", rules], stdout=subprocess.DEVNULL,
+                                 stderr=subprocess.DEVNULL)
+            try:
+                wait_for("the window manager", lambda: subprocess.run(
+                    ["xdotool", "get_desktop"], env=self.env, capture_output=True, timeout=10).returncode == 0, 5)
+                return
+            except (Trouble, subprocess.TimeoutExpired):
+                # A server that ends removes the socket of the next one, when that took its number just then.
+                for process in (manager, server):
+                    process.kill()
+                    process.wait()
+                if attempt == 2:
+                    raise Trouble("the virtual display does not start") from None
 
-    def start_notification_daemon(self):
+    def start_notification_daemon(self, in_sight=True):
+        """Out of sight means: too small to cover what is to be clicked."""
         if not shutil.which("dunst"):
             return
         rules = os.path.join(self.home, "dunstrc")
@@ -147,6 +159,9 @@ class Device:
             file.write(f"[global]\nwidth = {width}\norigin = top-center\noffset = 0x16\nfont = Sans 12\n"
                        "frame_width = 1\ncorner_radius = 8\nmax_icon_size = 48\nmarkup = full\nformat = \"<b>%s</b>\\n%b\"\n"
                        "mouse_left_click = do_action, close_current\n")
+            if not in_sight:
+                file.write("width = 8\nheight = 8\norigin = bottom-right\noffset = 0x0\nicon_position = off\n"
+                           "padding = 0\nhorizontal_padding = 0\nframe_width = 0\nfont = Sans 1\n")
         self.start(["dunst", "-conf", rules], stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL)
         wait_for("the notification daemon", lambda: self.is_on_bus("org.freedesktop.Notifications"))
 
@@ -229,7 +244,7 @@ class Device:
             return []
         rows = re.findall(r"\('((?:[^'\\]|\\.)*)', (?:'((?:[^'\\]|\\.)*)'|\"((?:[^\"\\]|\\.)*)\"), "
                           r"(-?\d+), (-?\d+), (-?\d+), (-?\d+)\)", done.stdout.decode(errors="replace"))
-        return [(kind, re.sub(r"\\(.)", r"\1", single or double), *map(int, place))
+        return [(kind, ast.literal_eval(f"'{single}'" if single else f'"{double}"'), *map(int, place))
                 for kind, single, double, *place in rows]
 
     def find(self, text, kind=None):

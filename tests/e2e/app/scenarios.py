@@ -1,4 +1,4 @@
-#!/usr/bin/env python3
+!/usr/bin/python3
 """The real application, service, bus and window manager, operated as a person would; most of it goes wrong on purpose.
 
 Every scenario has a device of its own. Prints a test per scenario in the Test Anything Protocol.
@@ -24,7 +24,7 @@ def hostile_names(person):
     paths = [person.file(name, size={b"empty.dat": 0, b"large.bin": 5_000_000}.get(name)) for name in names]
     person.upload(person.file(b"bad \xff\xfe bytes.txt"), *paths)  # no service of text names can store that one
     person.finished("bytes.txt", "Upload failed")
-    person.sees("bytes.txt", "Upload failed · The file name is not allowed", "<b>&amp; €.txt")
+    person.sees("bytes.txt", "Upload failed · The file name is not allowed", "<b>&amp; €.txt", "two\nlines.txt")
     check("SUCCEEDED" in person.leave(), "a share is answered")
     person.has_stored(dict(zip(names, paths)))
 
@@ -155,7 +155,7 @@ def names_taken(person):
 
 
 def application_killed(person):
-    paths = [person.file(name, size=2_000_000) for name in ("one", "two")]
+    paths = [person.file(name, size=40_000_000) for name in ("one", "two")]
     person.upload(*paths)
     person.notified("Velora", ongoing=True)
     wait_for("bytes on their way", lambda: os.listdir(os.path.join(person.data, "tmp")))
@@ -164,14 +164,15 @@ def application_killed(person):
     wait_for("the service to let go of half a file", lambda: not os.listdir(os.path.join(person.data, "tmp")))
     person.request.wait(20)
     person.has_stored({})
-    person.upload(paths[1])
-    person.finished("two", "Upload complete")
+    small = person.file("small")
+    person.upload(small)
+    person.finished("small", "Upload complete")
     person.leave()
-    person.has_stored({"two": paths[1]})
+    person.has_stored({"small": small})
 
 
 def window_closed(person):
-    paths = {name: person.file(name, size=2_000_000) for name in ("one", "two")}
+    paths = {name: person.file(name, size=40_000_000) for name in ("one", "two")}
     person.upload(*paths.values())
     person.notified("Velora", ongoing=True)
     wait_for("bytes on their way", lambda: os.listdir(os.path.join(person.data, "tmp")))
