@@ -370,7 +370,7 @@ int main()
     g_timeout_add_seconds(
         STORE_LOOK,
         [](gpointer) -> gboolean {
-            if (store_version() != agent.version)
+            if (store_forget_orphans() || store_version() != agent.version)
                 sync_store();
             return G_SOURCE_CONTINUE;
         },
