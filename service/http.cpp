@@ -177,37 +177,20 @@ void refuse(Request &request, int status)
     lingering->read_on();
 }
 
-namespace {
-struct Job {
-    Request *request;
-    std::function<void()> work, done;
-};
-} // namespace
-
 void in_thread(Request &request, std::function<void()> work, std::function<void()> done)
 {
-    request.service->busy++;
     request.jobs++;
     soup_server_message_pause(request.message);
     // The message, and the request with it, outlives its connection until the job is done.
-    GTask *task = g_task_new(
-        request.message, nullptr,
-        [](GObject *, GAsyncResult *result, gpointer) {
-            const auto *job = static_cast<Job *>(g_task_get_task_data(G_TASK(result)));
-            job->request->service->busy--;
-            job->request->jobs--;
-            job->done();
-            if (job->request->jobs == 0)
-                soup_server_message_unpause(job->request->message);
-        },
-        nullptr);
-    g_task_set_task_data(task, new Job{&request, std::move(work), std::move(done)},
-                         [](gpointer data) { delete static_cast<Job *>(data); });
-    g_task_run_in_thread(task, [](GTask *self, gpointer, gpointer data, GCancellable *) {
-        static_cast<Job *>(data)->work();
-        g_task_return_boolean(self, TRUE);
+    g_object_ref(request.message);
+    request.service->workers.run(std::move(work), [&request, done = std::move(done)] {
+        SoupServerMessage *message = request.message;
+        request.jobs--;
+        done();
+        if (request.jobs == 0)
+            soup_server_message_unpause(message);
+        g_object_unref(message);
     });
-    g_object_unref(task);
 }
 
 void dav_options(Request &request)

@@ -2,6 +2,7 @@
 // What the handlers of requests share. All of it runs on the main loop.
 #include "locks.h"
 #include "metadata.h"
+#include "workers.h"
 #include <ctime>
 #include <functional>
 #include <libsoup/soup.h>
@@ -20,7 +21,7 @@ struct Service {
     Locks locks;
     Fd files, temporary; // the folders of the accounts and of unfinished work, on one file system
     Faults faults;
-    int busy = 0; // jobs on other threads
+    Workers workers;
 };
 
 struct Upload;
