@@ -1,4 +1,4 @@
-!/usr/bin/python3
+#!/usr/bin/python3
 """The real application, service, bus and window manager, operated as a person would; most of it goes wrong on purpose.
 
 Every scenario has a device of its own. Prints a test per scenario in the Test Anything Protocol.
