@@ -19,6 +19,7 @@ class Cloud : public testing::TestWithParam<std::string> {
     {
         if (handle)
             cloud_content_sync_destroy(handle);
+        handle = nullptr;
     }
     // False when this backend cannot do that; the test has nothing to try then.
     bool open(const Wish &wish = {})
