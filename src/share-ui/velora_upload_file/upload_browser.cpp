@@ -85,8 +85,10 @@ static void __path_item_del_cb(void *data, Evas_Object *, void *)
 static void __last_item_show_cb(void *)
 {
     UploadViewData *vd = s_vd;
-    if (Elm_Object_Item *last = vd && vd->toolbar ? elm_toolbar_last_item_get(vd->toolbar) : nullptr)
-        elm_toolbar_item_show(last, ELM_TOOLBAR_ITEM_SCROLLTO_LAST);
+    if (!vd || !vd->toolbar)
+        return;
+    evas_smart_objects_calculate(evas_object_evas_get(vd->toolbar));
+    elm_toolbar_item_show(elm_toolbar_last_item_get(vd->toolbar), ELM_TOOLBAR_ITEM_SCROLLTO_LAST);
 }
 
 static void __path_bar_append(UploadViewData *vd, const char *label, const char *path)
