@@ -94,7 +94,8 @@ int app_control_get_extra_data_array(app_control_h request, const char *key, cha
 int app_control_foreach_extra_data(app_control_h request, app_control_extra_data_cb callback, void *user_data);
 
 // Calls back once for each installed application that can show the request's MIME type (without one, the type guessed
-// from the URI), the user's default first. The ids are desktop file ids without ".desktop". No application is not an
+// from the URI), the user's default first, without this application
+// itself. The ids are desktop file ids without ".desktop". No application is not an
 // error. A request with another operation than view matches none.
 int app_control_foreach_app_matched(app_control_h request, app_control_app_matched_cb callback, void *user_data);
 

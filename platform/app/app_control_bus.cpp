@@ -1,5 +1,6 @@
 // The receiving side: this process's names on the session bus, and the objects behind them.
 #include "app/bus.h"
+#include "base/base.h"
 #include <algorithm>
 
 namespace {
@@ -164,6 +165,7 @@ void export_object(const std::string &name)
 void app_set_id(const char *app_id)
 {
     receiver().id = app_id ? app_id : "";
+    platform_package_set(app_id); // whose accounts this process owns
 }
 
 const char *app_get_id()
@@ -183,6 +185,13 @@ void app_add_alias(const char *app_id)
 {
     if (app_id)
         receiver().aliases.emplace_back(app_id);
+}
+
+std::vector<std::string> bus_own_ids()
+{
+    std::vector<std::string> ids = receiver().aliases;
+    ids.insert(ids.begin(), app_get_id());
+    return ids;
 }
 
 GDBusConnection *bus_connection()
@@ -238,10 +247,8 @@ Role bus_own(std::function<void(app_control_h)> receive)
         return Role::alone;
     the.leaving = false;
     the.receive = std::move(receive);
-    std::vector<std::string> names = the.aliases;
-    names.insert(names.begin(), id);
     // the objects come first: whoever sees the name finds them
-    for (const std::string &name : names)
+    for (const std::string &name : bus_own_ids())
         export_object(name);
     if (!own_name(id)) {
         for (const guint object : std::exchange(the.objects, {}))

@@ -37,8 +37,11 @@ bool is_in_sight(const Evas_Object *obj, Eina_Rectangle *place)
 
 void add(const Walk &walk, const char *kind, const char *text, const Eina_Rectangle &place)
 {
-    if (text && *text && g_utf8_validate(text, -1, nullptr))
-        g_variant_builder_add(walk.out, "(ssiiii)", kind, text, walk.x + place.x, walk.y + place.y, place.w, place.h);
+    if (!text || !*text)
+        return;
+    char *valid = g_utf8_make_valid(text, -1); // names of files may hold any bytes
+    g_variant_builder_add(walk.out, "(ssiiii)", kind, valid, walk.x + place.x, walk.y + place.y, place.w, place.h);
+    g_free(valid);
 }
 
 void add_markup(const Walk &walk, const char *kind, const char *markup, const Eina_Rectangle &place)

@@ -2,8 +2,9 @@
 //
 //   gallery OUTDIR [WIDTH HEIGHT [TEXT_PERCENT]]
 //
-// Run it from the build folder's program; ELM_SCALE sets the density. It needs no display.
+// ELM_SCALE sets the density. It needs no display. It fails when a theme lacks what a scene asks for.
 #include "scenes.h"
+#include "theme/theme.h"
 #include <Ecore_Evas.h>
 #include <Elementary.h>
 #include <cstdio>
@@ -126,8 +127,9 @@ int main(int argc, char **argv)
             Evas_Object *win = elm_win_add(nullptr, "gallery", ELM_WIN_BASIC);
             evas_object_resize(win, width, height);
             evas_object_show(win);
+            platform_theme_window_watch(win);
             scene.build(win);
-            run_for(0.5);
+            run_for(1.0);
             const fs::path file = out / (std::string(scene.name) + (dark ? "-dark.png" : ".png"));
             if (!save(win, file)) {
                 fprintf(stderr, "cannot save %s\n", file.c_str());
@@ -138,5 +140,5 @@ int main(int argc, char **argv)
         }
     }
     elm_shutdown();
-    return failed ? 1 : 0;
+    return failed || gallery_missing ? 1 : 0;
 }

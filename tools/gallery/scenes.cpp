@@ -3,6 +3,7 @@
 #include <string>
 
 std::filesystem::path gallery_resources;
+int gallery_missing = 0;
 
 namespace {
 
@@ -45,6 +46,12 @@ constexpr RowData select_rows[] = {
 };
 constexpr RowData select_all_row = {Row::select_all, "Alle auswählen", nullptr, 0};
 
+void missing(const char *kind, const char *name)
+{
+    fprintf(stderr, "missing: %s%s\n", kind, name);
+    ++gallery_missing;
+}
+
 std::string resource(const char *name)
 {
     return (gallery_resources / name).string();
@@ -61,7 +68,7 @@ Evas_Object *layout_add(Evas_Object *parent, const char *group)
 {
     Evas_Object *layout = elm_layout_add(parent);
     if (!elm_layout_file_set(layout, resource("velora.edj").c_str(), group))
-        fprintf(stderr, "no group %s\n", group);
+        missing("group ", group);
     expand(layout);
     return layout;
 }
@@ -70,7 +77,7 @@ Evas_Object *theme_layout_add(Evas_Object *parent, const char *group)
 {
     Evas_Object *layout = elm_layout_add(parent);
     if (!elm_layout_theme_set(layout, "layout", group, "default"))
-        fprintf(stderr, "no layout %s\n", group);
+        missing("layout ", group);
     evas_object_show(layout);
     return layout;
 }
@@ -79,7 +86,7 @@ Evas_Object *picture_add(Evas_Object *parent, const std::string &group)
 {
     Evas_Object *image = elm_image_add(parent);
     if (!elm_image_file_set(image, resource("velora_edc_images.edj").c_str(), group.c_str()))
-        fprintf(stderr, "no picture %s\n", group.c_str());
+        missing("picture ", group.c_str());
     expand(image);
     return image;
 }
@@ -88,7 +95,7 @@ Evas_Object *button_add(Evas_Object *parent, const char *style, const char *text
 {
     Evas_Object *button = elm_button_add(parent);
     if (style && !elm_object_style_set(button, style))
-        fprintf(stderr, "no button style %s\n", style);
+        missing("button style ", style);
     elm_object_text_set(button, text);
     evas_object_show(button);
     return button;
@@ -99,7 +106,7 @@ Evas_Object *progress_add(Evas_Object *parent, const char *style, double value)
     Evas_Object *bar = elm_progressbar_add(parent);
     elm_progressbar_horizontal_set(bar, EINA_TRUE);
     if (!elm_object_style_set(bar, style))
-        fprintf(stderr, "no progress bar style %s\n", style);
+        missing("progress bar style ", style);
     elm_progressbar_value_set(bar, value);
     elm_progressbar_pulse(bar, EINA_TRUE);
     expand(bar);
@@ -148,7 +155,8 @@ Evas_Object *row_content(void *data, Evas_Object *list, const char *part_name)
 Evas_Object *list_add(Evas_Object *parent)
 {
     Evas_Object *list = elm_genlist_add(parent);
-    elm_object_style_set(list, "dialogue");
+    if (!elm_object_style_set(list, "dialogue"))
+        missing("list style ", "dialogue");
     elm_genlist_mode_set(list, ELM_LIST_COMPRESS);
     expand(list);
     return list;
@@ -172,7 +180,8 @@ void row_append(Evas_Object *list, const RowData &row)
 Evas_Object *path_add(Evas_Object *parent)
 {
     Evas_Object *path = elm_toolbar_add(parent);
-    elm_object_style_set(path, "navigationbar");
+    if (!elm_object_style_set(path, "navigationbar"))
+        missing("toolbar style ", "navigationbar");
     elm_toolbar_shrink_mode_set(path, ELM_TOOLBAR_SHRINK_SCROLL);
     elm_toolbar_transverse_expanded_set(path, EINA_TRUE);
     elm_toolbar_align_set(path, 0.0);
@@ -376,7 +385,8 @@ void menu(Evas_Object *win)
 {
     uploads(win);
     Evas_Object *popup = elm_ctxpopup_add(win);
-    elm_object_style_set(popup, "more/default");
+    if (!elm_object_style_set(popup, "more/default"))
+        missing("menu style ", "more/default");
     elm_ctxpopup_auto_hide_disabled_set(popup, EINA_TRUE);
     elm_ctxpopup_item_append(popup, "Entfernen", nullptr, nullptr, nullptr);
     elm_ctxpopup_item_append(popup, "Einstellungen des Kontos", nullptr, nullptr, nullptr);

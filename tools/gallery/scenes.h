@@ -12,4 +12,7 @@ struct Scene {
 // Folder of the application's theme files; set before the first scene is built.
 extern std::filesystem::path gallery_resources;
 
+// How many styles, groups and pictures the scenes asked for in vain.
+extern int gallery_missing;
+
 const std::vector<Scene> &gallery_scenes();

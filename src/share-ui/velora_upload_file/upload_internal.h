@@ -142,6 +142,8 @@ std::string __landed_name(const UploadViewData *vd, const UploadItem *item);
 void __worker_wake();
 // Starts a worker on vd->run when none is marked; waits for the last moments of the one before.
 void __worker_start(UploadViewData *vd, void *(*routine)(void *), UploadItem *only);
+// Lets the worker of a run send its first file: the list of the queue leaves out what is up already, so it comes first.
+void __worker_begin();
 // Ends the running transfer and waits for the worker. Main loop only.
 void __worker_stop(UploadViewData *vd);
 // The selection flags of the queue: clear and count are for any thread.

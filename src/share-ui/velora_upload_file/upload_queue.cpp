@@ -46,6 +46,7 @@ static Eina_Bool __idler_load_cb(void *data)
         __selection_resize(vd->total);
     __worker_start(vd, __thread_upload_file, nullptr);
     _velora_upload_view_update();
+    __worker_begin();
     return ECORE_CALLBACK_CANCEL;
 }
 

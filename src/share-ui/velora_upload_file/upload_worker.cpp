@@ -12,6 +12,7 @@
 // Released when a transfer ends or is cancelled, and when the worker has to leave.
 static std::counting_semaphore s_wake(0);
 static std::atomic<bool> s_is_stopping = false;
+static std::atomic<bool> s_may_begin = false;
 static std::atomic<int> s_callbacks = 0; // transfer callbacks that are running
 static pthread_t s_worker;
 static bool s_is_joinable = false;
@@ -191,6 +192,7 @@ void *__thread_upload_file(void *data)
         return nullptr;
     }
     vd->is_uploading = true;
+    s_may_begin.wait(false);
     RunResult result;
     VELORA_LOGI("uploading!");
     for (int n = 0; n < vd->total && !result.is_storage_full; n++) {
@@ -258,10 +260,17 @@ static void __run_release(UploadViewData *vd)
     vd->run.clear();
 }
 
+void __worker_begin()
+{
+    s_may_begin = true;
+    s_may_begin.notify_all();
+}
+
 void __worker_start(UploadViewData *vd, void *(*routine)(void *), UploadItem *only)
 {
     if (vd->thread)
         return;
+    s_may_begin = false;
     __worker_join(); // it has sent its "end" and has nothing left to wait for
     __run_release(vd);
     if (only) {
@@ -283,6 +292,7 @@ void __worker_start(UploadViewData *vd, void *(*routine)(void *), UploadItem *on
 void __worker_stop(UploadViewData *vd)
 {
     s_is_stopping = true; // the worker cancels its transfer itself: it alone knows the latest request
+    __worker_begin();
     s_wake.release();
     __worker_join();
     __run_release(vd);

@@ -239,6 +239,23 @@ TEST_F(Scripted, an_upload_and_its_answers)
     }
 }
 
+// An empty body needs no rewinding, so nothing but a fresh connection keeps libcurl from sending it twice.
+TEST_F(Scripted, an_empty_file_is_not_sent_twice)
+{
+    static constexpr char HEX[] = "e3b0c44298fc1c149afbf4c8996fb92427ae41e4649b934ca495991b7852b855";
+    const std::string local = scratch.file("empty", "");
+    const std::string there = multistatus(file("/r%20t/x", "0", std::string("<v:sha256>") + HEX + "</v:sha256>"));
+    std::string methods;
+    serve([&](const Request &request) {
+        methods += request.method + " ";
+        return methods == "PUT PROPFIND PUT " ? "" : request.method == "PUT" ? answer("201 Created") : there;
+    });
+    ASSERT_EQ(upload(handle, local, "/before"), 0);
+    EXPECT_EQ(upload(handle, local, "/x"), 0);
+    std::scoped_lock lock(server->mutex);
+    EXPECT_EQ(methods, "PUT PROPFIND PUT PROPFIND ");
+}
+
 TEST(Names, next_free_name_stays_within_255_bytes_and_whole_characters)
 {
     std::string wide = "x"; // then two-byte characters, of which one would be cut

@@ -94,6 +94,7 @@ TEST_F(Account, UpdateWritesOnlyWhatWasSet)
         const int own = *static_cast<int *>(data);
         account_h other = nullptr;
         account_create(&other);
+        account_set_user_name(other, "z@b");
         account_set_email_address(other, "new@b");
         account_set_capability(other, ACCOUNT_SUPPORTS_CAPABILITY_PHOTO, ACCOUNT_CAPABILITY_DISABLED);
         EXPECT_EQ(account_update_to_db_by_id(other, own), ACCOUNT_ERROR_NONE);
@@ -103,7 +104,7 @@ TEST_F(Account, UpdateWritesOnlyWhatWasSet)
         return true;
     };
     EXPECT_EQ(account_query_account_by_package_name(update, "com.example.owner", &id), ACCOUNT_ERROR_NONE);
-    EXPECT_EQ(records("com.example.owner"), Lines{"1:a@b:new@b:1:2"});
+    EXPECT_EQ(records("com.example.owner"), Lines{"1:z@b:new@b:1:2"});
 
     account_h account = record("x@y");
     EXPECT_EQ(account_update_to_db_by_id(account, 99), ACCOUNT_ERROR_RECORD_NOT_FOUND);
@@ -115,14 +116,18 @@ TEST_F(Account, UpdateWritesOnlyWhatWasSet)
 
 TEST_F(Account, FailedUpdateChangesNothing)
 {
-    int first = 0, second = 0;
-    insert("a@b", &first);
-    insert("c@d", &second);
-    account_h account = record("a@b"); // taken
-    account_set_email_address(account, "lost@b");
-    EXPECT_EQ(account_update_to_db_by_id(account, second), ACCOUNT_ERROR_DB_FAILED);
+    int id = 0;
+    account_h account = record("a@b");
+    account_set_domain_name(account, "Other");
+    EXPECT_EQ(account_insert_to_db(account, &id), ACCOUNT_ERROR_NONE);
+    insert("c@d", &id);
+    // Its domain can be written, and then its user name is taken there.
+    EXPECT_EQ(account_set_user_name(account, "a@b"), ACCOUNT_ERROR_NONE);
+    EXPECT_EQ(account_set_domain_name(account, "Other"), ACCOUNT_ERROR_NONE);
+    EXPECT_EQ(account_update_to_db_by_id(account, id), ACCOUNT_ERROR_DB_FAILED);
     account_destroy(account);
     EXPECT_EQ(records("com.example.owner"), (Lines{"1:a@b:(null):2:0", "2:c@d:(null):2:0"}));
+    EXPECT_EQ(insert("c@d", &id), ACCOUNT_ERROR_DB_FAILED); // it is in its own domain still
 }
 
 TEST_F(Account, CallsNeedAConnectionAndArguments)

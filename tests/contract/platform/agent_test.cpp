@@ -16,7 +16,8 @@ class Agent : public PlatformTest {
     std::unique_ptr<PrivateBus> bus;
     std::unique_ptr<Program> daemon;
     std::map<guint32, std::string> screen; // what the daemon shows: by its id, the arguments of Notify
-    std::vector<gint64> notified;
+    int notified = 0;
+    guint32 close_at_once = 0; // a reason
     guint32 last = 100;
 
     void SetUp() override
@@ -65,8 +66,16 @@ class Agent : public PlatformTest {
         char *text = g_variant_print(arguments, FALSE);
         screen[id] = text;
         g_free(text);
-        notified.push_back(g_get_monotonic_time());
+        notified++;
+        if (close_at_once) // the signal overtakes the answer
+            close(id, close_at_once);
         return "(uint32 " + std::to_string(id) + ",)";
+    }
+
+    void close(guint32 id, guint32 reason)
+    {
+        screen.erase(id);
+        daemon->emit(DAEMON, "NotificationClosed", g_variant_new("(uu)", id, reason));
     }
 
     bool shows(const std::string &text) const
@@ -135,7 +144,7 @@ TEST_F(Agent, ShowsUpdatesAndTakesAway)
                              "'desktop-entry': <'com.example.poster'>", "['default', '']"})
         EXPECT_TRUE(shows(part)) << part << screen.begin()->second;
 
-    notified.clear();
+    notified = 0;
     notification_h noti = notification_load(PACKAGE, id);
     const auto start = std::chrono::steady_clock::now();
     for (int i = 0; i <= 1000; i++)
@@ -144,8 +153,7 @@ TEST_F(Agent, ShowsUpdatesAndTakesAway)
     notification_update_content(noti, id, "done");
     EXPECT_TRUE(run_until([this] { return shows("'value': <100>") && shows("'done'"); }));
     EXPECT_EQ(screen.size(), 1u);
-    for (size_t i = 1; i < notified.size(); i++)
-        EXPECT_GE(notified[i] - notified[i - 1], 80 * 1000);
+    EXPECT_LE(notified, milliseconds_since(start) / 100 + 2); // the daemon gets no more than it can show
 
     start_daemon(); // a new one gets to know what there is
     EXPECT_TRUE(run_until([this] { return shows("'value': <100>"); }));
@@ -197,22 +205,26 @@ TEST_F(Agent, ClosedByTheUser)
     const struct {
         notification_type_e type;
         guint32 reason;
-        bool stays;
-    } cases[] = {{NOTIFICATION_TYPE_NOTI, DISMISSED, false},
-                 {NOTIFICATION_TYPE_NOTI, EXPIRED, true},
-                 {NOTIFICATION_TYPE_ONGOING, DISMISSED, true}};
-    int ids[3] = {}, n = 0;
+        bool at_once, stays;
+    } cases[] = {{NOTIFICATION_TYPE_NOTI, DISMISSED, false, false},
+                 {NOTIFICATION_TYPE_NOTI, EXPIRED, false, true},
+                 {NOTIFICATION_TYPE_NOTI, DISMISSED, true, false},
+                 {NOTIFICATION_TYPE_ONGOING, DISMISSED, true, true},
+                 {NOTIFICATION_TYPE_ONGOING, DISMISSED, false, true}};
+    int id = 0;
     for (const auto &c : cases) {
-        const int id = ids[n++] = post(c.type, "title", "content", 0);
-        ASSERT_TRUE(run_until([this] { return screen.count(last) == 1; }));
-        screen.erase(last);
-        daemon->emit(DAEMON, "NotificationClosed", g_variant_new("(uu)", last, c.reason));
+        close_at_once = c.at_once ? c.reason : 0;
+        notified = 0;
+        id = post(c.type, "title", "content", 0);
+        ASSERT_TRUE(run_until([this] { return notified > 0; }));
+        if (!c.at_once)
+            close(last, c.reason);
         EXPECT_TRUE(run_until([&] { return in_store(id) == c.stays; }));
         last += 10;
     }
     // What the user closed does not come back with its next update; nothing is left to show.
-    notification_h noti = notification_load(PACKAGE, ids[2]);
-    notification_update_progress(noti, ids[2], 0.5);
+    notification_h noti = notification_load(PACKAGE, id);
+    notification_update_progress(noti, id, 0.5);
     notification_free(noti);
     EXPECT_TRUE(run_until([this] { return !agent_runs(); }));
     EXPECT_TRUE(screen.empty());

@@ -120,7 +120,9 @@ TEST_F(Notification, DeletingAndUpdatingWhatIsGone)
     EXPECT_EQ(notification_update_content(noti.get(), first, "x"), NOTIFICATION_ERROR_NOT_EXIST_ID);
     EXPECT_EQ(notification_update_progress(noti.get(), first, 0.5), NOTIFICATION_ERROR_NOT_EXIST_ID);
     EXPECT_EQ(notification_delete(noti.get()), NOTIFICATION_ERROR_NOT_EXIST_ID);
-    EXPECT_GT(post(NOTIFICATION_TYPE_NOTI, "new"), ongoing);
+    const int newest = post(NOTIFICATION_TYPE_NOTI, "newest");
+    EXPECT_EQ(notification_delete_all_by_type(PACKAGE, NOTIFICATION_TYPE_NOTI), 0);
+    EXPECT_GT(post(NOTIFICATION_TYPE_NOTI, "new"), newest); // an id is not used again
     EXPECT_EQ(notification_load(PACKAGE, first), nullptr);
     EXPECT_EQ(notification_load(PACKAGE, 0), nullptr);
     EXPECT_EQ(notification_create(NOTIFICATION_TYPE_NONE), nullptr);
