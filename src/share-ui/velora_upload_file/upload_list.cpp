@@ -15,10 +15,24 @@ static bool __is_icon_part(const char *part)
     return __is_part(part, "elm.icon") || __is_part(part, "elm.icon.1");
 }
 
-// A name as a row shows it: passed through the translation, and escaped, for the theme's texts are markup.
+// A name as a row shows it: passed through the translation, on one line, and escaped, for the theme's texts are markup.
+// Control characters have pictures from U+2400 on; a line break as such makes the layout of a one-line text run for
+// ever.
 static char *__name_markup(const char *name)
 {
-    return name ? elm_entry_utf8_to_markup(__text(name)) : nullptr;
+    if (!name)
+        return nullptr;
+    char *valid = g_utf8_make_valid(__text(name), -1);
+    std::string shown;
+    for (const char *c = valid; *c; c++) {
+        const auto byte = static_cast<unsigned char>(*c);
+        if (byte < 0x20)
+            shown += {'\xe2', '\x90', static_cast<char>(0x80 + byte)};
+        else
+            shown += *c;
+    }
+    g_free(valid);
+    return elm_entry_utf8_to_markup(shown.c_str());
 }
 
 static char *__ud_genlist_dir_text_get(void *data, Evas_Object *, const char *part)
