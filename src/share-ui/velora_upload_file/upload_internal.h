@@ -182,6 +182,9 @@ Evas_Object *__file_icon_create(Evas_Object *parent, ItemData *record, const cha
 void __local_thumbnails_free();
 
 // upload_list.cpp: rows.
+// A name for a text of one line in the theme, to free: escaped, for the theme's texts are markup, and with the pictures
+// that Unicode has from U+2400 on for control characters. A line break as such makes Edje's layout run for ever.
+char *__one_line_markup(const char *text);
 Evas_Object *__genlist_create(UploadViewData *vd);
 void __item_classes_create(UploadViewData *vd);
 void __item_classes_free(UploadViewData *vd);

@@ -15,14 +15,9 @@ static bool __is_icon_part(const char *part)
     return __is_part(part, "elm.icon") || __is_part(part, "elm.icon.1");
 }
 
-// A name as a row shows it: passed through the translation, on one line, and escaped, for the theme's texts are markup.
-// Control characters have pictures from U+2400 on; a line break as such makes the layout of a one-line text run for
-// ever.
-static char *__name_markup(const char *name)
+char *__one_line_markup(const char *text)
 {
-    if (!name)
-        return nullptr;
-    char *valid = g_utf8_make_valid(__text(name), -1);
+    char *valid = g_utf8_make_valid(text, -1);
     std::string shown;
     for (const char *c = valid; *c; c++) {
         const auto byte = static_cast<unsigned char>(*c);
@@ -33,6 +28,12 @@ static char *__name_markup(const char *name)
     }
     g_free(valid);
     return elm_entry_utf8_to_markup(shown.c_str());
+}
+
+// A name as a row shows it: passed through the translation.
+static char *__name_markup(const char *name)
+{
+    return name ? __one_line_markup(__text(name)) : nullptr;
 }
 
 static char *__ud_genlist_dir_text_get(void *data, Evas_Object *, const char *part)
