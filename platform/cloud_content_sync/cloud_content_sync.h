@@ -141,3 +141,15 @@ int cloud_content_sync_cancel(cloud_content_sync_h handle, int req_id);
 // begin later use them. What the database holds of another account is removed. INVALID_PARAMETER for an empty user or
 // secret, for control characters, and for a user with a colon; NO_SERVICE; DB_FAILED when they cannot be stored.
 int cloud_content_sync_credentials_set(const char *service_name, const char *user, const char *secret);
+
+// A request about one file: its state, the path or address it is about, a word of the service's own (the HTTP status of
+// its last answer), and an error code. On the client's thread, any number of times, and last with state 3 or 4.
+typedef void (*cloud_content_sync_result_cb)(int state, const char *text, int status, int error, void *user_data);
+
+int cloud_content_sync_content_get_cached_file(cloud_content_sync_content_h content, int *request_id,
+                                               cloud_content_sync_result_cb cb, void *user_data);
+// minutes: how long the address stays good.
+int cloud_content_sync_content_get_streaming_url(cloud_content_sync_content_h content, int *request_id,
+                                                 cloud_content_sync_result_cb cb, void *user_data, int minutes);
+int cloud_content_sync_content_download(cloud_content_sync_content_h content, const char *local_path, int *request_id,
+                                        cloud_content_sync_result_cb cb, void *user_data);

@@ -170,7 +170,7 @@ static void __meta_changed(UploadViewData *vd)
     elm_scroller_region_show(vd->genlist, x, y, w, h);
 }
 
-void __pipe_cb(void *, void *buffer, unsigned int)
+void __pipe_cb(void *, void *buffer, unsigned int size)
 {
     UploadViewData *vd = s_vd;
     if (!vd) {
@@ -179,6 +179,10 @@ void __pipe_cb(void *, void *buffer, unsigned int)
     }
     if (!buffer) {
         VELORA_LOGE("Invalid argument: buffer is NULL");
+        return;
+    }
+    if (ContentResultMessage result; _velora_common_is_content_result(buffer, size, &result)) {
+        __content_result_handle(vd, result);
         return;
     }
     const auto *message = static_cast<const char *>(buffer);

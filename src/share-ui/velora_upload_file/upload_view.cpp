@@ -10,6 +10,9 @@
 #include <cstring>
 
 std::atomic<UploadViewData *> s_vd = nullptr;
+std::atomic<Ecore_Pipe *> s_view_pipe = nullptr;
+
+static void __more_create_folder_cb(void *data, Evas_Object *obj, void *event_info);
 
 const char *__last_segment(const char *path)
 {
@@ -41,7 +44,7 @@ void __title_set(UploadViewData *vd, const char *id)
 void __pipe_ensure(UploadViewData *vd)
 {
     if (!vd->pipe)
-        vd->pipe = _velora_common_pipe_add(__pipe_cb, vd);
+        s_view_pipe = vd->pipe = _velora_common_pipe_add(__pipe_cb, vd);
 }
 
 void __destroy_view(UploadViewData *vd)
@@ -62,6 +65,7 @@ void __destroy_view(UploadViewData *vd)
     if (vd->folder)
         cloud_content_sync_folder_destroy(vd->folder);
     _velora_common_local_data_disconnect();
+    s_view_pipe = nullptr;
     if (vd->pipe)
         _velora_common_pipe_del(vd->pipe);
     if (vd->select_all_genlist)
