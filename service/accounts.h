@@ -13,6 +13,11 @@ struct Account {
     int64_t reserved = 0; // bytes that uploads under way may still add
     Fd folder;            // the account's root folder
 
+    // Counts bytes that came (or went). What people do to the tree by hand is only seen by the next start's recount.
+    void count(int64_t bytes)
+    {
+        used = std::max<int64_t>(0, used + bytes);
+    }
     // Bytes that may still be stored.
     int64_t left() const
     {

@@ -89,7 +89,7 @@ void dav_get(Request &request)
 {
     Entry entry = request.look_up();
     if (entry.kind == Entry::FOLDER) {
-        request.set_header("Allow", "OPTIONS, DELETE, COPY, MOVE, PROPFIND, PROPPATCH");
+        request.set_header("Allow", "OPTIONS, DELETE, COPY, MOVE, PROPFIND, PROPPATCH, LOCK, UNLOCK");
         return request.answer(405);
     }
     if (entry.kind != Entry::FILE)

@@ -7,12 +7,28 @@
 
 // Folders within folders that one answer may go down to.
 static const int LEVELS = 256;
+static const char *const LOCKABLE =
+    "<D:lockentry><D:lockscope><D:exclusive/></D:lockscope><D:locktype><D:write/></D:locktype></D:lockentry>"
+    "<D:lockentry><D:lockscope><D:shared/></D:lockscope><D:locktype><D:write/></D:locktype></D:lockentry>";
 static const char *const XML_TYPE = "application/xml; charset=\"utf-8\"";
 static const char *const XML_HEAD = "<?xml version=\"1.0\" encoding=\"utf-8\"?>\n<D:multistatus xmlns:D=\"DAV:\" "
                                     "xmlns:V=\"urn:velora:dav\">\n";
 
 namespace {
-enum class Live { NONE, TYPE, LENGTH, CONTENT_TYPE, ETAG, MODIFIED, CREATED, QUOTA_LEFT, QUOTA_USED, SHA256, LOCKS };
+enum class Live {
+    NONE,
+    TYPE,
+    LENGTH,
+    CONTENT_TYPE,
+    ETAG,
+    MODIFIED,
+    CREATED,
+    QUOTA_LEFT,
+    QUOTA_USED,
+    SHA256,
+    LOCKS,
+    LOCKABLE
+};
 struct LiveName {
     const char *ns, *name, *tag;
     Live live;
@@ -28,9 +44,8 @@ const LiveName LIVE[] = {
     {"DAV:", "quota-available-bytes", "D:quota-available-bytes", Live::QUOTA_LEFT, false},
     {"DAV:", "quota-used-bytes", "D:quota-used-bytes", Live::QUOTA_USED, false},
     {"urn:velora:dav", "sha256", "V:sha256", Live::SHA256, true},
-    // Never shown, but nobody may store properties of these names.
-    {"DAV:", "lockdiscovery", "D:lockdiscovery", Live::LOCKS, false},
-    {"DAV:", "supportedlock", "D:supportedlock", Live::LOCKS, false},
+    {"DAV:", "lockdiscovery", "D:lockdiscovery", Live::LOCKS, true},
+    {"DAV:", "supportedlock", "D:supportedlock", Live::LOCKABLE, true},
 };
 
 const LiveName *find_live(const DeadProperty &property)
@@ -70,6 +85,7 @@ class Propfind {
     {
         out = XML_HEAD;
         const bool folder = entry.kind == Entry::FOLDER;
+        read_locks(request.path);
         respond(entry, request.path.href(folder),
                 need_dead ? request.service->metadata.properties(*request.account, request.path) : DeadProperties(),
                 need_digest ? request.service->metadata.digest(*request.account, request.path, entry) : "");
@@ -100,12 +116,13 @@ class Propfind {
             append_encoded(href, entry.name);
             if (entry.kind == Entry::FOLDER)
                 href += '/';
+            Path below = path;
+            below.parts.push_back(entry.name);
+            read_locks(below);
             respond(entry, href, dead == properties.end() ? none : dead->second,
                     digest != digests.end() && digest->second.valid_for(entry) ? digest->second.sha256 : "");
             if (entry.kind != Entry::FOLDER || depth == 1 || levels == 0)
                 continue;
-            Path below = path;
-            below.parts.push_back(entry.name);
             const Path one{{entry.name}, false};
             if (const Fd open = open_folder(folder, one, 1); open)
                 list(open.fd, below, depth, levels - 1);
@@ -118,7 +135,7 @@ class Propfind {
         out += "<D:response><D:href>" + href + "</D:href><D:propstat><D:prop>";
         if (body.kind != PropfindBody::NAMED) {
             for (const LiveName &live : LIVE)
-                if (live.in_all || (body.kind == PropfindBody::NAMES && live.live != Live::LOCKS))
+                if (live.in_all || body.kind == PropfindBody::NAMES)
                     append_live(live, entry, digest);
             for (const DeadProperty &property : dead)
                 append_dead(property);
@@ -140,6 +157,12 @@ class Propfind {
             out +=
                 "<D:propstat><D:prop>" + missing + "</D:prop><D:status>HTTP/1.1 404 Not Found</D:status></D:propstat>";
         out += "</D:response>\n";
+    }
+
+    void read_locks(const Path &path)
+    {
+        if (!request.service->locks.empty())
+            locks = request.service->locks.discovery(request.account->id, path);
     }
 
     void append_dead(const DeadProperty &property)
@@ -190,6 +213,12 @@ class Propfind {
         case Live::SHA256:
             value = digest;
             return !digest.empty();
+        case Live::LOCKS:
+            value = locks;
+            return true;
+        case Live::LOCKABLE:
+            value = LOCKABLE;
+            return true;
         default:
             return false;
         }
@@ -223,19 +252,10 @@ class Propfind {
     bool need_digest = false, need_dead = false;
     int64_t quota_left = 0;
     std::unordered_map<std::string, std::string> types;
+    std::string locks; // lockdiscovery of the entry at hand
     std::string out;
 };
 } // namespace
-
-static std::string body_of(const Request &request)
-{
-    GBytes *bytes = soup_message_body_flatten(soup_server_message_get_request_body(request.message));
-    gsize size = 0;
-    const auto *data = static_cast<const char *>(g_bytes_get_data(bytes, &size));
-    const std::string body(data ? data : "", size);
-    g_bytes_unref(bytes);
-    return body;
-}
 
 void dav_propfind(Request &request)
 {
@@ -244,7 +264,7 @@ void dav_propfind(Request &request)
     if (depth != "0" && depth != "1" && g_ascii_strcasecmp(depth.c_str(), "infinity") != 0)
         return request.answer(400);
     PropfindBody body;
-    if (!read_propfind(body_of(request), body))
+    if (!read_propfind(request.body(), body))
         return request.answer(400);
     const Entry entry = request.look_up();
     if (entry.kind != Entry::FILE && entry.kind != Entry::FOLDER)
@@ -256,13 +276,15 @@ void dav_propfind(Request &request)
 void dav_proppatch(Request &request)
 {
     std::vector<PropertyUpdate> updates;
-    if (!read_proppatch(body_of(request), updates))
+    if (!read_proppatch(request.body(), updates))
         return request.answer(400);
     const Entry entry = request.look_up();
     if (entry.kind != Entry::FILE && entry.kind != Entry::FOLDER)
         return request.answer(404);
     if (const int status = check_conditions(request, entry))
         return request.answer(status);
+    if (!may_change(request, request.path, Reach::CONTENT))
+        return request.answer(423);
     DeadProperties changes;
     std::string refused, others;
     for (const PropertyUpdate &update : updates) {

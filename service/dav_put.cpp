@@ -77,7 +77,7 @@ static bool read_repr_digest(const char *header, std::string &digest)
 }
 
 // Whether the upload may go where it wants to: 0 or the status.
-static int check_target(const Request &request, const Fd &folder, Entry &entry)
+static int check_target(Request &request, const Fd &folder, Entry &entry)
 {
     if (request.path.root() || request.path.slash)
         return 405;
@@ -86,7 +86,9 @@ static int check_target(const Request &request, const Fd &folder, Entry &entry)
     entry = look(folder.fd, request.path.name());
     if (const int status = check_conditions(request, entry))
         return status;
-    return entry.kind == Entry::FOLDER ? 405 : entry.kind == Entry::ODD ? 403 : 0;
+    if (entry.kind == Entry::FOLDER || entry.kind == Entry::ODD)
+        return entry.kind == Entry::FOLDER ? 405 : 403;
+    return may_change(request, request.path, entry.kind == Entry::NONE ? Reach::NAME : Reach::CONTENT) ? 0 : 423;
 }
 
 void put_begin(Request &request)
@@ -192,7 +194,7 @@ static int store(Request &request)
         return status;
     upload.file = Fd();
     fsync(folder.fd);
-    request.account->used += upload.received - freed;
+    request.account->count(upload.received - freed);
     if (status == 201)
         service.metadata.forget(*request.account, request.path);
     const Entry entry = look(folder.fd, request.path.name());

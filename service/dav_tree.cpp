@@ -14,7 +14,7 @@ static void answer_after_removal(Request &request, int status, const std::string
     in_thread(
         request, [attic = request.service->temporary.fd, aside, freed] { remove_tree(attic, aside, freed.get()); },
         [&request, status, freed, counted] {
-            request.account->used -= counted ? *freed : 0;
+            request.account->count(counted ? -*freed : 0);
             request.answer(status);
         });
 }
@@ -31,6 +31,8 @@ void dav_delete(Request &request)
     const char *depth = request.header("Depth");
     if (entry.kind == Entry::FOLDER && depth && g_ascii_strcasecmp(depth, "infinity") != 0)
         return request.answer(400);
+    if (!may_change(request, request.path, Reach::NAME_AND_BELOW))
+        return request.answer(423);
     // Taken away in one step: nobody ever sees half of a folder.
     const Fd folder = request.parent();
     const std::string aside = temporary_name("old");
@@ -38,6 +40,7 @@ void dav_delete(Request &request)
     if (!folder || renameat(folder.fd, request.path.name().c_str(), attic, aside.c_str()) != 0)
         return request.answer(status_of_errno(errno));
     request.service->metadata.forget(*request.account, request.path);
+    request.service->locks.forget(request.account->id, request.path);
     answer_after_removal(request, 204, aside);
 }
 
@@ -52,6 +55,8 @@ void dav_mkcol(Request &request)
         return request.answer(errno == ENOENT || errno == ENOTDIR ? 409 : status_of_errno(errno));
     if (const int status = check_conditions(request, look(folder.fd, request.path.name())))
         return request.answer(status);
+    if (!may_change(request, request.path, Reach::NAME))
+        return request.answer(423);
     if (mkdirat(folder.fd, request.path.name().c_str(), 0777) != 0)
         return request.answer(errno == EEXIST ? 405 : status_of_errno(errno));
     fsync(folder.fd);
@@ -129,11 +134,13 @@ struct Copy {
         const Fd to = target_folder(request, target);
         if (!status && !to)
             status = status_without_target_folder();
+        if (!status && !may_change(request, target, Reach::NAME_AND_BELOW))
+            status = 423;
         if (!status)
             status = move_entry(temporary, name, to.fd, target.name(), overwrite, temporary, &freed, &aside);
         if (status >= 300)
             return answer_after_removal(request, status, name, false);
-        account.used += size - freed;
+        account.count(size - freed);
         request.service->metadata.copied(account, request.path, target, deep, files);
         answer_after_removal(request, status, aside);
     }
@@ -180,6 +187,9 @@ void dav_copy_move(Request &request, bool move)
     if (request.path.root() || target.root() || target.parts == request.path.parts || request.path.holds(target) ||
         target.holds(request.path))
         return request.answer(403);
+    if (!may_change(request, target, Reach::NAME_AND_BELOW) ||
+        (move && !may_change(request, request.path, Reach::NAME_AND_BELOW)))
+        return request.answer(423);
     Fd from = request.parent();
     const Fd to = target_folder(request, target);
     if (!from)
@@ -194,7 +204,8 @@ void dav_copy_move(Request &request, bool move)
                                   request.service->temporary.fd, &freed, &aside);
     if (status >= 300)
         return request.answer(status);
-    request.account->used -= freed;
+    request.account->count(-freed);
     request.service->metadata.moved(*request.account, request.path, target);
+    request.service->locks.forget(request.account->id, request.path); // locks do not move (RFC 4918, 7.7)
     answer_after_removal(request, status, aside);
 }

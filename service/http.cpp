@@ -1,16 +1,28 @@
 #include "http.h"
 #include <cstring>
 #include <gio/gio.h>
-#include <gio/gunixsocketaddress.h>
+#include <netinet/in.h>
+#include <netinet/tcp.h>
 
 static const int64_t BODY_AT_MOST = 1 << 20;    // of requests that are not uploads
 static const int64_t WORTH_READING = 256 << 10; // what is read to the end to keep a connection alive
-static const char *const ALLOWED = "OPTIONS, GET, HEAD, PUT, DELETE, MKCOL, COPY, MOVE, PROPFIND, PROPPATCH";
+static const char *const ALLOWED =
+    "OPTIONS, GET, HEAD, PUT, DELETE, MKCOL, COPY, MOVE, PROPFIND, PROPPATCH, LOCK, UNLOCK";
 
 void Request::answer(int status, const char *type, const std::string &body) const
 {
     answer(status);
     soup_server_message_set_response(message, type, SOUP_MEMORY_COPY, body.data(), body.size());
+}
+
+std::string Request::body() const
+{
+    GBytes *bytes = soup_message_body_flatten(soup_server_message_get_request_body(message));
+    gsize size = 0;
+    const auto *data = static_cast<const char *>(g_bytes_get_data(bytes, &size));
+    const std::string text(data ? data : "", size);
+    g_bytes_unref(bytes);
+    return text;
 }
 
 Entry Request::look_up() const
@@ -154,7 +166,7 @@ void refuse(Request &request, int status)
     soup_message_headers_iter_init(&iterator, soup_server_message_get_response_headers(request.message));
     while (soup_message_headers_iter_next(&iterator, &name, &value))
         text += std::string(name) + ": " + value + "\r\n";
-    text += "\r\n";
+    text += "Date: " + http_date(static_cast<int64_t>(time(nullptr)) * 1000000000) + "\r\n\r\n";
     GSocket *socket = soup_server_message_get_socket(request.message);
     g_object_ref(socket);
     auto *lingering = new Lingering{soup_server_message_steal_connection(request.message)};
@@ -200,7 +212,7 @@ void in_thread(Request &request, std::function<void()> work, std::function<void(
 
 void dav_options(Request &request)
 {
-    request.set_header("DAV", "1");
+    request.set_header("DAV", "1, 2");
     request.set_header("Allow", ALLOWED);
     request.answer(200);
 }
@@ -242,6 +254,10 @@ static void handle(Request &request)
         return dav_propfind(request);
     if (method == "PROPPATCH")
         return dav_proppatch(request);
+    if (method == "LOCK")
+        return dav_lock(request);
+    if (method == "UNLOCK")
+        return dav_unlock(request);
     request.set_header("Allow", ALLOWED);
     request.answer(405);
 }
@@ -282,6 +298,13 @@ static void on_headers(SoupServer *, SoupServerMessage *message, const char *, G
     g_signal_connect(message, "finished", G_CALLBACK(+[](SoupServerMessage *m, gpointer) { put_drop(request_of(m)); }),
                      nullptr);
 
+    // A peer that vanished without a word keeps its connection, and the room of its upload, for two minutes at most.
+    GSocket *socket = soup_server_message_get_socket(message);
+    g_socket_set_keepalive(socket, TRUE);
+    g_socket_set_option(socket, IPPROTO_TCP, TCP_KEEPIDLE, 60, nullptr);
+    g_socket_set_option(socket, IPPROTO_TCP, TCP_KEEPINTVL, 15, nullptr);
+    g_socket_set_option(socket, IPPROTO_TCP, TCP_KEEPCNT, 4, nullptr);
+
     const char *path = g_uri_get_path(soup_server_message_get_uri(message));
     request->is_dav = std::strcmp(path, "/1/account/info") != 0;
     const int wrong = request->is_dav ? parse_path(path, request->path) : 0;
@@ -299,6 +322,8 @@ static void on_headers(SoupServer *, SoupServerMessage *message, const char *, G
     }
     if (wrong)
         return refuse(*request, wrong);
+    if (const int status = request->is_dav ? check_if_header(*request) : 0)
+        return refuse(*request, status);
     if (request->is_dav && std::strcmp(request->method(), "PUT") == 0)
         return put_begin(*request);
     if (soup_message_headers_get_content_length(soup_server_message_get_request_headers(message)) > BODY_AT_MOST)

@@ -1,5 +1,6 @@
 #pragma once
 // What the handlers of requests share. All of it runs on the main loop.
+#include "locks.h"
 #include "metadata.h"
 #include <ctime>
 #include <functional>
@@ -16,6 +17,7 @@ struct Service {
     Db db;
     Accounts accounts;
     Metadata metadata;
+    Locks locks;
     Fd files, temporary; // the folders of the accounts and of unfinished work, on one file system
     Faults faults;
     int busy = 0; // jobs on other threads
@@ -28,9 +30,10 @@ struct Request {
     Account *account = nullptr;           // borrowed
     Path path;                            // empty for addresses outside /dav/
     bool is_dav = false;
-    Upload *upload = nullptr; // owned; of a PUT whose body is being received
-    int jobs = 0;             // on other threads, for this request
-    int64_t body_bytes = 0;   // received so far, of methods other than PUT
+    std::vector<std::string> tokens; // of locks, that the request has named
+    Upload *upload = nullptr;        // owned; of a PUT whose body is being received
+    int jobs = 0;                    // on other threads, for this request
+    int64_t body_bytes = 0;          // received so far, of methods other than PUT
 
     const char *method() const
     {
@@ -56,6 +59,8 @@ struct Request {
     {
         return open_folder(account->folder.fd, path, path.parts.size() - 1);
     }
+    // The whole body; not of an upload.
+    std::string body() const;
     // What is at the path; kind NONE when nothing is.
     Entry look_up() const;
 };
@@ -67,6 +72,13 @@ void refuse(Request &request, int status);
 // The status that the If-Match, If-None-Match and If-(Un)Modified-Since headers demand for a resource (RFC 9110, 13): 0
 // to go on, 412, or 304 for GET and HEAD. An entry of kind NONE is a resource that does not exist.
 int check_conditions(const Request &request, const Entry &entry);
+// Reads the If header and keeps its tokens. 0 to go on, 412 when it does not hold, 400 when it cannot be read.
+int check_if_header(Request &request);
+// What a change touches: the content or properties of a resource; also its name, and so the folder it is in; also what
+// is below it.
+enum class Reach { CONTENT, NAME, NAME_AND_BELOW };
+// Whether locks allow the change to somebody with the request's tokens; if not the answer is 423.
+bool may_change(Request &request, const Path &path, Reach reach);
 // Runs `work` on another thread while the request waits, then `done` on the main loop; `done` answers, or calls this
 // again. Both run also when the client has gone meanwhile. `work` must touch nothing that the main loop uses.
 void in_thread(Request &request, std::function<void()> work, std::function<void()> done);
@@ -83,6 +95,8 @@ void dav_mkcol(Request &request);
 void dav_copy_move(Request &request, bool move);
 void dav_propfind(Request &request);
 void dav_proppatch(Request &request);
+void dav_lock(Request &request);
+void dav_unlock(Request &request);
 // PUT: begin when the headers are there, chunk by chunk, finish with the end of the body; dropped when the connection
 // broke before that.
 void put_begin(Request &request);

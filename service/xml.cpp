@@ -109,6 +109,28 @@ bool read_proppatch(const std::string &body, std::vector<PropertyUpdate> &update
     return !updates.empty();
 }
 
+bool read_lockinfo(const std::string &body, bool &exclusive, std::string &owner)
+{
+    const Doc doc = parse(body);
+    xmlNode *root = doc ? xmlDocGetRootElement(doc.get()) : nullptr;
+    bool scope = false, write = false;
+    if (!is_dav(root, "lockinfo"))
+        return false;
+    owner.clear();
+    for (xmlNode *node = xmlFirstElementChild(root); node; node = xmlNextElementSibling(node)) {
+        xmlNode *inner = xmlFirstElementChild(node);
+        if (is_dav(node, "lockscope")) {
+            exclusive = is_dav(inner, "exclusive");
+            scope = exclusive || is_dav(inner, "shared");
+        } else if (is_dav(node, "locktype")) {
+            write = is_dav(inner, "write");
+        } else if (is_dav(node, "owner")) {
+            owner = element_text(node);
+        }
+    }
+    return scope && write;
+}
+
 void append_text(std::string &out, std::string_view text)
 {
     for (const char c : text) {

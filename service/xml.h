@@ -15,6 +15,8 @@ struct PropertyUpdate {
 bool read_propfind(const std::string &body, PropfindBody &propfind);
 // The instructions in document order. False when the body is not a well-formed propertyupdate element.
 bool read_proppatch(const std::string &body, std::vector<PropertyUpdate> &updates);
+// False when the body is not the lockinfo element of a write lock. `owner` is its owner element, or empty.
+bool read_lockinfo(const std::string &body, bool &exclusive, std::string &owner);
 // Appends text so that it can stand between tags and in attributes; what XML cannot hold becomes U+FFFD.
 void append_text(std::string &out, std::string_view text);
 // Appends an empty element of any namespace, declared on the element itself.

@@ -3,6 +3,7 @@
 #include "cloud_content_sync/refresh.h"
 #include "cloud_content_sync/upload.h"
 #include <algorithm>
+#include <csignal>
 
 namespace cloud {
 
@@ -202,6 +203,10 @@ void Client::step_refresh()
 
 void Client::loop()
 {
+    // Signals are the program's to handle, on its own threads; a connection that breaks must not raise SIGPIPE.
+    sigset_t all;
+    sigfillset(&all);
+    pthread_sigmask(SIG_BLOCK, &all, nullptr);
     while (!is_stopping()) {
         step_refresh();
         step_upload();
