@@ -3,9 +3,10 @@
 //
 // The service is a WebDAV server (RFC 4918). It is found by its name in a description file, see README.md here.
 //
-// Threads. Every function may be called from any thread, also from within a callback. Transfer and refresh callbacks run
-// on the client's own thread, one per handle and one callback at a time; folder and content callbacks run on the
-// caller's thread, before the function returns. A callback that waits holds up the client's other transfers.
+// Threads. Every function may be called from any thread, also from within a callback. Callbacks of transfers,
+// refreshes, content requests and thumbnails run on the client's own thread, one per handle and one callback at a time;
+// those that list folders and contents run on the caller's thread, before the function returns. A callback that waits
+// holds up the client's other transfers.
 //
 // Results. Functions answer one of cloud_content_sync_error_e; output arguments are written only when it is 0. What
 // can only be known later, a missing account included, is reported by the callback.
@@ -52,8 +53,8 @@ enum cloud_content_sync_content_type_e {
     CLOUD_CONTENT_TYPE_CAMERA = 4
 };
 
-// state: RUNNING any number of times, with `progress` 0 to 100 in percent of the bytes sent, which never goes back; then
-// exactly once DONE (progress 100) or FAILED (error not 0). file_count is 1. Client thread.
+// state: RUNNING any number of times, with `progress` 0 to 100 in percent of the bytes sent, which never goes back;
+// then exactly once DONE (progress 100) or FAILED (error not 0). file_count is 1. Client thread.
 typedef void (*cloud_content_sync_transfer_cb)(int state, int file_count, int progress, int error, void *user_data);
 // status: exactly once DONE, or FAILED with an error that is not 0. Client thread.
 typedef void (*cloud_content_sync_refresh_cb)(int status, int error, void *user_data);
@@ -64,8 +65,8 @@ typedef bool (*cloud_content_sync_content_cb)(cloud_content_sync_content_h conte
 // Opens a client of the service; nothing is sent. NO_SERVICE without a usable description, DB_FAILED when the service's
 // database cannot be opened. Nobody needs to be signed in: requests then fail with NO_ACCOUNT.
 int cloud_content_sync_create(const char *service_name, cloud_content_sync_h *handle);
-// Ends all requests and frees the handle. No callback runs any more on return: one that is running is waited for, unless
-// this is called from within it. Transfers in progress are broken off by closing their connection.
+// Ends all requests and frees the handle. No callback runs any more on return: one that is running is waited for,
+// unless this is called from within it. Transfers in progress are broken off by closing their connection.
 int cloud_content_sync_destroy(cloud_content_sync_h handle);
 
 // Whether a content type (one of IMAGE, VIDEO, CAMERA) is to be kept in step; kept in the service's database, at first
@@ -84,8 +85,8 @@ int cloud_content_sync_get_is_meta_complete(cloud_content_sync_h handle, bool *c
 
 // The root: path "/", named as the service. It is there before the first refresh as well.
 int cloud_content_sync_folder_get_root(cloud_content_sync_h handle, cloud_content_sync_folder_h *folder);
-// A folder of the database; a final "/" of the path is ignored. NOT_FOUND when there is none, INVALID_PARAMETER when the
-// path is not absolute or has an empty, "." or ".." segment.
+// A folder of the database; a final "/" of the path is ignored. NOT_FOUND when there is none, INVALID_PARAMETER when
+// the path is not absolute or has an empty, "." or ".." segment.
 int cloud_content_sync_get_folder_by_server_path(cloud_content_sync_h handle, const char *path,
                                                  cloud_content_sync_folder_h *folder);
 // NOT_FOUND for the root, and when the parent is gone from the database.
@@ -108,31 +109,43 @@ int cloud_content_sync_content_get_name(cloud_content_sync_content_h content, ch
 int cloud_content_sync_content_get_size(cloud_content_sync_content_h content, long long *size);
 // IMAGE, VIDEO or NONE, by the extension of the name.
 int cloud_content_sync_content_get_content_type(cloud_content_sync_content_h content, int *type);
-// Always false and NOT_FOUND: thumbnails are not fetched.
+// Whether a thumbnail of the current version is in the client's cache; of its file the path, NOT_FOUND without one. It
+// is a JPEG or PNG picture, at most 256 pixels wide and high, in platform_data_dir()/cloud/thumbnails. When there is
+// none, asking for it has it fetched: a picture's, from a service that makes thumbnails, behind all uploads and
+// requests, what was asked for last first. Only the last 200 wait; what a service refuses is not asked for again by
+// this handle. Of the service's file as the last refresh knows it; false and NOT_FOUND once the client's handle is
+// destroyed.
 int cloud_content_sync_content_get_is_thumbnail_exist(cloud_content_sync_content_h content, bool *exists);
 int cloud_content_sync_content_get_thumbnail_path(cloud_content_sync_content_h content, char **path);
+// A thumbnail that was fetched is there now. Client thread; server_path is valid until the callback returns.
+typedef void (*cloud_content_sync_thumbnail_cb)(const char *server_path, void *user_data);
+// One callback per handle; null ends it. The former one does not run any more on return: if it is running it is waited
+// for, unless this is called from within it.
+int cloud_content_sync_set_thumbnail_cb(cloud_content_sync_h handle, cloud_content_sync_thumbnail_cb cb,
+                                        void *user_data);
 
 // Stores a local file at server_path, whose folder must exist. Returns at once; *req_id (above 0) is written before the
 // first callback. Uploads of one handle run one after the other, in the order in which they were asked for.
 //
 // Nothing is ever overwritten: when the name is taken, by a file or a folder, the next free one is used ("a.jpg",
-// "a(1).jpg", "a(2).jpg"; "README", "README(1)"). DONE means that the service holds a file of the same size and SHA-256;
-// a service that offers no digests has the file read back. An answer that is lost is settled by looking, not by sending
-// again; one more attempt follows when nothing is there. The file is in the database before the last callback.
+// "a(1).jpg", "a(2).jpg"; "README", "README(1)"). DONE means that the service holds a file of the same size and
+// SHA-256; a service that offers no digests has the file read back. An answer that is lost is settled by looking, not
+// by sending again; one more attempt follows when nothing is there. The file is in the database before the last
+// callback.
 //
-// cb may be null. A null or empty argument answers INVALID_PARAMETER and there is no request; all else is reported by the
-// callback: NO_ACCOUNT, LOCAL_FILE, BAD_NAME (also for a server_path that is not absolute or has an empty, "." or ".."
-// segment), FORBIDDEN (also when the folder does not exist), STORAGE_FULL, CORRUPTED, UNAUTHORIZED, SERVER, NETWORK
-// (also when nothing moves for a minute, or no answer comes for five minutes after the last byte), and LOCAL_CHANGED:
-// what was stored of the changed file is then removed.
+// cb may be null. A null or empty argument answers INVALID_PARAMETER and there is no request; all else is reported by
+// the callback: NO_ACCOUNT, LOCAL_FILE, BAD_NAME (also for a server_path that is not absolute or has an empty, "." or
+// ".." segment), FORBIDDEN (also when the folder does not exist), STORAGE_FULL, CORRUPTED, UNAUTHORIZED, SERVER,
+// NETWORK (also when nothing moves for a minute, or no answer comes for five minutes after the last byte), and
+// LOCAL_CHANGED: what was stored of the changed file is then removed.
 int cloud_content_sync_upload(cloud_content_sync_h handle, const char *local_path, const char *server_path, int *req_id,
                               cloud_content_sync_transfer_cb cb, void *user_data);
 // Where a finished upload really landed (it may be the next free name). Known until the handle is destroyed, and within
 // the last callback already; NOT_FOUND for a request that has not succeeded.
 int cloud_content_sync_get_uploaded_path(cloud_content_sync_h handle, int req_id, char **server_path);
-// Ends a queued or running upload, which then has no last callback. No callback of it runs any more on return: one that
-// is running is waited for, unless this is called from within it. What it has stored so far is removed. NOT_FOUND
-// when there is no such request or it has had its last callback.
+// Ends a queued or running upload or content request, which then has no last callback. No callback of it runs any more
+// on return: one that is running is waited for, unless this is called from within it. What it has stored so far is
+// removed. NOT_FOUND when there is no such request or it has had its last callback.
 int cloud_content_sync_cancel(cloud_content_sync_h handle, int req_id);
 
 // The credentials by which the device's user is known to a service, as a sign-in or a set-up tool leaves them.
@@ -142,14 +155,29 @@ int cloud_content_sync_cancel(cloud_content_sync_h handle, int req_id);
 // secret, for control characters, and for a user with a colon; NO_SERVICE; DB_FAILED when they cannot be stored.
 int cloud_content_sync_credentials_set(const char *service_name, const char *user, const char *secret);
 
-// A request about one file: its state, the path or address it is about, a word of the service's own (the HTTP status of
-// its last answer), and an error code. On the client's thread, any number of times, and last with state 3 or 4.
+// The last, and only, callback of a request about one file. state: DONE, or FAILED with an error that is not 0. text:
+// the path or address that was asked for when it is DONE, else null; valid until the callback returns. status: the HTTP
+// status (RFC 9110, 15) of the service's last answer, 0 when it was not asked or did not answer. Client thread.
 typedef void (*cloud_content_sync_result_cb)(int state, const char *text, int status, int error, void *user_data);
 
+// All three return at once; *request_id (above 0) is written before the callback. Up to four run at the same time,
+// beside the uploads. The content may be destroyed right after the call. cb may be null. INVALID_PARAMETER for a null
+// or malformed argument, NOT_FOUND when the client's handle, from which the content came, is destroyed; there is no
+// request then. All else is reported by the callback: NO_ACCOUNT, NETWORK, UNAUTHORIZED, FORBIDDEN, SERVER, NOT_FOUND
+// (the service has no such file any more), CORRUPTED (the size or the SHA-256 is not what the service says, Repr-Digest
+// of RFC 9530), and LOCAL_FILE (it cannot be written, the disk is full).
+
+// The file's whole content in the client's cache, platform_data_dir()/cloud/cache, under a name of its own with the
+// file's extension. A version that is there already is answered without the service. The file belongs to the cache and
+// must not be changed; when the cache grows over 512 MiB what was used least recently is removed, and all of it when
+// somebody else signs in.
 int cloud_content_sync_content_get_cached_file(cloud_content_sync_content_h content, int *request_id,
                                                cloud_content_sync_result_cb cb, void *user_data);
-// minutes: how long the address stays good.
+// An address from which anyone can read the file without credentials, by HTTP with ranges, for `minutes` (above 0, and
+// at most as long as the service allows). SERVER from a service that has no such addresses.
 int cloud_content_sync_content_get_streaming_url(cloud_content_sync_content_h content, int *request_id,
                                                  cloud_content_sync_result_cb cb, void *user_data, int minutes);
+// Stores the file at local_path, whose folder must exist, as a whole or not at all: a regular file of that name is
+// replaced when the content is complete. LOCAL_FILE when anything else has the name, a symbolic link for instance.
 int cloud_content_sync_content_download(cloud_content_sync_content_h content, const char *local_path, int *request_id,
                                         cloud_content_sync_result_cb cb, void *user_data);
