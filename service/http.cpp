@@ -184,25 +184,54 @@ struct Job {
 };
 } // namespace
 
-void in_thread(Request &request, std::function<void()> work, std::function<void()> done)
+// Back on the main loop.
+static void end_job(Request &request, const std::function<void()> &done)
+{
+    request.service->busy--;
+    request.jobs--;
+    done();
+    if (request.jobs == 0)
+        soup_server_message_unpause(request.message);
+}
+
+GThreadPool *new_pool(int threads)
+{
+    const auto work = [](gpointer data, gpointer) {
+        static_cast<Job *>(data)->work();
+        g_idle_add_full(
+            G_PRIORITY_DEFAULT,
+            [](gpointer ended) -> gboolean {
+                const std::unique_ptr<Job> job(static_cast<Job *>(ended));
+                SoupServerMessage *message = job->request->message;
+                end_job(*job->request, job->done);
+                g_object_unref(message);
+                return G_SOURCE_REMOVE;
+            },
+            data, nullptr);
+    };
+    return g_thread_pool_new(work, nullptr, threads, FALSE, nullptr);
+}
+
+void in_thread(Request &request, std::function<void()> work, std::function<void()> done, GThreadPool *pool)
 {
     request.service->busy++;
     request.jobs++;
     soup_server_message_pause(request.message);
+    auto *job = new Job{&request, std::move(work), std::move(done)};
     // The message, and the request with it, outlives its connection until the job is done.
+    if (pool) {
+        g_object_ref(request.message);
+        g_thread_pool_push(pool, job, nullptr);
+        return;
+    }
     GTask *task = g_task_new(
         request.message, nullptr,
         [](GObject *, GAsyncResult *result, gpointer) {
-            const auto *job = static_cast<Job *>(g_task_get_task_data(G_TASK(result)));
-            job->request->service->busy--;
-            job->request->jobs--;
-            job->done();
-            if (job->request->jobs == 0)
-                soup_server_message_unpause(job->request->message);
+            const auto *ended = static_cast<Job *>(g_task_get_task_data(G_TASK(result)));
+            end_job(*ended->request, ended->done);
         },
         nullptr);
-    g_task_set_task_data(task, new Job{&request, std::move(work), std::move(done)},
-                         [](gpointer data) { delete static_cast<Job *>(data); });
+    g_task_set_task_data(task, job, [](gpointer data) { delete static_cast<Job *>(data); });
     g_task_run_in_thread(task, [](GTask *self, gpointer, gpointer data, GCancellable *) {
         static_cast<Job *>(data)->work();
         g_task_return_boolean(self, TRUE);
@@ -233,11 +262,20 @@ static void account_info(Request &request)
     request.answer(200, "application/json", json.text(0) + "\n");
 }
 
-static void handle(Request &request)
+static Area area_of(const char *path)
+{
+    if (std::strcmp(path, "/1/account/info") == 0)
+        return Area::ACCOUNT_INFO;
+    if (std::strcmp(path, "/1/media") == 0)
+        return Area::MEDIA_ADDRESS;
+    if (std::strcmp(path, "/1/thumbnail") == 0)
+        return Area::THUMBNAIL;
+    return std::strncmp(path, "/1/media/", 9) == 0 ? Area::MEDIA : Area::DAV;
+}
+
+static void handle_dav(Request &request)
 {
     const std::string method = request.method();
-    if (!request.is_dav)
-        return account_info(request);
     if (method == "PUT")
         return put_finish(request);
     if (method == "OPTIONS")
@@ -260,6 +298,22 @@ static void handle(Request &request)
         return dav_unlock(request);
     request.set_header("Allow", ALLOWED);
     request.answer(405);
+}
+
+static void handle(Request &request)
+{
+    switch (request.area) {
+    case Area::DAV:
+        return handle_dav(request);
+    case Area::ACCOUNT_INFO:
+        return account_info(request);
+    case Area::MEDIA_ADDRESS:
+        return media_address(request);
+    case Area::MEDIA:
+        return media_get(request);
+    case Area::THUMBNAIL:
+        return thumbnail(request);
+    }
 }
 
 static Request &request_of(SoupServerMessage *message)
@@ -306,12 +360,19 @@ static void on_headers(SoupServer *, SoupServerMessage *message, const char *, G
     g_socket_set_option(socket, IPPROTO_TCP, TCP_KEEPCNT, 4, nullptr);
 
     const char *path = g_uri_get_path(soup_server_message_get_uri(message));
-    request->is_dav = std::strcmp(path, "/1/account/info") != 0;
-    const int wrong = request->is_dav ? parse_path(path, request->path) : 0;
+    request->area = area_of(path);
+    const bool is_dav = request->area == Area::DAV;
+    const int wrong = is_dav ? parse_path(path, request->path) : 0;
     if (g_uri_get_fragment(soup_server_message_get_uri(message)))
         return refuse(*request, 400);
     if (wrong == 404)
         return refuse(*request, 404);
+    if (request->area == Area::MEDIA) {
+        request->account = media_account(*request);
+        if (!request->account)
+            refuse(*request, 403);
+        return;
+    }
     request->account = request->service->accounts.authorize(request->header("Authorization"));
     if (!request->account) {
         soup_message_headers_append(soup_server_message_get_response_headers(message), "WWW-Authenticate",
@@ -322,9 +383,9 @@ static void on_headers(SoupServer *, SoupServerMessage *message, const char *, G
     }
     if (wrong)
         return refuse(*request, wrong);
-    if (const int status = request->is_dav ? check_if_header(*request) : 0)
+    if (const int status = is_dav ? check_if_header(*request) : 0)
         return refuse(*request, status);
-    if (request->is_dav && std::strcmp(request->method(), "PUT") == 0)
+    if (is_dav && std::strcmp(request->method(), "PUT") == 0)
         return put_begin(*request);
     if (soup_message_headers_get_content_length(soup_server_message_get_request_headers(message)) > BODY_AT_MOST)
         refuse(*request, 413);
