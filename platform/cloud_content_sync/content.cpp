@@ -209,6 +209,8 @@ void ContentTask::take_address(const Transfer &transfer, const std::string &answ
 void ContentTask::finish(int error, const std::string &text, long status)
 {
     ended = true;
+    if (fetch)
+        fetch->discard();
     if (!client.begin_callback(wanted.id, true))
         return client.http.wake();
     if (wanted.cb)

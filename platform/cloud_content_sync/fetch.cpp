@@ -18,10 +18,16 @@ Fetch::Fetch(Http &h, std::string in, mode_t permissions, long long limit)
 Fetch::~Fetch()
 {
     http.abort(running);
+    discard();
     if (fd >= 0)
         close(fd);
+}
+
+void Fetch::discard()
+{
     if (!temporary.empty())
         unlink(temporary.c_str());
+    temporary.clear();
 }
 
 bool Fetch::start(std::unique_ptr<Transfer> request, const Credentials &credentials, std::function<void()> done)

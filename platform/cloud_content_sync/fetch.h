@@ -28,6 +28,9 @@ class Fetch {
     // Gives the file its name, in the same folder; what has that name is replaced, also when it is a symbolic link.
     bool store(const std::string &target);
 
+    // Removes what was received, unless it was stored.
+    void discard();
+
   private:
     bool write(const char *data, size_t count);
     int check(const Transfer &transfer);
