@@ -177,66 +177,21 @@ void refuse(Request &request, int status)
     lingering->read_on();
 }
 
-namespace {
-struct Job {
-    Request *request;
-    std::function<void()> work, done;
-};
-} // namespace
-
-// Back on the main loop.
-static void end_job(Request &request, const std::function<void()> &done)
+void in_thread(Request &request, std::function<void()> work, std::function<void()> done, Workers *workers)
 {
-    request.service->busy--;
-    request.jobs--;
-    done();
-    if (request.jobs == 0)
-        soup_server_message_unpause(request.message);
-}
-
-GThreadPool *new_pool(int threads)
-{
-    const auto work = [](gpointer data, gpointer) {
-        static_cast<Job *>(data)->work();
-        g_idle_add_full(
-            G_PRIORITY_DEFAULT,
-            [](gpointer ended) -> gboolean {
-                const std::unique_ptr<Job> job(static_cast<Job *>(ended));
-                SoupServerMessage *message = job->request->message;
-                end_job(*job->request, job->done);
-                g_object_unref(message);
-                return G_SOURCE_REMOVE;
-            },
-            data, nullptr);
-    };
-    return g_thread_pool_new(work, nullptr, threads, FALSE, nullptr);
-}
-
-void in_thread(Request &request, std::function<void()> work, std::function<void()> done, GThreadPool *pool)
-{
-    request.service->busy++;
     request.jobs++;
     soup_server_message_pause(request.message);
-    auto *job = new Job{&request, std::move(work), std::move(done)};
     // The message, and the request with it, outlives its connection until the job is done.
-    if (pool) {
-        g_object_ref(request.message);
-        g_thread_pool_push(pool, job, nullptr);
-        return;
-    }
-    GTask *task = g_task_new(
-        request.message, nullptr,
-        [](GObject *, GAsyncResult *result, gpointer) {
-            const auto *ended = static_cast<Job *>(g_task_get_task_data(G_TASK(result)));
-            end_job(*ended->request, ended->done);
-        },
-        nullptr);
-    g_task_set_task_data(task, job, [](gpointer data) { delete static_cast<Job *>(data); });
-    g_task_run_in_thread(task, [](GTask *self, gpointer, gpointer data, GCancellable *) {
-        static_cast<Job *>(data)->work();
-        g_task_return_boolean(self, TRUE);
+    g_object_ref(request.message);
+    Workers &those = workers ? *workers : request.service->workers;
+    those.run(std::move(work), [&request, done = std::move(done)] {
+        SoupServerMessage *message = request.message;
+        request.jobs--;
+        done();
+        if (request.jobs == 0)
+            soup_server_message_unpause(message);
+        g_object_unref(message);
     });
-    g_object_unref(task);
 }
 
 void dav_options(Request &request)

@@ -2,6 +2,7 @@
 // What the handlers of requests share. All of it runs on the main loop.
 #include "locks.h"
 #include "metadata.h"
+#include "workers.h"
 #include <ctime>
 #include <functional>
 #include <libsoup/soup.h>
@@ -22,7 +23,8 @@ struct Service {
     Fd thumbnails;
     std::string media_secret; // of the signatures of addresses
     Faults faults;
-    int busy = 0; // jobs on other threads
+    Workers workers{4};
+    Workers painters{2}; // of thumbnails: bounds their memory, and leaves time for others
 };
 
 struct Upload;
@@ -87,10 +89,8 @@ enum class Reach { CONTENT, NAME, NAME_AND_BELOW };
 bool may_change(Request &request, const Path &path, Reach reach);
 // Runs `work` on another thread while the request waits, then `done` on the main loop; `done` answers, or calls this
 // again. Both run also when the client has gone meanwhile. `work` must touch nothing that the main loop uses.
-// With a pool its threads do it.
-void in_thread(Request &request, std::function<void()> work, std::function<void()> done, GThreadPool *pool = nullptr);
-// A pool for in_thread, that lives as long as the program.
-GThreadPool *new_pool(int threads);
+// `workers` null: those of the service.
+void in_thread(Request &request, std::function<void()> work, std::function<void()> done, Workers *workers = nullptr);
 std::string http_date(int64_t nanoseconds);
 // The value of a Repr-Digest header (RFC 9530) for 64 hexadecimal digits.
 std::string repr_digest(const std::string &sha256_hex);

@@ -159,7 +159,7 @@ static int run(Service &service, const Fd &root_folder, const char *listen_at)
     g_main_loop_run(loop);
     soup_server_disconnect(server);
     g_object_unref(server);
-    while (service.busy)
+    while (service.workers.busy() || service.painters.busy())
         g_main_context_iteration(nullptr, TRUE);
     g_main_loop_unref(loop);
     remove_temporary_files(service);

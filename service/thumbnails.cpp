@@ -12,7 +12,6 @@ static const int64_t KEPT_FOR = 30LL * 24 * 3600 * 1000000000; // nanoseconds si
 static const int64_t FILE_AT_MOST = 64 << 20;
 static const int64_t PIXELS_AT_MOST = 64 << 20; // 256 MiB while it is decoded
 static const size_t THUMBNAIL_AT_MOST = 8 << 20;
-static const int THREADS = 2; // bounds the memory, and leaves time for others
 static const int SIZE_LEAST = 16, SIZE_MOST = 1024;
 
 void thumbnails_sweep(const Service &service)
@@ -174,7 +173,6 @@ void thumbnail(Request &request)
     if (const std::string kept = read_kept(making->folder, making->name); !kept.empty())
         return answer_picture(request, kept);
     making->temporary = temporary_name("new");
-    static GThreadPool *const pool = new_pool(THREADS);
     in_thread(
         request,
         [making] {
@@ -182,5 +180,5 @@ void thumbnail(Request &request)
             if (!making->bytes.empty())
                 keep(making->folder, making->name, making->temporary, making->bytes);
         },
-        [making, &request] { answer_picture(request, making->bytes); }, pool);
+        [making, &request] { answer_picture(request, making->bytes); }, &request.service->painters);
 }

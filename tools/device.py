@@ -1,6 +1,7 @@
 """A device of one's own for demos and end-to-end tests: its folders, its bus, its display, a service with an account,
 and the means to look at the application and to click in it. Everything it starts it ends."""
 
+import ast
 import base64
 import os
 import re
@@ -8,6 +9,7 @@ import shutil
 import signal
 import subprocess
 import tempfile
+import threading
 import time
 import urllib.error
 import urllib.parse
@@ -40,16 +42,22 @@ class Device:
         self.home = tempfile.mkdtemp(prefix="velora-")
         self.data = data or os.path.join(self.home, "cloud")
         self.processes = []
+        self.port = 0
         self.env = dict(os.environ)
-        if not keep_display:
-            for name in ("DISPLAY", "WAYLAND_DISPLAY"):
+        runtime = os.path.join(self.home, "run")
+        os.makedirs(runtime, mode=0o700)
+        if keep_display:  # found by way of the folders that are replaced below
+            self.env.setdefault("XAUTHORITY", os.path.expanduser("~/.Xauthority"))
+            runtime = self.env.get("XDG_RUNTIME_DIR", runtime)
+        else:
+            for name in ("DISPLAY", "WAYLAND_DISPLAY", "XAUTHORITY", "DBUS_SESSION_BUS_ADDRESS", "WINDOWID"):
                 self.env.pop(name, None)
         self.env.update(
             HOME=self.home,
             XDG_CONFIG_HOME=os.path.join(self.home, "config"),
             XDG_DATA_HOME=os.path.join(self.home, "share"),
             XDG_CACHE_HOME=os.path.join(self.home, "cache"),
-            XDG_RUNTIME_DIR=os.path.join(self.home, "run"),
+            XDG_RUNTIME_DIR=runtime,
             PLATFORM_DATA_DIR=os.path.join(self.home, "device"),
             CLOUD_SERVICES_DIR=os.path.join(self.home, "services"),
             VELORA_MEDIA_ROOT=os.path.join(self.home, "media"),
@@ -64,22 +72,29 @@ class Device:
             self.env["ORVANT_THEME"] = "dark"
         for name in ("XDG_CONFIG_HOME", "XDG_DATA_HOME", "XDG_CACHE_HOME", "CLOUD_SERVICES_DIR", "VELORA_MEDIA_ROOT"):
             os.makedirs(self.env[name], exist_ok=True)
-        os.makedirs(self.env["XDG_RUNTIME_DIR"], mode=0o700, exist_ok=True)
         self.log = os.path.join(self.home, "log.txt")
 
     def program(self, path):
         return os.path.join(self.build, path)
 
     def start(self, command, **options):
-        options.setdefault("stderr", open(self.log, "ab"))
-        process = subprocess.Popen(command, env=self.env, start_new_session=True, **options)
+        with open(self.log, "ab") as log:
+            options.setdefault("stderr", log)
+            options.setdefault("stdin", subprocess.DEVNULL)
+            options.setdefault("env", self.env)
+            process = subprocess.Popen(command, start_new_session=True, **options)
         self.processes.append(process)
         return process
 
     def run(self, *command, **options):
         """The standard output of a command that must succeed."""
         options.setdefault("timeout", 60)
-        done = subprocess.run(command, env=self.env, capture_output=True, **options)
+        if "input" not in options:
+            options["stdin"] = subprocess.DEVNULL
+        try:
+            done = subprocess.run(command, env=self.env, capture_output=True, **options)
+        except subprocess.TimeoutExpired:
+            raise Trouble(f"{os.path.basename(command[0])} does not come to an end") from None
         if done.returncode != 0:
             words = done.stderr.decode(errors="replace").strip().splitlines()
             raise Trouble(f"{os.path.basename(command[0])} failed: {words[-1] if words else done.returncode}")
@@ -91,27 +106,51 @@ class Device:
     # the session
 
     def start_bus(self):
-        bus = self.start(["dbus-daemon", "--session", "--nofork", "--print-address=1"], stdout=subprocess.PIPE)
+        bus = self.start(["dbus-daemon", "--session", "--nofork", "--print-address=1"], stdout=subprocess.PIPE,
+                         stderr=subprocess.DEVNULL)
         self.env["DBUS_SESSION_BUS_ADDRESS"] = bus.stdout.readline().decode().strip()
 
+    def is_on_bus(self, name):
+        return name in self.run("gdbus", "call", "--session", "--dest", "org.freedesktop.DBus", "--object-path", "/",
+                                "--method", "org.freedesktop.DBus.ListNames")
+
+    def has_display(self):
+        """Whether a window can be opened: a variable may be set and name nothing."""
+        if self.env.get("DISPLAY"):
+            return subprocess.run(["xdotool", "getdisplaygeometry"], env=self.env, capture_output=True).returncode == 0
+        socket = os.path.join(self.env["XDG_RUNTIME_DIR"], self.env.get("WAYLAND_DISPLAY", ""))
+        return bool(self.env.get("WAYLAND_DISPLAY")) and os.path.exists(socket)
+
     def start_display(self):
-        display = self.start(
-            ["Xvfb", "-displayfd", "1", "-screen", "0", f"{self.size}x24", "-nolisten", "tcp"],
-            stdout=subprocess.PIPE, stderr=subprocess.DEVNULL)
-        self.env["DISPLAY"] = ":" + display.stdout.readline().decode().strip()
         # No frames and no menus: the window is the screen, as on a phone.
         rules = os.path.join(self.home, "openbox.xml")
         with open(rules, "w", encoding="utf-8") as file:
             file.write('<openbox_config xmlns="http://openbox.org/3.4/rc"><applications>'
                        '<application class="*" type="normal"><decor>no</decor><maximized>yes</maximized></application>'
                        '<application class="*" type="dialog"><decor>no</decor><maximized>yes</maximized></application>'
-                       "</applications></openbox_config>")
-        self.start(["openbox", "--sm-disable", "--config-file", rules], stdout=subprocess.DEVNULL,
-                   stderr=subprocess.DEVNULL)
-        wait_for("the window manager", lambda: subprocess.run(
-            ["xdotool", "get_desktop"], env=self.env, capture_output=True).returncode == 0)
+                       '</applications><keyboard><keybind key="A-F4"><action name="Close"/></keybind></keyboard>'
+                       "</openbox_config>")
+        for attempt in range(3):
+            server = self.start(
+                ["Xvfb", "-displayfd", "1", "-screen", "0", f"{self.size}x24", "-nolisten", "tcp"],
+                stdout=subprocess.PIPE, stderr=subprocess.DEVNULL)
+            self.env["DISPLAY"] = ":" + server.stdout.readline().decode().strip()
+            manager = self.start(["openbox", "--sm-disable", "--config-file", rules], stdout=subprocess.DEVNULL,
+                                 stderr=subprocess.DEVNULL)
+            try:
+                wait_for("the window manager", lambda: subprocess.run(
+                    ["xdotool", "get_desktop"], env=self.env, capture_output=True, timeout=10).returncode == 0, 5)
+                return
+            except (Trouble, subprocess.TimeoutExpired):
+                # A server that ends removes the socket of the next one, when that took its number just then.
+                for process in (manager, server):
+                    process.kill()
+                    process.wait()
+                if attempt == 2:
+                    raise Trouble("the virtual display does not start") from None
 
-    def start_notification_daemon(self):
+    def start_notification_daemon(self, in_sight=True):
+        """Out of sight means: too small to cover what is to be clicked."""
         if not shutil.which("dunst"):
             return
         rules = os.path.join(self.home, "dunstrc")
@@ -120,16 +159,19 @@ class Device:
             file.write(f"[global]\nwidth = {width}\norigin = top-center\noffset = 0x16\nfont = Sans 12\n"
                        "frame_width = 1\ncorner_radius = 8\nmax_icon_size = 48\nmarkup = full\nformat = \"<b>%s</b>\\n%b\"\n"
                        "mouse_left_click = do_action, close_current\n")
+            if not in_sight:
+                file.write("width = 8\nheight = 8\norigin = bottom-right\noffset = 0x0\nicon_position = off\n"
+                           "padding = 0\nhorizontal_padding = 0\nframe_width = 0\nfont = Sans 1\n")
         self.start(["dunst", "-conf", rules], stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL)
-        wait_for("the notification daemon", lambda: "org.freedesktop.Notifications" in self.run(
-            "gdbus", "call", "--session", "--dest", "org.freedesktop.DBus", "--object-path", "/", "--method",
-            "org.freedesktop.DBus.ListNames"))
+        wait_for("the notification daemon", lambda: self.is_on_bus("org.freedesktop.Notifications"))
 
     # the service and the account
 
     def start_service(self, *options):
-        cloud = self.start([self.program("service/velora-cloud"), "--root", self.data, "--listen", "127.0.0.1:0",
-                            "--add-account", f"{EMAIL}:{PASSWORD}", *options], stdout=subprocess.PIPE)
+        """Starts velora-cloud, a second time at the port that it had."""
+        cloud = self.start([self.program("service/velora-cloud"), "--root", self.data, "--listen",
+                            f"127.0.0.1:{self.port}", "--add-account", f"{EMAIL}:{PASSWORD}", *options],
+                           stdout=subprocess.PIPE)
         for line in cloud.stdout:
             found = re.match(r"listening on (http://\S+)", line.decode())
             if found:
@@ -138,14 +180,17 @@ class Device:
             raise Trouble("velora-cloud does not start; its words are in " + self.log)
         self.service = cloud
         self.web = found.group(1).rstrip("/")
+        self.port = urllib.parse.urlsplit(self.web).port
         with open(os.path.join(self.env["CLOUD_SERVICES_DIR"], "Velora.conf"), "w", encoding="utf-8") as file:
             file.write(f"[Service]\nWeb={self.web}/\nApi={self.web}/\nStorage={self.web}/dav/\n")
         return cloud
 
     def sign_in(self):
-        token = self.tool("service/velora-cloud", "--root", self.data, "--token", EMAIL).split()[-1]
-        self.tool("platform/cloud_content_sync/cloud-account", "set", "Velora", input=token.encode() + b"\n")
+        self.token_set(self.tool("service/velora-cloud", "--root", self.data, "--token", EMAIL).split()[-1])
         self.tool("platform/account/device-account", "add", "--package", APP, "--domain", "Velora", "--user", EMAIL)
+
+    def token_set(self, token):
+        self.tool("platform/cloud_content_sync/cloud-account", "set", "Velora", input=token.encode() + b"\n")
 
     def setting(self, key, value):
         self.tool("platform/vconf/settings-store", "set", key, value)
@@ -180,6 +225,15 @@ class Device:
         return {os.path.join("/", os.path.relpath(os.path.join(folder, name), top))
                 for folder, _, names in os.walk(top) for name in names}
 
+    # the application
+
+    def start_application(self):
+        application = self.start([self.program("src/setting/main/velora"), "--service"])
+        wait_for("the application on the bus", lambda: self.is_on_bus(APP) or application.poll() is not None)
+        if application.poll() is not None:
+            raise Trouble("the application does not start; its words are in " + self.log)
+        return application
+
     # what a person sees and does
 
     def visible(self):
@@ -190,7 +244,7 @@ class Device:
             return []
         rows = re.findall(r"\('((?:[^'\\]|\\.)*)', (?:'((?:[^'\\]|\\.)*)'|\"((?:[^\"\\]|\\.)*)\"), "
                           r"(-?\d+), (-?\d+), (-?\d+), (-?\d+)\)", done.stdout.decode(errors="replace"))
-        return [(kind, re.sub(r"\\(.)", r"\1", single or double), *map(int, place))
+        return [(kind, ast.literal_eval(f"'{single}'" if single else f'"{double}"'), *map(int, place))
                 for kind, single, double, *place in rows]
 
     def find(self, text, kind=None):
@@ -213,6 +267,16 @@ class Device:
     def key(self, name):
         self.run("xdotool", "key", name)
 
+    def raise_window(self):
+        """Brings the application's window back to the front; false when there is none."""
+        found = subprocess.run(["xdotool", "search", "--onlyvisible", "--name", "^velora$"], env=self.env,
+                               capture_output=True, check=False)
+        windows = found.stdout.split()
+        if windows:
+            subprocess.run(["xdotool", "windowactivate", "--sync", windows[-1]], env=self.env, capture_output=True,
+                           timeout=20, check=False)
+        return bool(windows)
+
     def picture(self, path):
         time.sleep(0.3)  # what is on its way to the screen
         self.run("import", "-window", "root", path)
@@ -225,16 +289,43 @@ class Device:
     def notifications(self):
         return self.tool("platform/notification/notifications", "list").splitlines()
 
+    def left_over(self):
+        """The ids of processes, also of those that others started for us, that work in this device's folders."""
+        mine = b"PLATFORM_DATA_DIR=" + os.fsencode(self.env["PLATFORM_DATA_DIR"])
+        found = []
+        for pid in filter(str.isdigit, os.listdir("/proc")):
+            try:
+                with open(f"/proc/{pid}/environ", "rb") as file:
+                    if mine in file.read().split(b"\0") and int(pid) != os.getpid():
+                        found.append(int(pid))
+            except OSError:
+                pass
+        return found
+
     def end(self):
+        """Ends every process and removes the device's folders. A second interrupt does not stop this."""
+        handlers = {}
+        if threading.current_thread() is threading.main_thread():
+            handlers = {number: signal.signal(number, signal.SIG_IGN)
+                        for number in (signal.SIGINT, signal.SIGTERM, signal.SIGHUP)}
         for process in reversed(self.processes):
             if process.poll() is None:
+                process.terminate()
                 try:
-                    os.killpg(process.pid, signal.SIGTERM)
-                except ProcessLookupError:
-                    pass
-        for process in reversed(self.processes):
+                    process.wait(5)
+                except subprocess.TimeoutExpired:
+                    process.kill()
+                    process.wait()
+            if process.stdout:
+                process.stdout.close()
+        end = time.monotonic() + 3
+        while (left := self.left_over()) and time.monotonic() < end:
+            time.sleep(0.05)
+        for pid in left:
             try:
-                process.wait(5)
-            except subprocess.TimeoutExpired:
-                os.killpg(process.pid, signal.SIGKILL)
+                os.kill(pid, signal.SIGKILL)
+            except ProcessLookupError:
+                pass
         shutil.rmtree(self.home, ignore_errors=True)
+        for number, handler in handlers.items():
+            signal.signal(number, handler)

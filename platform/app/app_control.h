@@ -6,7 +6,7 @@
 // end with NUL: a file name comes through as it is, UTF-8 or not.
 //
 // Over the session bus an application owns its id as its bus name and answers there to org.freedesktop.Application
-// (Desktop Entry Specification 1.5, "D-Bus Activation") and to
+// (desktop entries of freedesktop.org, 1.5, "D-Bus Activation") and to
 //   com.orvant.AppControl.Launch (in a{sv} request, out a{sv} reply)
 // whose answer comes when the application replies. Without a bus a request is handed over on the command line.
 //
@@ -94,7 +94,8 @@ int app_control_get_extra_data_array(app_control_h request, const char *key, cha
 int app_control_foreach_extra_data(app_control_h request, app_control_extra_data_cb callback, void *user_data);
 
 // Calls back once for each installed application that can show the request's MIME type (without one, the type guessed
-// from the URI), the user's default first. The ids are desktop file ids without ".desktop". No application is not an
+// from the URI), the user's default first, without this application
+// itself. The ids are desktop file ids without ".desktop". No application is not an
 // error. A request with another operation than view matches none.
 int app_control_foreach_app_matched(app_control_h request, app_control_app_matched_cb callback, void *user_data);
 

@@ -15,7 +15,7 @@ constexpr char introspection[] = R"(<node>
 </interface>
 </node>)";
 
-enum { request_name_do_not_queue = 4, request_name_exists = 3 }; // D-Bus specification, RequestName
+enum { request_name_do_not_queue = 4, request_name_exists = 3 }; // as D-Bus numbers them for RequestName
 
 struct Receiver {
     std::string id;
@@ -185,6 +185,13 @@ void app_add_alias(const char *app_id)
         receiver().aliases.emplace_back(app_id);
 }
 
+std::vector<std::string> bus_own_ids()
+{
+    std::vector<std::string> ids = receiver().aliases;
+    ids.insert(ids.begin(), app_get_id());
+    return ids;
+}
+
 GDBusConnection *bus_connection()
 {
     static GDBusConnection *bus = [] {
@@ -238,10 +245,8 @@ Role bus_own(std::function<void(app_control_h)> receive)
         return Role::alone;
     the.leaving = false;
     the.receive = std::move(receive);
-    std::vector<std::string> names = the.aliases;
-    names.insert(names.begin(), id);
     // the objects come first: whoever sees the name finds them
-    for (const std::string &name : names)
+    for (const std::string &name : bus_own_ids())
         export_object(name);
     if (!own_name(id)) {
         for (const guint object : std::exchange(the.objects, {}))

@@ -4,7 +4,9 @@
 #include "app/target.h"
 #include <algorithm>
 #include <cstring>
+#include <fcntl.h>
 #include <gio/gunixinputstream.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 namespace {
@@ -136,9 +138,16 @@ gboolean start_timed_out(gpointer data)
     return G_SOURCE_REMOVE;
 }
 
-void own_session(gpointer)
+// In the child. Only calls that are allowed between fork and exec.
+void detach(gpointer)
 {
     setsid(); // an interrupt at the sender's terminal is not meant for the program
+    struct stat errors = {};
+    if (fstat(STDERR_FILENO, &errors) != 0 || !S_ISFIFO(errors.st_mode))
+        return;
+    // whoever reads the sender's messages from a pipe shall not have to wait for the program's end
+    if (const int nowhere = open("/dev/null", O_WRONLY | O_CLOEXEC); nowhere >= 0)
+        dup2(nowhere, STDERR_FILENO);
 }
 
 bool spawn(const std::vector<std::string> &command, GSpawnFlags flags, GPid *child, int *output)
@@ -149,8 +158,8 @@ bool spawn(const std::vector<std::string> &command, GSpawnFlags flags, GPid *chi
     arguments.push_back(nullptr);
     GError *error = nullptr;
     flags = static_cast<GSpawnFlags>(flags | G_SPAWN_SEARCH_PATH | G_SPAWN_DO_NOT_REAP_CHILD);
-    if (!command.empty() && g_spawn_async_with_pipes(nullptr, arguments.data(), nullptr, flags, own_session, nullptr,
-                                                     child, nullptr, output, nullptr, &error))
+    if (!command.empty() && g_spawn_async_with_pipes(nullptr, arguments.data(), nullptr, flags, detach, nullptr, child,
+                                                     nullptr, output, nullptr, &error))
         return true;
     g_warning("%s", error ? error->message : "the entry has no command");
     g_clear_error(&error);

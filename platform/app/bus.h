@@ -19,6 +19,9 @@ void bus_watch_answer(const std::shared_ptr<Answer> &answer);
 // for a program that is being started). To be called once, when the main loop has ended.
 void bus_stop(int patience);
 
+// This process's id and its aliases.
+std::vector<std::string> bus_own_ids();
+
 // The session bus, or null. The reference belongs to this library.
 GDBusConnection *bus_connection();
 // True when somebody owns the name now, or the bus knows how to start its owner.

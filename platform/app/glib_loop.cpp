@@ -66,7 +66,7 @@ int wait_for_both(int count, fd_set *read, fd_set *write, fd_set *except, timeva
 
     int priority = 0;
     int glib_ms = -1;
-    const bool ready = g_main_context_prepare(context, &priority);
+    g_main_context_prepare(context, &priority); // with a source ready at once, the query says 0 milliseconds
     std::vector<GPollFD> fds = std::exchange(spare, {});
     fds.resize(std::max<size_t>(fds.capacity(), 16));
     int have = 0;
@@ -81,7 +81,7 @@ int wait_for_both(int count, fd_set *read, fd_set *write, fd_set *except, timeva
         if (const short events = sets.wanted(fd))
             fds.push_back({fd, static_cast<gushort>(events), 0});
 
-    const auto wait = earlier(timeout, ready ? 0 : glib_ms);
+    const auto wait = earlier(timeout, glib_ms);
     auto *polled = reinterpret_cast<pollfd *>(fds.data());
     const int found = ppoll(polled, fds.size(), wait ? &*wait : nullptr, nullptr);
     const int error = errno;

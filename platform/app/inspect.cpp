@@ -37,8 +37,11 @@ bool is_in_sight(const Evas_Object *obj, Eina_Rectangle *place)
 
 void add(const Walk &walk, const char *kind, const char *text, const Eina_Rectangle &place)
 {
-    if (text && *text && g_utf8_validate(text, -1, nullptr))
-        g_variant_builder_add(walk.out, "(ssiiii)", kind, text, walk.x + place.x, walk.y + place.y, place.w, place.h);
+    if (!text || !*text)
+        return;
+    char *valid = g_utf8_make_valid(text, -1); // names of files may hold any bytes
+    g_variant_builder_add(walk.out, "(ssiiii)", kind, valid, walk.x + place.x, walk.y + place.y, place.w, place.h);
+    g_free(valid);
 }
 
 void add_markup(const Walk &walk, const char *kind, const char *markup, const Eina_Rectangle &place)
@@ -53,14 +56,16 @@ void add_markup(const Walk &walk, const char *kind, const char *markup, const Ei
 void visit(const Walk &walk, Evas_Object *obj)
 {
     Eina_Rectangle place = {};
-    if (!is_in_sight(obj, &place))
-        return;
     const char *type = evas_object_type_get(obj);
-    if (std::strcmp(type, "text") == 0)
+    // A smart object may be smaller than what it shows, an empty context popup even without size.
+    const bool is_seen = is_in_sight(obj, &place);
+    if (!evas_object_visible_get(obj))
+        return;
+    if (is_seen && std::strcmp(type, "text") == 0)
         add(walk, "text", evas_object_text_text_get(obj), place);
-    else if (std::strcmp(type, "textblock") == 0)
+    else if (is_seen && std::strcmp(type, "textblock") == 0)
         add_markup(walk, "text", evas_object_textblock_text_markup_get(obj), place);
-    else if (elm_object_widget_check(obj) && std::strcmp(elm_object_widget_type_get(obj), "Elm_Button") == 0)
+    else if (is_seen && elm_object_widget_check(obj) && std::strcmp(elm_object_widget_type_get(obj), "Elm_Button") == 0)
         add_markup(walk, "Elm_Button", elm_object_text_get(obj), place);
     for (const char *leaf : {"rectangle", "image", "text", "textblock", "line", "polygon", "vectors", "textgrid"})
         if (std::strcmp(type, leaf) == 0)

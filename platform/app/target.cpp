@@ -80,9 +80,11 @@ std::string content_type(const app_control_s &request)
     return result;
 }
 
-bool same_program(const AppInfo &one, GAppInfo *other)
+// An application that takes files of a type to hand them on is no viewer for itself.
+bool is_own_entry(GAppInfo *info)
 {
-    return g_app_info_equal(one.get(), other);
+    const char *id = g_app_info_get_id(info);
+    return id && std::ranges::any_of(bus_own_ids(), [id](const std::string &own) { return own + ".desktop" == id; });
 }
 } // namespace
 
@@ -105,14 +107,17 @@ AppInfo desktop_entry(const std::string &app_id)
 std::vector<AppInfo> viewers(const app_control_s &request)
 {
     std::vector<AppInfo> found;
+    const auto is_new = [&found](GAppInfo *info) {
+        return !is_own_entry(info) &&
+               std::ranges::none_of(found, [info](const AppInfo &have) { return g_app_info_equal(have.get(), info); });
+    };
     const std::string type = content_type(request);
     if (!type.empty()) {
-        if (GAppInfo *first = g_app_info_get_default_for_type(type.c_str(), FALSE))
-            found.emplace_back(first);
         GList *all = g_app_info_get_all_for_type(type.c_str());
+        if (GAppInfo *first = g_app_info_get_default_for_type(type.c_str(), FALSE))
+            all = g_list_prepend(all, first);
         for (GList *item = all; item; item = item->next)
-            if (auto *info = static_cast<GAppInfo *>(item->data);
-                std::ranges::none_of(found, [info](const AppInfo &have) { return same_program(have, info); }))
+            if (auto *info = static_cast<GAppInfo *>(item->data); is_new(info))
                 found.emplace_back(g_app_info_dup(info));
         g_list_free_full(all, g_object_unref);
     }

@@ -111,7 +111,8 @@ void run(Db &db, const Job &job, const std::atomic<bool> &cancel)
     keep.bind(3, job.path).bind(4, job.timeline).done();
 }
 
-// Makes thumbnails one after the other on a thread that lives from the first job to the last disconnect.
+// Makes thumbnails one after the other on a thread that ends with the last disconnect. Nobody waits for that end, since
+// a decoder cannot be interrupted within a piece of its file; so the state is never freed.
 class Maker {
   public:
     // Hands in a job and waits for it when no other is under way, for at most `patience`.
@@ -123,9 +124,9 @@ class Maker {
                 return;
         const bool alone = jobs.empty();
         jobs.push_back(job);
-        if (!thread.joinable()) {
-            cancel = std::make_shared<std::atomic<bool>>(false);
-            thread = std::thread(&Maker::work, this, cancel);
+        if (!ended) {
+            ended = std::make_shared<std::atomic<bool>>(false);
+            std::thread(&Maker::work, this, ended).detach();
         }
         changed.notify_all();
         if (alone)
@@ -134,44 +135,34 @@ class Maker {
 
     void stop()
     {
-        std::thread ending;
-        {
-            const std::lock_guard hold(lock);
-            if (cancel)
-                *cancel = true;
-            jobs.clear();
-            ending.swap(thread);
-        }
+        const std::lock_guard hold(lock);
+        if (ended)
+            *ended = true;
+        ended.reset();
+        jobs.clear();
         changed.notify_all();
-        if (ending.joinable())
-            ending.join();
-    }
-
-    ~Maker()
-    {
-        stop();
     }
 
   private:
+    using Flag = std::shared_ptr<std::atomic<bool>>;
     std::mutex lock;
     std::condition_variable changed;
     std::deque<Job> jobs; // the first one is under way
-    std::thread thread;
-    std::shared_ptr<std::atomic<bool>> cancel; // of this thread: a later one must not revive one that ends
+    Flag ended;           // of the present thread: a later one must not revive one that ends
 
-    void work(std::shared_ptr<std::atomic<bool>> ended)
+    void work(const Flag mine)
     {
         std::unique_lock hold(lock);
         for (;;) {
-            changed.wait(hold, [&] { return *ended || !jobs.empty(); });
-            if (*ended)
+            changed.wait(hold, [&] { return *mine || !jobs.empty(); });
+            if (*mine)
                 return;
             const Job job = jobs.front();
             hold.unlock();
             if (Db *db = index())
-                run(*db, job, *ended);
+                run(*db, job, *mine);
             hold.lock();
-            if (*ended)
+            if (*mine)
                 return;
             jobs.pop_front();
             changed.notify_all();
@@ -179,7 +170,12 @@ class Maker {
     }
 };
 
-Maker maker;
+Maker &maker()
+{
+    static Maker *the = new Maker;
+    return *the;
+}
+
 std::mutex connection_lock;
 std::atomic<int> connections{0};
 constexpr std::chrono::milliseconds PATIENCE{40};
@@ -210,7 +206,7 @@ int media_content_disconnect()
     if (connections == 0)
         return MEDIA_CONTENT_ERROR_INVALID_OPERATION;
     if (--connections == 0)
-        maker.stop();
+        maker().stop();
     return MEDIA_CONTENT_ERROR_NONE;
 }
 
@@ -266,7 +262,7 @@ int media_info_foreach_media_from_db_with_media_mode(filter_h filter, media_info
         if (failed)
             return MEDIA_CONTENT_ERROR_DB_FAILED;
         if (job)
-            maker.add(*job, PATIENCE);
+            maker().add(*job, PATIENCE);
     }
 
     std::string sql = "SELECT path, thumbnail FROM media";

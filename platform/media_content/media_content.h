@@ -25,8 +25,8 @@ enum media_content_type_e { MEDIA_CONTENT_TYPE_IMAGE = 0, MEDIA_CONTENT_TYPE_VID
 typedef bool (*media_info_cb)(media_info_h media, void *user_data);
 
 // Connections are counted per process; MEDIA_CONTENT_ERROR_DB_FAILED when the database cannot be opened. The last
-// disconnect gives up the thumbnails that are still being made, which takes some milliseconds. One disconnect too many
-// gives MEDIA_CONTENT_ERROR_INVALID_OPERATION, and so does every use of the index without a connection.
+// disconnect gives up the thumbnails that are still being made, without waiting. One disconnect too many gives
+// MEDIA_CONTENT_ERROR_INVALID_OPERATION, and so does every use of the index without a connection.
 int media_content_connect();
 int media_content_disconnect();
 
@@ -72,7 +72,7 @@ int media_info_get_thumbnail_path(media_info_h media, char **path);
 
 // Enters one picture or video into the index (or refreshes its record) and makes its thumbnail when it has none. A
 // thumbnail that the cache has is used; for videos there is no other way to get one. Pictures of more than 64 million
-// pixels and broken ones stay without. The call takes as long as decoding does (a large photo: tenths of a second).
-// MEDIA_CONTENT_ERROR_INVALID_PARAMETER, and no record from then on, for what is no absolute path of a readable regular
-// file with an image or video MIME type.
+// pixels and those that cannot be decoded stay without. The call takes as long as decoding does (a large photo: tenths
+// of a second). MEDIA_CONTENT_ERROR_INVALID_PARAMETER, and no record from then on, for what is no absolute path of a
+// readable regular file with an image or video MIME type.
 int media_content_scan_file(const char *path);

@@ -66,7 +66,7 @@ void scale(GdkPixbufLoader *loader, int width, int height, gpointer user_data)
         gdk_pixbuf_loader_set_size(loader, std::max(1, width * SIDE / longer), std::max(1, height * SIDE / longer));
 }
 
-// Feeds the decoder in pieces, so that a cancel is seen soon.
+// Feeds the decoder in pieces, so that a cancel is seen between two of them.
 Owned<GdkPixbuf> decode(const std::string &path, Size &size, const std::atomic<bool> &cancel)
 {
     std::ifstream file(path, std::ios::binary);

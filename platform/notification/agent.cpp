@@ -1,12 +1,14 @@
 // notification-agent: shows the notifications of the store at the session's notification daemon and acts on taps, also
 // when the program that posted one has left. It ends when nothing is left to show, or with the bus.
+#include "app/target.h"
 #include "notification/courier.h"
 #include "notification/tap.h"
 #include <algorithm>
-#include <gio/gdesktopappinfo.h>
 #include <gio/gio.h>
 #include <map>
 #include <unistd.h>
+#include <utility>
+#include <vector>
 
 namespace {
 
@@ -23,6 +25,13 @@ struct Shown {
     std::string sent; // what the daemon was told
 };
 
+enum class Event { tap, expired, dismissed };
+
+struct DaemonSignal {
+    guint32 daemon_id;
+    Event event;
+};
+
 struct Agent {
     GMainLoop *loop = nullptr;
     GDBusConnection *bus = nullptr;
@@ -30,11 +39,13 @@ struct Agent {
     std::map<int, Shown> shown; // by private id
     long long version = -1;
     guint sync_timer = 0, quit_timer = 0;
+    std::vector<DaemonSignal> early; // about ids that an answer under way will name
 };
 
 Agent agent;
 
 void sync_store();
+void take_signal(const DaemonSignal &signal);
 
 void sync_after(gint64 microseconds)
 {
@@ -85,14 +96,11 @@ std::string body(const notification_s &noti)
 
 std::string app_name(const std::string &package)
 {
-    GDesktopAppInfo *info = g_desktop_app_info_new((package + ".desktop").c_str());
-    std::string name = info ? g_app_info_get_name(G_APP_INFO(info)) : package;
-    if (info)
-        g_object_unref(info);
-    return name;
+    const AppInfo info = desktop_entry(package);
+    return info ? g_app_info_get_name(info.get()) : package;
 }
 
-// The arguments of Notify, of the Desktop Notifications Specification 1.2.
+// The arguments of Notify, as desktop notifications 1.2 have them.
 GVariant *notify_arguments(const notification_s &noti, guint32 replaces)
 {
     const bool ongoing = noti.type == NOTIFICATION_TYPE_ONGOING;
@@ -133,6 +141,8 @@ void notify_answered(GObject *bus, GAsyncResult *outcome, gpointer data)
     }
     if (reply)
         g_variant_unref(reply);
+    for (const DaemonSignal &signal : std::exchange(agent.early, {}))
+        take_signal(signal);
     sync_store();
 }
 
@@ -214,33 +224,45 @@ int private_id(guint32 daemon_id)
     return 0;
 }
 
-void daemon_signal(GDBusConnection *, const char *, const char *, const char *, const char *signal,
-                   GVariant *parameters, gpointer)
+// A signal may overtake the answer to Notify that names its id; then it waits for that answer.
+void take_signal(const DaemonSignal &signal)
 {
-    enum { EXPIRED = 1, DISMISSED = 2, CLOSED_BY_US = 3 };
-    guint32 daemon_id = 0, reason = 0;
-    const char *action = "";
-    const bool is_tap =
-        g_str_equal(signal, "ActionInvoked") && g_variant_is_of_type(parameters, G_VARIANT_TYPE("(us)"));
-    const bool is_close =
-        g_str_equal(signal, "NotificationClosed") && g_variant_is_of_type(parameters, G_VARIANT_TYPE("(uu)"));
-    if (is_tap)
-        g_variant_get(parameters, "(u&s)", &daemon_id, &action);
-    else if (is_close)
-        g_variant_get(parameters, "(uu)", &daemon_id, &reason);
-    const int id = daemon_id ? private_id(daemon_id) : 0;
-    const auto noti = id ? store_list(nullptr, id) : std::vector<notification_s>();
+    const int id = private_id(signal.daemon_id);
+    if (!id) {
+        const auto asked = [](const auto &entry) { return entry.second.asked; };
+        if (std::any_of(agent.shown.begin(), agent.shown.end(), asked))
+            agent.early.push_back(signal);
+        return;
+    }
+    const auto noti = store_list(nullptr, id);
     if (noti.empty())
         return;
-    if (is_tap && g_str_equal(action, "default"))
+    bool failed = false;
+    if (signal.event == Event::tap) {
         tap(noti.front());
-    if (is_close && reason != CLOSED_BY_US) {
-        agent.shown.erase(id);
-        bool failed = false;
-        if (reason == DISMISSED && noti.front().type == NOTIFICATION_TYPE_NOTI)
-            store_delete(noti.front().package, id, failed);
-        else
-            store_set_closed(id);
+        return;
+    }
+    agent.shown.erase(id);
+    if (signal.event == Event::dismissed && noti.front().type == NOTIFICATION_TYPE_NOTI)
+        store_delete(noti.front().package, id, failed);
+    else
+        store_set_closed(id);
+}
+
+void daemon_signal(GDBusConnection *, const char *, const char *, const char *, const char *name, GVariant *parameters,
+                   gpointer)
+{
+    enum { DISMISSED = 2, CLOSED_BY_US = 3 };
+    guint32 daemon_id = 0, reason = 0;
+    const char *action = "";
+    if (g_str_equal(name, "ActionInvoked") && g_variant_is_of_type(parameters, G_VARIANT_TYPE("(us)"))) {
+        g_variant_get(parameters, "(u&s)", &daemon_id, &action);
+        if (g_str_equal(action, "default"))
+            take_signal({daemon_id, Event::tap});
+    } else if (g_str_equal(name, "NotificationClosed") && g_variant_is_of_type(parameters, G_VARIANT_TYPE("(uu)"))) {
+        g_variant_get(parameters, "(uu)", &daemon_id, &reason);
+        if (reason != CLOSED_BY_US)
+            take_signal({daemon_id, reason == DISMISSED ? Event::dismissed : Event::expired});
     }
     sync_store();
 }
@@ -297,7 +319,7 @@ guint32 bus_number(const char *method, GVariant *arguments)
 
 bool take_name()
 {
-    enum : guint32 { DO_NOT_QUEUE = 4, PRIMARY_OWNER = 1 }; // D-Bus Specification, RequestName
+    enum : guint32 { DO_NOT_QUEUE = 4, PRIMARY_OWNER = 1 }; // as D-Bus numbers them for RequestName
     return bus_number("RequestName", g_variant_new("(su)", NOTIFICATION_AGENT, static_cast<guint32>(DO_NOT_QUEUE))) ==
            PRIMARY_OWNER;
 }
@@ -348,7 +370,7 @@ int main()
     g_timeout_add_seconds(
         STORE_LOOK,
         [](gpointer) -> gboolean {
-            if (store_version() != agent.version)
+            if (store_forget_orphans() || store_version() != agent.version)
                 sync_store();
             return G_SOURCE_CONTINUE;
         },

@@ -3,7 +3,7 @@
 //
 // Notifications are kept in a store that all of the user's programs share, the SQLite database "notifications.db" in
 // platform_data_dir(), and stay after the program that posted them has left. On a session bus with a notification
-// daemon (org.freedesktop.Notifications, Desktop Notifications Specification 1.2) a small program, notification-agent,
+// daemon (org.freedesktop.Notifications, desktop notifications 1.2) a small program, notification-agent,
 // shows what the store holds and acts on taps; this library starts it when it does not run. Without a bus or a daemon
 // everything works on the store alone.
 //
@@ -23,7 +23,8 @@ enum notification_error_e {
     NOTIFICATION_ERROR_NOT_EXIST_ID = -2001,
 };
 
-// A normal notification is there until the user taps or removes it; an ongoing one until its program deletes it.
+// A normal notification is there until the user taps or removes it; an ongoing one until its program deletes it or
+// the process that posted it has ended.
 enum notification_type_e { NOTIFICATION_TYPE_NONE = -1, NOTIFICATION_TYPE_NOTI = 0, NOTIFICATION_TYPE_ONGOING = 1 };
 enum notification_property_e {
     NOTIFICATION_PROP_DISABLE_AUTO_DELETE = 0x4, // a tap does not remove it

@@ -1,5 +1,7 @@
 #include "notification/store.h"
 #include "base/base.h"
+#include <fstream>
+#include <unistd.h>
 
 namespace {
 
@@ -9,7 +11,9 @@ constexpr const char *SCHEMA =
     "CREATE TABLE IF NOT EXISTS notification ("
     " id INTEGER PRIMARY KEY AUTOINCREMENT, package TEXT NOT NULL, type INTEGER NOT NULL, flags INTEGER NOT NULL,"
     " layout INTEGER NOT NULL, places INTEGER NOT NULL, progress REAL NOT NULL, title TEXT, content TEXT, info TEXT,"
-    " info_sub TEXT, icon TEXT, indicator TEXT, launch TEXT, boot TEXT, closed INTEGER NOT NULL DEFAULT 0)";
+    " info_sub TEXT, icon TEXT, indicator TEXT, launch TEXT, boot TEXT, closed INTEGER NOT NULL DEFAULT 0);"
+    // Who posted an ongoing notification. The time of its start tells a process from a later one of the same number.
+    "CREATE TABLE IF NOT EXISTS poster (id INTEGER PRIMARY KEY, pid INTEGER NOT NULL, started INTEGER NOT NULL)";
 
 Db *store()
 {
@@ -27,6 +31,31 @@ notification_s::Text read(const Stmt &statement, int column)
     if (statement.null(column))
         return std::nullopt;
     return statement.text(column);
+}
+
+// When a process was started, in clock ticks since the machine's start (proc(5), /proc/PID/stat, field 22); 0 when it
+// is gone.
+long long started(long long pid)
+{
+    std::ifstream file("/proc/" + std::to_string(pid) + "/stat");
+    std::string stat;
+    std::getline(file, stat);
+    size_t at = stat.rfind(')'); // the name before it may hold anything
+    if (at == stat.npos || at + 2 >= stat.size() || stat[at + 2] == 'Z')
+        return 0;
+    for (int field = 2; field < 22 && at != stat.npos; field++)
+        at = stat.find(' ', at + 1);
+    return at == stat.npos ? 0 : std::strtoll(stat.c_str() + at, nullptr, 10);
+}
+
+void remember_poster(const Db &db, int id)
+{
+    const long long pid = getpid();
+    Stmt(db, "INSERT OR REPLACE INTO poster VALUES (?1, ?2, ?3)")
+        .bind(1, static_cast<long long>(id))
+        .bind(2, pid)
+        .bind(3, started(pid))
+        .done();
 }
 
 // Runs a change of one notification; true when there was one.
@@ -81,8 +110,31 @@ bool store_insert(notification_s &noti)
     const int id = static_cast<int>(insert.integer(0));
     if (!insert.done())
         return false;
+    if (noti.type == NOTIFICATION_TYPE_ONGOING)
+        remember_poster(*db, id);
     noti.id = id;
     return true;
+}
+
+bool store_forget_orphans()
+{
+    Db *db = store();
+    if (!db)
+        return false;
+    std::vector<long long> orphans;
+    Stmt posters(*db, "SELECT id, pid, started FROM poster");
+    while (posters.row())
+        if (started(posters.integer(1)) != posters.integer(2))
+            orphans.push_back(posters.integer(0));
+    posters.reset();
+    bool changed = false;
+    for (const long long id : orphans) {
+        Stmt remove(*db, "DELETE FROM notification WHERE id = ?1");
+        bool failed = false;
+        changed = change(*db, remove.bind(1, id), failed) || changed;
+        Stmt(*db, "DELETE FROM poster WHERE id = ?1").bind(1, id).done();
+    }
+    return changed;
 }
 
 std::vector<notification_s> store_list(const char *package, int id)
@@ -91,6 +143,8 @@ std::vector<notification_s> store_list(const char *package, int id)
     Db *db = store();
     if (!db)
         return list;
+    if (id == 0)
+        store_forget_orphans();
     Stmt select(*db, "SELECT id, package, type, flags, layout, places, progress, title, content, info, info_sub, icon,"
                      " indicator, launch, closed FROM notification WHERE (?1 IS NULL OR package = ?1)"
                      " AND (?2 = 0 OR id = ?2) AND (boot IS NULL OR boot = ?3) ORDER BY id");

@@ -24,8 +24,11 @@ struct notification_s {
 // The place of a text in `texts`, or -1 for a number that is no notification_text_type_e.
 int text_index(int type);
 
-bool store_insert(notification_s &noti);                                 // gives it its id
-std::vector<notification_s> store_list(const char *package, int id = 0); // null: all packages, 0: all ids
+bool store_insert(notification_s &noti); // gives it its id
+// null: all packages, 0: all ids; a list of all leaves out those that store_forget_orphans would take away
+std::vector<notification_s> store_list(const char *package, int id = 0);
+// Takes away the ongoing notifications of processes that ended without doing so; true when there were any.
+bool store_forget_orphans();
 // These three are false when there is no such notification or the store fails; `failed` tells which.
 bool store_set_content(const std::string &package, int id, const char *content, bool &failed);
 bool store_set_progress(const std::string &package, int id, double progress, bool &failed);

@@ -15,7 +15,7 @@ bool tap(const notification_s &noti)
             app_control_destroy(request);
     }
     bool failed = false;
-    if (noti.type == NOTIFICATION_TYPE_NOTI && !(noti.flags & NOTIFICATION_PROP_DISABLE_AUTO_DELETE))
+    if (sent && noti.type == NOTIFICATION_TYPE_NOTI && !(noti.flags & NOTIFICATION_PROP_DISABLE_AUTO_DELETE))
         store_delete(noti.package, noti.id, failed);
     return sent && !failed;
 }

@@ -5,6 +5,7 @@
 #include <Efreet.h>
 #include <strings.h>
 #include <unistd.h>
+#include <utility>
 
 namespace {
 bool exited = false;
@@ -153,7 +154,7 @@ bool click(Evas_Object *obj, int button)
     return click_middle(obj, button);
 }
 
-bool click(Elm_Object_Item *row)
+bool click_row(Elm_Object_Item *row)
 {
     elm_genlist_item_show(row, ELM_GENLIST_ITEM_SCROLLTO_IN);
     Evas_Object *track = nullptr;

@@ -22,8 +22,8 @@ bool exit_requested();
 // A press and a release of a mouse button at the middle of the object or row. What happens is up to what lies there on
 // top. False when it is not visible there. The loop has settled on return. A row is scrolled into view first.
 bool click(Evas_Object *obj, int button = 1);
-bool click(Elm_Object_Item *row);
-// A key by its name ("Escape", "XF86Back", "Return", "a"), down and up, to what has the focus. The loop settles.
+bool click_row(Elm_Object_Item *row);
+// A key by its name ("Escape", "XF86Back", "Return", "a"), down and up, to what has the focus there. The loop settles.
 void press(Evas_Object *window, const char *key);
 
 // The first visible object below (in the sense of smart members; a window stands for its whole canvas) that passes.

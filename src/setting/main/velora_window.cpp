@@ -20,6 +20,14 @@ static void __naviframe_more_cb(void *, Evas_Object *obj, void *)
     evas_object_smart_callback_call(obj, "elm,action,more_event", nullptr);
 }
 
+// The size the pages are drawn for, where the window manager leaves the choice to us: a phone's makes it the screen.
+static void __set_first_size(Evas_Object *win)
+{
+    constexpr double drawn_scale = 1.8;
+    const double scale = elm_config_scale_get() / drawn_scale;
+    evas_object_resize(win, static_cast<int>(480 * scale), static_cast<int>(800 * scale));
+}
+
 static Evas_Object *__create_window(AppData *ad)
 {
     Evas_Object *win = app_get_preinitialized_window("velora");
@@ -34,6 +42,7 @@ static Evas_Object *__create_window(AppData *ad)
     elm_win_title_set(win, "velora");
     evas_object_smart_callback_add(win, "delete,request", __win_delete_request_cb, ad);
     elm_win_indicator_mode_set(win, ELM_WIN_INDICATOR_SHOW);
+    __set_first_size(win);
     evas_object_show(win);
     ad->win_main = win;
     __velora_update_landscape_mode(ad);

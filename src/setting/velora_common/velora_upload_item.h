@@ -27,7 +27,8 @@ struct UploadItem {
     int index = 0;
     std::atomic<int> error = 0;
 
-    std::atomic<int> users = 1; // the list, and a worker that is on it
+    std::atomic<int> request = 0; // id of its last upload; 0 before the client has given one
+    std::atomic<int> users = 1;   // the list, and a worker that is on it
 };
 
 // Appends a new waiting item for a local path (copied) to a list of items. Main loop only.

@@ -138,10 +138,15 @@ void __retry_popup_show(ItemData *record);
 void *__thread_upload_file(void *vd);
 void *__velora_upload_fail_reboot(void *run);
 void __upload_file_cb(int state, int ignored, int progress, int error, void *item);
+// The name under which an item went up, or is to go up: another client may have taken the wanted one meanwhile. Any
+// thread.
+std::string __landed_name(const UploadViewData *vd, const UploadItem *item);
 // Lets the worker look at its transfer at once. Any thread.
 void __worker_wake();
 // Starts a worker on vd->run when none is marked; waits for the last moments of the one before.
 void __worker_start(UploadViewData *vd, void *(*routine)(void *), UploadItem *only);
+// Lets the worker of a run send its first file: the list of the queue leaves out what is up already, so it comes first.
+void __worker_begin();
 // Ends the running transfer and waits for the worker. Main loop only.
 void __worker_stop(UploadViewData *vd);
 // The selection flags of the queue: clear and count are for any thread.

@@ -46,6 +46,7 @@ static Eina_Bool __idler_load_cb(void *data)
         __selection_resize(vd->total);
     __worker_start(vd, __thread_upload_file, nullptr);
     _velora_upload_view_update();
+    __worker_begin();
     return ECORE_CALLBACK_CANCEL;
 }
 
@@ -115,7 +116,7 @@ static void __row_store(UploadItem *item, int index)
     UploadViewData *vd = s_vd;
     record->vd = vd;
     g_free(record->name);
-    record->name = g_strdup(__last_segment(item->server_path));
+    record->name = g_strdup(__landed_name(vd, item).c_str());
     record->index = index;
     g_free(record->path);
     record->path = g_strdup(item->path);

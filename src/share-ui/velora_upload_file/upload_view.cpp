@@ -14,6 +14,8 @@ std::atomic<Ecore_Pipe *> s_view_pipe = nullptr;
 
 static void __more_create_folder_cb(void *data, Evas_Object *obj, void *event_info);
 
+static void __more_create_folder_cb(void *data, Evas_Object *obj, void *event_info);
+
 const char *__last_segment(const char *path)
 {
     const char *slash = path ? std::strrchr(path, '/') : nullptr;

@@ -4,6 +4,7 @@
 #include "velora_upload_file/upload_internal.h"
 #include <chrono>
 #include <cstdio>
+#include <cstdlib>
 #include <memory>
 #include <semaphore>
 #include <thread>
@@ -11,6 +12,7 @@
 // Released when a transfer ends or is cancelled, and when the worker has to leave.
 static std::counting_semaphore s_wake(0);
 static std::atomic<bool> s_is_stopping = false;
+static std::atomic<bool> s_may_begin = false;
 static std::atomic<int> s_callbacks = 0; // transfer callbacks that are running
 static pthread_t s_worker;
 static bool s_is_joinable = false;
@@ -34,6 +36,17 @@ void __selection_set(int index, bool selected)
 {
     if (index >= 0 && index < s_selected_count)
         s_selected[static_cast<size_t>(index)] = selected;
+}
+
+std::string __landed_name(const UploadViewData *vd, const UploadItem *item)
+{
+    std::string name = __last_segment(item->server_path);
+    char *path = nullptr;
+    if (item->state == UPLOAD_STATE_DONE && item->request &&
+        cloud_content_sync_get_uploaded_path(vd->ad->sync_handle, item->request, &path) == 0 && path)
+        name = __last_segment(path);
+    std::free(path);
+    return name;
 }
 
 void __worker_wake()
@@ -107,6 +120,7 @@ static bool __transfer(UploadViewData *vd, UploadItem *item)
     const int refused =
         cloud_content_sync_upload(vd->ad->sync_handle, item->path, item->server_path, &req_id, __upload_file_cb, item);
     vd->req_id = req_id;
+    item->request = req_id;
     if (refused != 0) // no request, so no callback
         __transfer_report(vd, item, UPLOAD_STATE_FAILED, 0, refused);
     else if (item->state == UPLOAD_STATE_CANCELED) // before the main loop could know the request
@@ -132,7 +146,7 @@ struct RunResult {
 
 static void __count_result(UploadViewData *vd, UploadItem *item, RunResult *result)
 {
-    const char *name = __last_segment(item->server_path);
+    const std::string name = __landed_name(vd, item);
     if (item->error == UPLOAD_ERROR_STORAGE_FULL) {
         // Every file that is not up counts as failed, but only those that were tried are listed.
         vd->fail = vd->total - vd->canceled - vd->success;
@@ -179,6 +193,7 @@ void *__thread_upload_file(void *data)
         return nullptr;
     }
     vd->is_uploading = true;
+    s_may_begin.wait(false);
     RunResult result;
     VELORA_LOGI("uploading!");
     for (int n = 0; n < vd->total && !result.is_storage_full; n++) {
@@ -221,7 +236,7 @@ void *__velora_upload_fail_reboot(void *data)
     if (!__transfer(vd, item))
         return nullptr;
     vd->is_uploading = false;
-    const std::string name = __last_segment(item->server_path);
+    const std::string name = __landed_name(vd, item);
     const bool is_storage_full = item->error == UPLOAD_ERROR_STORAGE_FULL;
     if (item->state == UPLOAD_STATE_FAILED)
         __result_noti(name, "IDS_CLOUD_POP_UPLOAD_FAILED", "fail",
@@ -246,10 +261,17 @@ static void __run_release(UploadViewData *vd)
     vd->run.clear();
 }
 
+void __worker_begin()
+{
+    s_may_begin = true;
+    s_may_begin.notify_all();
+}
+
 void __worker_start(UploadViewData *vd, void *(*routine)(void *), UploadItem *only)
 {
     if (vd->thread)
         return;
+    s_may_begin = false;
     __worker_join(); // it has sent its "end" and has nothing left to wait for
     __run_release(vd);
     if (only) {
@@ -271,6 +293,7 @@ void __worker_start(UploadViewData *vd, void *(*routine)(void *), UploadItem *on
 void __worker_stop(UploadViewData *vd)
 {
     s_is_stopping = true; // the worker cancels its transfer itself: it alone knows the latest request
+    __worker_begin();
     s_wake.release();
     __worker_join();
     __run_release(vd);

@@ -1,6 +1,7 @@
 // A small application for the contract tests: what it does with a request is in the request's operation.
 #include "app/app.h"
 #include <Elementary.h>
+#include <clocale>
 #include <cstdio>
 #include <string>
 #include <unistd.h>
@@ -8,6 +9,7 @@
 namespace {
 app_control_h kept = nullptr;
 int requests = 0;
+bool slow_end = false;
 Evas_Object *window = nullptr;
 
 void say(const char *what)
@@ -49,6 +51,14 @@ void reset(app_control_h request, void *)
     }
     if (operation.ends_with("/echo") || operation.ends_with("share"))
         echo(request, request);
+    if (operation.ends_with("/language-and-leave")) {
+        app_control_h reply = nullptr;
+        app_control_create(&reply);
+        app_control_add_extra_data(reply, "list", getenv("LANGUAGE"));
+        app_control_add_extra_data(reply, "messages", setlocale(LC_MESSAGES, nullptr));
+        app_control_reply_to_launch_request(reply, request, APP_CONTROL_RESULT_SUCCEEDED);
+        app_control_destroy(reply);
+    }
     if (operation.ends_with("/fail"))
         app_control_reply_to_launch_request(nullptr, request, APP_CONTROL_RESULT_FAILED);
     if (operation.ends_with("/keep"))
@@ -58,7 +68,8 @@ void reset(app_control_h request, void *)
         app_control_destroy(kept);
         kept = nullptr;
     }
-    if (operation.ends_with("/reply-and-leave"))
+    slow_end = operation.ends_with("/slow-end-reply-and-leave");
+    if (operation.ends_with("reply-and-leave"))
         echo(request, request);
     if (operation.ends_with("leave"))
         elm_exit();
@@ -76,7 +87,11 @@ int main(int argc, char **argv)
         say("create");
         return true;
     };
-    callbacks.terminate = [](void *) { say("terminate"); };
+    callbacks.terminate = [](void *) {
+        say("terminate");
+        if (slow_end)
+            usleep(300'000); // saving, say, while the next request comes in
+    };
     callbacks.pause = [](void *) { say("pause"); };
     callbacks.resume = [](void *) { say("resume"); };
     callbacks.app_control = reset;

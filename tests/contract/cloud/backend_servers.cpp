@@ -19,6 +19,7 @@
 #include <thread>
 #include <unistd.h>
 
+static constexpr unsigned NOBODY = 65534;
 static constexpr char USER[] = "someone@example.org";
 static constexpr char PASSWORD[] = "a secret: with colon";
 
@@ -110,7 +111,7 @@ class Server : public Backend {
     }
 
     // Starts the program with its standard output on `out`.
-    void spawn(std::vector<std::string> args, int out)
+    void spawn(std::vector<std::string> args, int out, bool as_nobody)
     {
         std::vector<char *> argv;
         for (std::string &arg : args)
@@ -118,7 +119,9 @@ class Server : public Backend {
         argv.push_back(nullptr);
         pid = fork();
         if (pid == 0) {
-            prctl(PR_SET_PDEATHSIG, SIGKILL); // also when the test crashes
+            if (as_nobody && (setgid(NOBODY) != 0 || setuid(NOBODY) != 0))
+                _exit(126);
+            prctl(PR_SET_PDEATHSIG, SIGKILL); // also when the test crashes; a change of user would clear it
             if (out >= 0)
                 dup2(out, STDOUT_FILENO);
             execv(argv[0], argv.data());
@@ -151,7 +154,7 @@ class VeloraCloud : public Server {
         int ends[2];
         if (pipe(ends) != 0)
             abort();
-        spawn(args, ends[1]);
+        spawn(args, ends[1], false);
         close(ends[1]);
         std::string said;
         char buffer[512];
@@ -175,19 +178,18 @@ class Apache : public Server {
   public:
     Apache()
     {
-        const bool is_root = geteuid() == 0;
-        const std::string files = scratch.path + "/dav";
-        mkdir(files.c_str(), 0700);
-        // Apache gives up root's rights and has to reach its files then.
-        if (is_root && (chmod(scratch.path.c_str(), 0711) != 0 || chown(files.c_str(), NOBODY, NOBODY) != 0))
-            abort();
-        mkdir((scratch.path + "/lock").c_str(), 0777);
-        chmod((scratch.path + "/lock").c_str(), 0777);
+        for (const char *folder : {"", "/dav", "/lock"}) {
+            const std::string path = scratch.path + folder;
+            mkdir(path.c_str(), 0700);
+            // Apache refuses to serve as root.
+            if (geteuid() == 0 && chown(path.c_str(), NOBODY, NOBODY) != 0)
+                abort();
+        }
         write_users();
         for (int attempt = 0; attempt < 5 && url.empty(); attempt++) {
             const int port = free_port();
-            write_config(port, is_root);
-            spawn({"/usr/sbin/apache2", "-X", "-f", scratch.path + "/httpd.conf"}, -1);
+            write_config(port);
+            spawn({"/usr/sbin/apache2", "-X", "-f", scratch.path + "/httpd.conf"}, -1, geteuid() == 0);
             if (answers(port))
                 introduce("http://127.0.0.1:" + std::to_string(port));
             else
@@ -201,8 +203,6 @@ class Apache : public Server {
     }
 
   private:
-    static constexpr unsigned NOBODY = 65534;
-
     void write_users() const
     {
         guint8 digest[20];
@@ -215,7 +215,7 @@ class Apache : public Server {
         std::ofstream(scratch.path + "/users") << USER << ":{SHA}" << hash << "\n";
     }
 
-    void write_config(int port, bool is_root) const
+    void write_config(int port) const
     {
         std::ofstream config(scratch.path + "/httpd.conf");
         config << "ServerRoot " << scratch.path << "\nServerName 127.0.0.1\nListen 127.0.0.1:" << port << "\nPidFile "
@@ -223,8 +223,6 @@ class Apache : public Server {
         for (const char *module :
              {"mpm_event", "authn_core", "authn_file", "authz_core", "authz_user", "auth_basic", "dav", "dav_fs"})
             config << "LoadModule " << module << "_module /usr/lib/apache2/modules/mod_" << module << ".so\n";
-        if (is_root)
-            config << "User #" << NOBODY << "\nGroup #" << NOBODY << "\n";
         config << "DocumentRoot " << scratch.path << "\nDavLockDB " << scratch.path << "/lock/db\n<Directory "
                << scratch.path << "/dav>\nDav On\nAuthType Basic\nAuthName test\nAuthUserFile " << scratch.path
                << "/users\nRequire valid-user\n</Directory>\n";

@@ -19,6 +19,7 @@ class Cloud : public testing::TestWithParam<std::string> {
     {
         if (handle)
             cloud_content_sync_destroy(handle);
+        handle = nullptr;
     }
     // False when this backend cannot do that; the test has nothing to try then.
     bool open(const Wish &wish = {})
@@ -239,9 +240,13 @@ TEST_P(Cloud, a_cancelled_upload_is_silent_and_leaves_nothing)
     for (const bool from_callback : {false, true}) {
         Watch watch, queued;
         std::atomic<int> id = 0, result = -1;
+        std::atomic<bool> is_inside = false;
         watch.hook = [&](const Call &call) {
             while (id == 0)
                 std::this_thread::yield();
+            is_inside = call.progress >= 10;
+            std::this_thread::sleep_for(std::chrono::milliseconds(is_inside ? 30 : 0));
+            is_inside = false;
             if (from_callback && call.progress >= 10 && result == -1)
                 result = cloud_content_sync_cancel(handle, id);
         };
@@ -249,8 +254,11 @@ TEST_P(Cloud, a_cancelled_upload_is_silent_and_leaves_nothing)
         const int waiting = start(small, "/queued.bin", queued);
         EXPECT_EQ(cloud_content_sync_cancel(handle, waiting), 0);
         ASSERT_TRUE(watch.wait([](const auto &calls) { return !calls.empty() && calls.back().progress >= 10; }));
+        while (!from_callback && !is_inside)
+            std::this_thread::yield();
         if (!from_callback)
             result = cloud_content_sync_cancel(handle, id);
+        EXPECT_FALSE(is_inside) << "the cancel did not wait for the callback";
         const size_t before = from_callback ? 0 : watch.count();
         std::string landed;
         EXPECT_EQ(upload(handle, small, "/x.bin", &landed), 0);

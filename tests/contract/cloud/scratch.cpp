@@ -1,5 +1,8 @@
 #include "backend.h"
+#include <algorithm>
+#include <cstdint>
 #include <cstdlib>
+#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <random>
@@ -26,9 +29,11 @@ std::string Scratch::file(const std::string &name, const std::string &bytes) con
 
 std::string some_bytes(size_t size, unsigned seed)
 {
-    std::mt19937 random(seed);
+    std::mt19937_64 random(seed);
     std::string bytes(size, '\0');
-    for (char &byte : bytes)
-        byte = static_cast<char>(random());
+    for (size_t at = 0; at < size; at += sizeof(uint64_t)) {
+        const uint64_t word = random();
+        std::memcpy(bytes.data() + at, &word, std::min(sizeof word, size - at));
+    }
     return bytes;
 }

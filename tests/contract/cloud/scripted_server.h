@@ -1,11 +1,14 @@
 #pragma once
 // An HTTP server that says what a test tells it to, whole or broken.
 #include <algorithm>
-#include <atomic>
+#include <cstdlib>
 #include <functional>
-#include <gio/gio.h>
 #include <mutex>
+#include <netinet/in.h>
 #include <string>
+#include <sys/socket.h>
+#include <thread>
+#include <unistd.h>
 #include <vector>
 
 struct Request {
@@ -16,37 +19,33 @@ struct Request {
 class ScriptedServer {
   public:
     // Gives the whole answer, header and body; "" closes the connection without one. "\x01" at the end of an answer
-    // closes the connection after it.
+    // closes the connection after it. Called under the lock below.
     using Script = std::function<std::string(const Request &)>;
 
     explicit ScriptedServer(Script answers) : script(std::move(answers))
     {
-        service = g_threaded_socket_service_new(8);
-        GSocketAddress *address = g_inet_socket_address_new_from_string("127.0.0.1", 0);
-        GSocketAddress *bound = nullptr;
-        g_socket_listener_add_address(G_SOCKET_LISTENER(service), address, G_SOCKET_TYPE_STREAM, G_SOCKET_PROTOCOL_TCP,
-                                      nullptr, &bound, nullptr);
-        port = g_inet_socket_address_get_port(G_INET_SOCKET_ADDRESS(bound));
-        g_object_unref(address);
-        g_object_unref(bound);
-        g_signal_connect(service, "run", G_CALLBACK(run), this);
-        g_socket_service_start(service);
-        loop = g_main_loop_new(nullptr, FALSE);
-        thread = g_thread_new(
-            "server", [](void *data) -> void * { return g_main_loop_run(static_cast<GMainLoop *>(data)), nullptr; },
-            loop);
+        listener = socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
+        sockaddr_in address = {};
+        socklen_t size = sizeof address;
+        address.sin_family = AF_INET;
+        address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+        if (bind(listener, reinterpret_cast<sockaddr *>(&address), size) != 0 || listen(listener, 16) != 0 ||
+            getsockname(listener, reinterpret_cast<sockaddr *>(&address), &size) != 0)
+            std::abort();
+        port = ntohs(address.sin_port);
+        acceptor = std::thread([this] {
+            for (int fd = 0; (fd = accept4(listener, nullptr, nullptr, SOCK_CLOEXEC)) >= 0;)
+                workers.emplace_back([this, fd, number = static_cast<int>(workers.size()) + 1] { run(fd, number); });
+        });
     }
     // To be called when no client holds a connection any more.
     ~ScriptedServer()
     {
-        g_socket_service_stop(service);
-        g_socket_listener_close(G_SOCKET_LISTENER(service));
-        while (open_connections > 0)
-            g_usleep(1000);
-        g_main_loop_quit(loop);
-        g_thread_join(thread);
-        g_main_loop_unref(loop);
-        g_object_unref(service);
+        shutdown(listener, SHUT_RDWR);
+        acceptor.join();
+        close(listener);
+        for (std::thread &worker : workers)
+            worker.join();
     }
     ScriptedServer(const ScriptedServer &) = delete;
     ScriptedServer &operator=(const ScriptedServer &) = delete;
@@ -55,83 +54,93 @@ class ScriptedServer {
     {
         return "http://127.0.0.1:" + std::to_string(port);
     }
-    // "PUT /x", "PROPFIND /x", ...
-    std::vector<std::string> log()
+    std::vector<Request> requests()
     {
         std::scoped_lock lock(mutex);
-        return lines;
+        return seen;
     }
-    std::vector<Request> requests;
+    // What the script reads is changed under this.
+    std::mutex mutex;
 
   private:
-    static std::string field(const std::string &head, const char *name)
+    static std::string field(const std::string &head, const std::string &name)
     {
-        const size_t at = head.find(std::string("\r\n") + name + ": ");
+        const size_t at = head.find("\r\n" + name + ": ");
         if (at == head.npos)
             return "";
-        const size_t begin = at + std::string(name).size() + 4;
+        const size_t begin = at + name.size() + 4;
         return head.substr(begin, head.find("\r\n", begin) - begin);
     }
 
-    static gboolean run(GThreadedSocketService *, GSocketConnection *connection, GObject *, gpointer data)
+    static bool send_all(int fd, const std::string &bytes)
     {
-        auto *self = static_cast<ScriptedServer *>(data);
-        self->open_connections++;
-        const int number = ++self->connections;
-        GInputStream *in = g_io_stream_get_input_stream(G_IO_STREAM(connection));
-        GOutputStream *out = g_io_stream_get_output_stream(G_IO_STREAM(connection));
-        std::string bytes;
-        char buffer[65536];
-        const auto more = [&] {
-            const gssize got = g_input_stream_read(in, buffer, sizeof buffer, nullptr, nullptr);
-            if (got > 0)
-                bytes.append(buffer, static_cast<size_t>(got));
-            return got > 0;
-        };
-        for (bool goes_on = true; goes_on;) {
-            size_t end = bytes.npos;
-            while (goes_on && (end = bytes.find("\r\n\r\n")) == bytes.npos)
-                goes_on = more();
-            if (!goes_on)
-                break;
-            const std::string head = bytes.substr(0, end + 2);
-            const auto length =
-                static_cast<size_t>(g_ascii_strtoull(field(head, "Content-Length").c_str(), nullptr, 10));
-            while (goes_on && bytes.size() < end + 4 + length)
-                goes_on = more();
-            Request request;
-            request.method = head.substr(0, head.find(' '));
-            request.path = head.substr(request.method.size() + 1);
-            request.path.resize(request.path.find(' '));
-            request.body = bytes.substr(end + 4, length);
-            request.authorization = field(head, "Authorization");
-            request.connection = number;
-            bytes.erase(0, std::min(bytes.size(), end + 4 + length));
-            {
-                std::scoped_lock lock(self->mutex);
-                self->lines.push_back(request.method + " " + request.path);
-                self->requests.push_back(request);
-            }
-            std::string answer = self->script(request);
-            goes_on = goes_on && !answer.empty() && answer.back() != '\x01';
-            if (!answer.empty() && answer.back() == '\x01')
-                answer.pop_back();
-            goes_on =
-                g_output_stream_write_all(out, answer.data(), answer.size(), nullptr, nullptr, nullptr) && goes_on;
+        for (size_t sent = 0; sent < bytes.size();) {
+            const ssize_t count = send(fd, bytes.data() + sent, bytes.size() - sent, MSG_NOSIGNAL);
+            if (count < 0)
+                return false;
+            sent += static_cast<size_t>(count);
         }
-        g_io_stream_close(G_IO_STREAM(connection), nullptr, nullptr);
-        self->open_connections--;
-        return TRUE;
+        return true;
+    }
+
+    // Appends what comes until there are `size` bytes.
+    static bool receive(int fd, std::string &bytes, size_t size)
+    {
+        char buffer[65536];
+        while (bytes.size() < size) {
+            const ssize_t got = read(fd, buffer, sizeof buffer);
+            if (got <= 0)
+                return false;
+            bytes.append(buffer, static_cast<size_t>(got));
+        }
+        return true;
+    }
+
+    bool read_request(int fd, std::string &bytes, Request &request)
+    {
+        size_t end = 0;
+        while ((end = bytes.find("\r\n\r\n")) == bytes.npos)
+            if (!receive(fd, bytes, bytes.size() + 1))
+                return false;
+        const std::string head = bytes.substr(0, end + 2);
+        const size_t length = std::strtoull(field(head, "Content-Length").c_str(), nullptr, 10);
+        if (!receive(fd, bytes, end + 4 + length))
+            return false;
+        request.method = head.substr(0, head.find(' '));
+        request.path = head.substr(request.method.size() + 1);
+        request.path.resize(request.path.find(' '));
+        request.body = bytes.substr(end + 4, length);
+        request.authorization = field(head, "Authorization");
+        bytes.erase(0, end + 4 + length);
+        return true;
+    }
+
+    void run(int fd, int number)
+    {
+        std::string bytes;
+        Request request;
+        request.connection = number;
+        for (bool goes_on = true; goes_on && read_request(fd, bytes, request);) {
+            std::string answer;
+            {
+                std::scoped_lock lock(mutex);
+                seen.push_back(request);
+                answer = script(request);
+            }
+            goes_on = !answer.empty() && answer.back() != '\x01';
+            if (!goes_on && !answer.empty())
+                answer.pop_back();
+            goes_on = send_all(fd, answer) && goes_on;
+        }
+        close(fd);
     }
 
     Script script;
-    GSocketService *service;
-    GMainLoop *loop;
-    GThread *thread;
-    guint16 port;
-    std::atomic<int> connections = 0, open_connections = 0;
-    std::mutex mutex;
-    std::vector<std::string> lines;
+    int listener = -1;
+    int port = 0;
+    std::thread acceptor;
+    std::vector<std::thread> workers; // the acceptor's until it has ended
+    std::vector<Request> seen;
 };
 
 inline std::string answer(const std::string &status, const std::string &body = "", const std::string &fields = "")

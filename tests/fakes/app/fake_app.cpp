@@ -2,6 +2,7 @@
 #include "app/request.h"
 #include <Elementary.h>
 #include <map>
+#include <utility>
 
 int real_app_control_create(app_control_h *);
 int real_app_control_clone(app_control_h *, app_control_h);

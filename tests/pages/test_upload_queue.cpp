@@ -1,0 +1,323 @@
+// The queue: its order, counters, notifications, failures, cancels, retries, and ends that come too early.
+#include "upload_page.h"
+
+namespace {
+
+constexpr int waiting = UPLOAD_STATE_WAITING, done = UPLOAD_STATE_DONE, failed = UPLOAD_STATE_FAILED,
+              canceled = UPLOAD_STATE_CANCELED;
+
+class Queue : public UploadPage {
+  protected:
+    // Shares the files into the root and presses Done; the cloud is held.
+    void start(const std::vector<std::string> &names)
+    {
+        share(names);
+        wait_for([] { return !s_vd.load()->ad->popup; });
+        fake_cloud_hold(true);
+        ASSERT_TRUE(press_done());
+        ASSERT_TRUE(wait_for([] { return !fake_cloud_upload_log().empty(); }));
+    }
+    // Lets callbacks through until so many files have ended.
+    static bool finish_files(int count)
+    {
+        return wait_for([count] {
+            if (s_vd.load()->success + s_vd.load()->fail >= count)
+                return true;
+            fake_cloud_let_through(1);
+            return false;
+        });
+    }
+    static std::string ongoing()
+    {
+        for (const std::string &text : notifications())
+            if (text.starts_with("Velora: "))
+                return text.substr(8);
+        return "(none)";
+    }
+    static bool start_of(const std::string &name)
+    {
+        return wait_for([&name] {
+            const Texts log = fake_cloud_upload_log();
+            return !log.empty() && log.back().ends_with("/" + name);
+        });
+    }
+};
+
+} // namespace
+
+TEST_F(Queue, RunsInOrderAndCounts)
+{
+    run([&] {
+        share({"three.txt", "one.jpg", "two.txt"});
+        fake_cloud_hold(true);
+        ASSERT_TRUE(press_done());
+        ASSERT_TRUE(wait_for([] { return !fake_cloud_upload_log().empty(); }));
+        EXPECT_EQ(rows(), (Texts{"queued three.txt", "queued one(1).jpg", "queued two.txt"}));
+        EXPECT_EQ(notifications(), Texts{"Velora: 0 / 3"});
+        EXPECT_TRUE(shows("one(1).jpg")) << driver::read_texts(window());
+        for (int ended = 1; ended <= 2; ended++) {
+            ASSERT_TRUE(finish_files(ended));
+            EXPECT_TRUE(wait_for([&] { return ongoing() == std::to_string(ended) + " / 3"; })) << ongoing();
+        }
+        EXPECT_EQ(rows(), (Texts{"uploaded three.txt", "uploaded one(1).jpg", "queued two.txt"}));
+        fake_cloud_hold(false);
+        ASSERT_TRUE(wait_for(is_over));
+        EXPECT_EQ(rows(), (Texts{"uploaded three.txt", "uploaded one(1).jpg", "uploaded two.txt"}));
+        EXPECT_EQ(notifications(), Texts{"3 files: Upload complete. success: three.txt one.jpg two.txt"});
+        press_back();
+        EXPECT_TRUE(wait_for_exit());
+    });
+    EXPECT_EQ(uploaded("/three.txt") + uploaded("/one(1).jpg") + uploaded("/two.txt"), "three.txtone.jpgtwo.txt");
+    EXPECT_EQ(uploaded("/one.jpg"), "was there before");
+    EXPECT_EQ(notifications().size(), 1u) << "the result outlives the application";
+    ASSERT_EQ(fake_app::replies().size(), 1u);
+    EXPECT_EQ(fake_app::replies()[0].result, APP_CONTROL_RESULT_SUCCEEDED);
+}
+
+TEST_F(Queue, ReportsOnlyFailuresWhenThereAreAny)
+{
+    const struct {
+        Texts files;
+        std::vector<std::pair<int, int>> failures; // nth upload, error
+        Texts rows;
+        std::string result;
+    } cases[] = {
+        {{"a.txt"}, {}, {"uploaded a.txt"}, "a.txt: Upload complete. success: a.txt"},
+        {{"a.txt"}, {{1, CLOUD_CONTENT_SYNC_ERROR_SERVER}}, {"failed a.txt"}, "a.txt: Upload failed. fail: a.txt"},
+        {{"a.txt", "b.txt", "c.txt"},
+         {{2, CLOUD_CONTENT_SYNC_ERROR_FORBIDDEN}},
+         {"uploaded a.txt", "failed b.txt", "uploaded c.txt"},
+         "b.txt: Upload failed. fail: b.txt"},
+        {{"a.txt", "b.txt", "c.txt"},
+         {{1, CLOUD_CONTENT_SYNC_ERROR_CORRUPTED}, {3, CLOUD_CONTENT_SYNC_ERROR_SERVER}},
+         {"failed a.txt", "uploaded b.txt", "failed c.txt"},
+         "2 files: Upload failed. fail: a.txt c.txt"},
+    };
+    for (const auto &c : cases) {
+        fake_cloud_reset();
+        fake_cloud_refresh_now();
+        for (const auto &[nth, error] : c.failures)
+            fake_cloud_fail_upload(nth, error);
+        run([&] {
+            start(c.files);
+            fake_cloud_hold(false);
+            ASSERT_TRUE(wait_for(is_over));
+            EXPECT_EQ(rows(), c.rows);
+            EXPECT_EQ(notifications(), Texts{c.result});
+        });
+    }
+}
+
+TEST_F(Queue, AFullStorageEndsEverything)
+{
+    fake_cloud_fail_upload(2, CLOUD_CONTENT_SYNC_ERROR_STORAGE_FULL);
+    run([&] {
+        start({"a.txt", "b.txt", "c.txt", "d.txt", "e.txt"});
+        fake_cloud_hold(false);
+        EXPECT_TRUE(wait_for_exit());
+    });
+    EXPECT_EQ(fake_cloud_upload_log().size(), 2u);
+    EXPECT_EQ(notifications(), Texts{"4 files: Upload failed. fail:"});
+    EXPECT_TRUE(log.has("Unable to upload, not enough memory"));
+    ASSERT_EQ(fake_app::replies().size(), 1u);
+    EXPECT_EQ(fake_app::replies()[0].result, APP_CONTROL_RESULT_SUCCEEDED);
+}
+
+TEST_F(Queue, CancelTakesFilesOut)
+{
+    const struct {
+        const char *name;
+        int finished_first;       // files that end before
+        std::vector<int> cancels; // rows that have a cancel button, by their order at the time
+        std::string content;      // of the ongoing notification after the cancels
+        std::vector<int> end;     // states
+        std::string result;
+    } cases[] = {
+        {"a waiting file", 0, {1}, "0 / 2", {done, canceled, done}, "2 files: Upload complete. success: a.txt c.txt"},
+        {"the running file", 0, {0}, "0 / 2", {canceled, done, done}, "2 files: Upload complete. success: b.txt c.txt"},
+        {"the running file in the middle",
+         1,
+         {0},
+         "1 / 2",
+         {done, canceled, done},
+         "2 files: Upload complete. success: a.txt c.txt"},
+        {"all, from the end", 0, {2, 1, 0}, "(none)", {canceled, canceled, canceled}, ""},
+        {"all, from the start", 0, {0, 0, 0}, "(none)", {canceled, canceled, canceled}, ""},
+    };
+    for (const auto &c : cases) {
+        SCOPED_TRACE(c.name);
+        fake_cloud_reset();
+        fake_cloud_refresh_now();
+        notification_delete_all_by_type(VELORA_SHARE_PACKAGE, NOTIFICATION_TYPE_NONE);
+        run([&] {
+            start({"a.txt", "b.txt", "c.txt"});
+            ASSERT_TRUE(finish_files(c.finished_first));
+            ASSERT_TRUE(start_of(c.finished_first ? "b.txt" : "a.txt"));
+            fake_cloud_let_through(1); // the running one says that it runs
+            ASSERT_TRUE(wait_for([&] { return states()[static_cast<size_t>(c.finished_first)] != waiting; }));
+            for (const int nth : c.cancels) {
+                const auto before = rows().size();
+                ASSERT_TRUE(press_row_cancel(nth)) << nth;
+                EXPECT_EQ(rows().size(), before - 1);
+            }
+            EXPECT_TRUE(wait_for([&] { return ongoing() == c.content; })) << ongoing();
+            const double start = ecore_time_get();
+            fake_cloud_hold(false);
+            ASSERT_TRUE(wait_for([] { return is_over() && !s_vd.load()->is_uploading; }));
+            EXPECT_LT(ecore_time_get() - start, 1.0) << "a cancel wakes the worker";
+            EXPECT_EQ(states(), c.end);
+            EXPECT_EQ(notifications(), c.result.empty() ? Texts{} : Texts{c.result});
+        });
+    }
+}
+
+TEST_F(Queue, ACancelThatComesTooLateIsCountedAlone)
+{
+    run([&] {
+        start({"a.txt", "b.txt"});
+        ASSERT_TRUE(finish_files(1));
+        __uploading_file_mutil_cancel(__upload_item_find(s_vd, 0), s_vd);
+        EXPECT_TRUE(log.has("Cann't cancel it"));
+        EXPECT_EQ(ongoing(), "1 / 1");
+        fake_cloud_hold(false);
+        ASSERT_TRUE(wait_for(is_over));
+        EXPECT_EQ(states(), (std::vector<int>{done, done}));
+    });
+}
+
+TEST_F(Queue, AFailedFileCanBeSentAgain)
+{
+    for (const int nth : {1, 2})
+        fake_cloud_fail_upload(nth, CLOUD_CONTENT_SYNC_ERROR_SERVER);
+    run([&] {
+        start({"a.txt", "b.txt"});
+        ASSERT_TRUE(finish_files(1));
+        ASSERT_TRUE(wait_for([] { return rows()[0] == "failed a.txt"; }));
+        ASSERT_TRUE(driver::click_row(row(0)));
+        EXPECT_EQ(s_vd.load()->ad->popup, nullptr) << "not while the queue runs";
+        fake_cloud_hold(false);
+        ASSERT_TRUE(wait_for(is_over));
+
+        ASSERT_TRUE(driver::click_row(row(0)));
+        ASSERT_TRUE(press_popup_button(1)); // Cancel
+        EXPECT_EQ(s_vd.load()->ad->popup, nullptr);
+        EXPECT_EQ(rows()[0], "failed a.txt");
+
+        fake_cloud_hold(true);
+        ASSERT_TRUE(driver::click_row(row(0)));
+        ASSERT_TRUE(press_popup_button(2)); // Upload
+        EXPECT_EQ(rows()[0], "queued a.txt");
+        EXPECT_TRUE(wait_for([] { return ongoing() == "0 / 1"; })) << ongoing();
+        ASSERT_TRUE(driver::click_row(row(1)));
+        EXPECT_EQ(s_vd.load()->ad->popup, nullptr) << "one at a time";
+        fake_cloud_hold(false);
+        ASSERT_TRUE(wait_for([] { return is_over() && rows()[0] == "uploaded a.txt"; }));
+        EXPECT_EQ(notifications(), Texts{"a.txt: Upload complete. success: a.txt"});
+
+        fake_cloud_fail_upload(1, CLOUD_CONTENT_SYNC_ERROR_STORAGE_FULL);
+        ASSERT_TRUE(driver::click_row(row(1)));
+        ASSERT_TRUE(press_popup_button(2));
+        EXPECT_TRUE(wait_for_exit());
+    });
+    EXPECT_EQ(notifications(), Texts{"b.txt: Upload failed. fail:"});
+    EXPECT_EQ(uploaded("/a.txt"), "a.txt");
+}
+
+TEST_F(Queue, AFileOfAnEarlierResultCanBeSentAgain)
+{
+    run([&] {
+        show_result({"a.txt", "b.txt"}, "fail");
+        ASSERT_TRUE(driver::click_row(row(1)));
+        ASSERT_TRUE(press_popup_button(2));
+        ASSERT_TRUE(wait_for([] { return is_over() && rows() == Texts{"failed a.txt", "uploaded b.txt"}; }));
+    });
+    EXPECT_EQ(uploaded("/b.txt"), "b.txt");
+}
+
+TEST_F(Queue, AResultOpenedDuringARunLeavesTheRunAlone)
+{
+    run([&] {
+        start({"a.txt", "b.txt", "c.txt"});
+        show_result({"old.txt"}, "fail");
+        EXPECT_EQ(rows(), Texts{"failed old.txt"});
+        EXPECT_EQ(s_vd.load()->ad->exit_on_pause, 1);
+        fake_cloud_hold(false);
+        ASSERT_TRUE(wait_for(is_over));
+        EXPECT_EQ(states(), (std::vector<int>{done, done, done}));
+        EXPECT_EQ(rows(), Texts{"failed old.txt"});
+        show_result({"new.txt", "more.txt"}, "success");
+        EXPECT_EQ(rows(), (Texts{"uploaded new.txt", "uploaded more.txt"}));
+        fake_app::pause();
+        EXPECT_TRUE(driver::exit_requested());
+    });
+    EXPECT_EQ(uploaded("/c.txt"), "c.txt");
+}
+
+TEST_F(Queue, AnotherShareDuringARunWaits)
+{
+    run([&] {
+        start({"a.txt", "b.txt"});
+        share({"late.txt"});
+        fake_cloud_hold(false);
+        ASSERT_TRUE(wait_for(is_over));
+        EXPECT_EQ(rows(), (Texts{"uploaded a.txt", "uploaded b.txt"}));
+        EXPECT_EQ(g_list_length(s_vd.load()->ad->upload_list), 3u);
+    });
+    EXPECT_EQ(fake_app::replies().size(), 2u) << "each share has its answer";
+}
+
+TEST_F(Queue, EndsInTheMiddleOfATransfer)
+{
+    AppData *ad = nullptr;
+    const struct {
+        const char *name;
+        std::function<void()> leave;
+    } ways[] = {
+        {"exit", [&ad] { _velora_app_exit(ad); }},
+        {"view first",
+         [&ad] {
+             __destroy_view(s_vd);
+             _velora_app_exit(ad);
+         }},
+        {"back only lowers the window",
+         [] {
+             press_back();
+             EXPECT_TRUE(s_vd.load());
+         }},
+    };
+    for (const auto &way : ways) {
+        for (const bool is_moving : {false, true}) {
+            SCOPED_TRACE(testing::Message() << way.name << " " << is_moving);
+            fake_cloud_reset();
+            fake_cloud_refresh_now();
+            run([&] {
+                start({"a.txt", "b.txt", "c.txt"});
+                ad = s_vd.load()->ad;
+                ASSERT_TRUE(finish_files(1));
+                if (is_moving) { // callbacks come while the view goes
+                    fake_cloud_set_delay(1);
+                    fake_cloud_hold(false);
+                }
+                way.leave();
+            });
+            EXPECT_TRUE(notifications().empty() || notifications()[0].find("Velora: ") == std::string::npos)
+                << "no progress is left behind";
+        }
+    }
+}
+
+TEST_F(Queue, SurvivesManySmallFiles)
+{
+    Texts names;
+    for (int i = 0; i < 60; i++)
+        names.push_back("file" + std::to_string(i) + ".txt");
+    run([&] {
+        share(names);
+        const double start = ecore_time_get();
+        ASSERT_TRUE(press_done());
+        ASSERT_TRUE(wait_for(is_over));
+        EXPECT_LT(ecore_time_get() - start, 15.0) << "no file waits for the worker's next look";
+        EXPECT_EQ(s_vd.load()->success, 60);
+    });
+    EXPECT_EQ(fake_cloud_list("/").size(), 65u);
+}

@@ -1,0 +1,279 @@
+// Choosing the destination, waiting for the folder tree, results, and the languages.
+#include "app/language.h"
+#include "upload_page.h"
+
+#include <set>
+
+namespace {
+
+class Browser : public UploadPage {
+  protected:
+    static Texts path_bar()
+    {
+        Texts all;
+        for (Elm_Object_Item *item = elm_toolbar_first_item_get(s_vd.load()->toolbar); item;
+             item = elm_toolbar_item_next_get(item))
+            all.push_back(elm_object_item_text_get(item));
+        return all;
+    }
+    static bool tap_path(const char *label)
+    {
+        return driver::click(driver::find_text(s_vd.load()->toolbar, label));
+    }
+    static bool enter(const std::string &name)
+    {
+        const Texts all = rows();
+        const auto found = std::ranges::find(all, "folder " + name);
+        return found != all.end() && driver::click_row(row(static_cast<int>(found - all.begin())));
+    }
+    static std::string folder()
+    {
+        return s_vd.load()->folder ? s_vd.load()->ad->folder_path : "(none)";
+    }
+    static bool jump_over()
+    {
+        return wait_for([] { return !s_vd.load()->pathinfo_timer; });
+    }
+};
+
+} // namespace
+
+TEST_F(Browser, WalksDownAndBackUp)
+{
+    run([&] {
+        share({"new.txt"});
+        EXPECT_EQ(rows(), (Texts{"folder Alpha", "folder R&D <b>", "folder Velora", "file one.jpg"}));
+        EXPECT_TRUE(shows("R&D <b>")) << driver::read_texts(window());
+        ASSERT_TRUE(enter("R&D <b>"));
+        EXPECT_EQ(folder(), "/R&D <b>");
+        EXPECT_TRUE(driver::find_text(s_vd.load()->toolbar, "R&D <b>")) << "on the path bar, as it stands";
+        EXPECT_TRUE(rows().empty());
+        press_back();
+        ASSERT_TRUE(enter("Alpha"));
+        ASSERT_TRUE(enter("Beta"));
+        EXPECT_EQ(path_bar(), (Texts{"Velora", "Alpha", "Beta"}));
+        EXPECT_EQ(rows(), (Texts{"folder Gamma"}));
+        press_back();
+        EXPECT_EQ(folder(), "/Alpha");
+        EXPECT_EQ(path_bar(), (Texts{"Velora", "Alpha"}));
+        press_back();
+        EXPECT_EQ(folder(), "/");
+        EXPECT_EQ(path_bar(), (Texts{"Velora"}));
+        press_back(); // at the root: the way out
+        EXPECT_TRUE(wait_for_exit());
+    });
+    ASSERT_EQ(fake_app::replies().size(), 1u);
+    EXPECT_EQ(fake_app::replies()[0].result, APP_CONTROL_RESULT_SUCCEEDED);
+}
+
+TEST_F(Browser, JumpsByThePathBar)
+{
+    run([&] {
+        share({"new.txt"});
+        for (const char *name : {"Alpha", "Beta", "Gamma"})
+            ASSERT_TRUE(enter(name));
+        ASSERT_TRUE(tap_path("Gamma")); // where we are
+        EXPECT_EQ(s_vd.load()->pathinfo_timer, nullptr);
+        ASSERT_TRUE(tap_path("Beta"));
+        EXPECT_EQ(path_bar(), (Texts{"Velora", "Alpha", "Beta"}));
+        ASSERT_TRUE(s_vd.load()->pathinfo_timer);
+        ASSERT_TRUE(tap_path("Velora")); // too soon
+        EXPECT_EQ(path_bar(), (Texts{"Velora", "Alpha", "Beta"}));
+        ASSERT_TRUE(jump_over());
+        EXPECT_EQ(folder(), "/Alpha/Beta");
+        EXPECT_EQ(rows(), (Texts{"folder Gamma"}));
+
+        ASSERT_TRUE(enter("Gamma"));
+        ASSERT_TRUE(tap_path("Velora"));
+        EXPECT_EQ(path_bar(), (Texts{"Velora"}));
+        ASSERT_TRUE(jump_over());
+        EXPECT_EQ(folder(), "/");
+        EXPECT_EQ(rows().size(), 4u);
+
+        ASSERT_TRUE(enter("Alpha"));
+        ASSERT_TRUE(enter("Beta"));
+        ASSERT_TRUE(tap_path("Alpha"));
+        _velora_app_exit(s_vd.load()->ad); // with the jump still to come
+    });
+}
+
+TEST_F(Browser, AFolderThatIsGoneLeavesNoneOpen)
+{
+    run([&] {
+        share({"new.txt"});
+        for (const char *name : {"Alpha", "Beta"})
+            ASSERT_TRUE(enter(name));
+        fake_cloud_remove("/Alpha");
+        fake_cloud_refresh_now();
+        ASSERT_TRUE(tap_path("Alpha"));
+        ASSERT_TRUE(jump_over());
+        EXPECT_EQ(folder(), "(none)");
+        press_back(); // does not crash; the root is one tap away
+        ASSERT_TRUE(s_vd.load());
+        EXPECT_TRUE(is_over() || !s_vd.load()->thread);
+    });
+}
+
+TEST_F(Browser, CancelLeavesAndTellsTheSender)
+{
+    run([&] {
+        share({"new.txt"});
+        Evas_Object *done = s_vd.load()->done_btn;
+        evas_object_ref(done);
+        ASSERT_TRUE(driver::click(s_vd.load()->cancel_btn));
+        EXPECT_TRUE(wait_for_exit());
+        evas_object_unref(done);
+    });
+    EXPECT_EQ(fake_app::replies().size(), 1u);
+    EXPECT_TRUE(fake_cloud_upload_log().empty());
+}
+
+TEST_F(Browser, WaitsForTheFirstRefresh)
+{
+    fake_cloud_reset();
+    fake_cloud_add_folder("/Fresh");
+    fake_cloud_hold(true);
+    run([&] {
+        share({"new.txt"});
+        EXPECT_TRUE(s_vd.load()->ad->popup);
+        EXPECT_TRUE(rows().empty());
+        fake_cloud_hold(false);
+        EXPECT_TRUE(wait_for([] { return !s_vd.load()->ad->popup; }));
+        EXPECT_EQ(rows(), (Texts{"folder Fresh"}));
+    });
+}
+
+TEST_F(Browser, BackOnTheWaitGivesUpTheShareAndStays)
+{
+    fake_cloud_reset();
+    fake_cloud_hold(true);
+    run([&] {
+        share({"new.txt"});
+        press_back();
+        ASSERT_TRUE(s_vd.load());
+        EXPECT_EQ(s_vd.load()->ad->popup, nullptr);
+        EXPECT_EQ(s_vd.load()->ad->upload_list, nullptr);
+        EXPECT_FALSE(driver::exit_requested());
+        fake_cloud_hold(false); // the refresh still ends, and there is nothing to upload
+        ASSERT_TRUE(wait_for([] { return s_vd.load()->ad->popup != nullptr; }));
+        driver::settle();
+        EXPECT_TRUE(press_popup_button(1));
+        EXPECT_TRUE(wait_for_exit());
+    });
+}
+
+TEST_F(Browser, SaysWhatIsWrongAndTriesAgain)
+{
+    fake_cloud_reset();
+    fake_cloud_add_folder("/Fresh");
+    fake_cloud_fail_refresh(CLOUD_CONTENT_SYNC_ERROR_NETWORK);
+    run([&] {
+        share({"new.txt"});
+        ASSERT_TRUE(wait_for([] { return s_vd.load()->state && !s_vd.load()->ad->popup; }));
+        EXPECT_TRUE(elm_object_disabled_get(s_vd.load()->done_btn)) << "no folder to upload into";
+        driver::settle();
+        ASSERT_TRUE(driver::click(driver::find_widget(s_vd.load()->state, "elm_button")))
+            << driver::read_texts(window());
+        EXPECT_TRUE(wait_for([] { return rows() == Texts{"folder Fresh"}; }));
+        EXPECT_FALSE(elm_object_disabled_get(s_vd.load()->done_btn));
+    });
+    fake_cloud_fail_create(CLOUD_CONTENT_SYNC_ERROR_NO_SERVICE);
+    run([&] {
+        share({"new.txt"});
+        ASSERT_TRUE(s_vd.load()->ad->popup);
+        EXPECT_TRUE(press_popup_button(1));
+        EXPECT_TRUE(wait_for_exit());
+    });
+}
+
+TEST_F(Browser, ShowsAResultByItsKind)
+{
+    const struct {
+        const char *display_type;
+        Texts rows;
+    } cases[] = {
+        {"success", {"uploaded a<b>&amp;.jpg", "uploaded b.txt"}},
+        {"fail", {"failed a<b>&amp;.jpg", "failed b.txt"}},
+        {"other", {}},
+    };
+    for (const auto &c : cases) {
+        SCOPED_TRACE(c.display_type);
+        run([&] {
+            show_result({"a<b>&amp;.jpg", "b.txt"}, c.display_type);
+            EXPECT_EQ(rows(), c.rows);
+            EXPECT_EQ(shows("a<b>&amp;.jpg"), !c.rows.empty()) << driver::read_texts(window());
+            press_back();
+            EXPECT_TRUE(wait_for_exit());
+        });
+    }
+    for (const fake_app::Reply &reply : fake_app::replies())
+        EXPECT_EQ(reply.result, APP_CONTROL_RESULT_CANCELED) << "a tap on a notification waits for no reply";
+}
+
+TEST_F(Browser, ShowsNoRawTextIdInAnyLanguage)
+{
+    std::set<std::string> all;
+    for (const char *language : {"en", "de", "fr", "es", "ko", "zh_CN", ""}) {
+        SCOPED_TRACE(*language ? language : "LANG unset");
+        for (const char *name : {"LANG", "LC_ALL", "LC_MESSAGES", "LANGUAGE"})
+            unsetenv(name);
+        if (*language)
+            vconf_set_str("db/menu_widget/language", (std::string(language) + ".UTF-8").c_str());
+        else
+            vconf_unset("db/menu_widget/language");
+        language_apply();
+        std::string seen;
+        const auto look = [&seen] {
+            driver::settle();
+            const std::string now = driver::read_texts(window());
+            EXPECT_EQ(now.find("IDS_"), std::string::npos) << now;
+            seen += now;
+        };
+        fake_cloud_reset();
+        fake_cloud_set_reachable(false);
+        run([&] {
+            share({"a.txt"});
+            wait_for([] { return s_vd.load()->state && !s_vd.load()->ad->popup; });
+            look(); // cannot be reached
+        });
+        fake_cloud_reset();
+        fake_cloud_set_signed_in(false);
+        run([&] {
+            share({"a.txt"});
+            wait_for([] { return s_vd.load()->state && !s_vd.load()->ad->popup; });
+            look(); // signed out
+        });
+        fake_cloud_reset();
+        fake_cloud_refresh_now();
+        fake_cloud_fail_upload(1, CLOUD_CONTENT_SYNC_ERROR_FORBIDDEN);
+        run([&] {
+            share({"a.txt", "b.txt"});
+            look(); // an empty folder
+            fake_cloud_hold(true);
+            press_done();
+            wait_for([] { return s_vd.load()->is_uploading.load(); });
+            look(); // the queue
+            driver::press(window(), "Menu");
+            look();
+            driver::press(window(), "Menu");
+            fake_cloud_hold(false);
+            wait_for(is_over);
+            look(); // a failure
+            driver::click_row(row(0));
+            EXPECT_TRUE(s_vd.load()->ad->popup);
+            look(); // try again?
+        });
+        for (const std::string &text : notifications())
+            EXPECT_EQ(text.find("IDS_"), std::string::npos) << text;
+        run([&] {
+            share({"a.txt"});
+            vconf_set_str("memory/connection/type", "none:flight_mode");
+            share({"b.txt"});
+            EXPECT_TRUE(s_vd.load()->ad->popup);
+            look(); // no network
+        });
+        vconf_set_str("memory/connection/type", "wifi");
+        all.insert(seen);
+    }
+    EXPECT_EQ(all.size(), 6u) << "each language has words of its own";
+}

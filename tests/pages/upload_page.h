@@ -1,0 +1,204 @@
+#pragma once
+// The upload view inside a whole run of the application: real widgets, real notifications, a cloud that the test steps.
+#include "account/account.h"
+#include "base/base.h"
+#include "driver.h"
+#include "fake_app.h"
+#include "fake_cloud.h"
+#include "posted.h"
+#include "temp_home.h"
+#include "vconf/vconf.h"
+#include "velora_upload_file/upload_internal.h"
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <clocale>
+#include <cstring>
+#include <fstream>
+
+int velora_main(int argc, char **argv);
+
+class UploadPage : public testing::Test {
+  protected:
+    void SetUp() override
+    {
+        setlocale(LC_ALL, "C.UTF-8");
+        setenv("LANGUAGE", "en", 1);
+        driver::start();
+        platform_package_set(VELORA_PACKAGE);
+        vconf_set_str("memory/connection/type", "wifi");
+        add_account();
+        fake_app::clear();
+        fake_cloud_reset();
+        for (const char *folder : {"/Alpha", "/Alpha/Beta", "/Alpha/Beta/Gamma", "/R&D <b>", "/Velora"})
+            fake_cloud_add_folder(folder);
+        fake_cloud_add_file("/one.jpg", "was there before");
+        fake_cloud_refresh_now();
+    }
+    void TearDown() override
+    {
+        fake_cloud_hold(false);
+        EXPECT_EQ(s_vd.load(), nullptr);
+        EXPECT_EQ(fake_cloud_open_handles(), 0);
+        fake_app::clear();
+        driver::settle();
+    }
+
+    // One run of the application. A script that has not left it by itself is made to.
+    void run(const std::function<void()> &script)
+    {
+        char name[] = "velora";
+        char *arguments[] = {name, nullptr};
+        fake_app::run([this, &script] {
+            script();
+            if (s_vd)
+                _velora_app_exit(s_vd.load()->ad);
+            driver::settle();
+        });
+        velora_main(1, arguments);
+    }
+
+    static void request(const char *operation, const std::vector<std::string> &paths,
+                        const char *display_type = nullptr)
+    {
+        app_control_h request = fake_app::receive(operation, "gallery");
+        std::vector<const char *> array;
+        for (const std::string &path : paths)
+            array.push_back(path.c_str());
+        app_control_add_extra_data_array(request, display_type ? "path" : APP_CONTROL_DATA_PATH, array.data(),
+                                         static_cast<int>(array.size()));
+        if (display_type)
+            app_control_add_extra_data(request, "display_type", display_type);
+        fake_app::request(request);
+        app_control_destroy(request);
+        driver::settle();
+    }
+    // Local files of these names are shared; each holds its own name.
+    void share(const std::vector<std::string> &names)
+    {
+        std::vector<std::string> paths;
+        for (const std::string &name : names)
+            paths.push_back(local(name));
+        request(APP_CONTROL_OPERATION_MULTI_SHARE, paths);
+    }
+    void show_result(const std::vector<std::string> &names, const char *display_type)
+    {
+        std::vector<std::string> paths;
+        for (const std::string &name : names)
+            paths.push_back(local(name));
+        request(APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD_RESULT, paths, display_type);
+    }
+    std::string local(const std::string &name) const
+    {
+        std::filesystem::create_directories(home.path + "/files");
+        std::string path = home.path + "/files/" + name;
+        std::ofstream(path) << name;
+        return path;
+    }
+
+    static Evas_Object *window()
+    {
+        return s_vd.load()->ad->win_main;
+    }
+    static bool shows(const std::string &text)
+    {
+        driver::settle();
+        return ("\n" + driver::read_texts(window())).find("\n" + text + "\n") != std::string::npos;
+    }
+    static void press_back()
+    {
+        driver::press(window(), "XF86Back");
+    }
+    static bool press_done()
+    {
+        return driver::click(s_vd.load()->done_btn);
+    }
+    static bool press_popup_button(int number)
+    {
+        Evas_Object *popup = s_vd.load()->ad->popup;
+        return popup && driver::click(elm_object_part_content_get(popup, ("button" + std::to_string(number)).c_str()));
+    }
+    // The cancel button of the nth row that has one.
+    static bool press_row_cancel(int nth)
+    {
+        return driver::click(driver::find_widget(s_vd.load()->genlist, "elm_button", nth));
+    }
+    static Elm_Object_Item *row(int nth)
+    {
+        Elm_Object_Item *item = elm_genlist_first_item_get(s_vd.load()->genlist);
+        while (item && nth-- > 0)
+            item = elm_genlist_item_next_get(item);
+        return item;
+    }
+    // Every row as "KIND NAME".
+    static std::vector<std::string> rows()
+    {
+        static const char *const kinds[] = {"file", "queued", "uploaded", "failed"};
+        std::vector<std::string> all;
+        for (int i = 0; Elm_Object_Item *item = row(i); i++) {
+            const auto *record = static_cast<const ItemData *>(elm_object_item_data_get(item));
+            char *folder = nullptr;
+            if (record->folder)
+                cloud_content_sync_folder_get_name(record->folder, &folder);
+            const CString owned(folder);
+            all.push_back(folder ? std::string("folder ") + folder
+                                 : std::string(kinds[record->type]) + " " + record->name);
+        }
+        return all;
+    }
+    static std::vector<int> states()
+    {
+        std::vector<int> all;
+        for (UploadItem *item : s_vd.load()->run)
+            all.push_back(item->state);
+        return all;
+    }
+    static bool is_over() // the run has ended and the view knows
+    {
+        return s_vd.load() && s_vd.load()->is_end_handled && !s_vd.load()->thread;
+    }
+    static bool wait_for(const std::function<bool()> &condition)
+    {
+        return driver::run_until(condition, 20);
+    }
+    bool wait_for_exit()
+    {
+        return wait_for([] { return !s_vd.load(); }) && (driver::settle(), driver::exit_requested());
+    }
+
+    // The posted notifications: the ongoing one as "TITLE: CONTENT", results with "DISPLAY_TYPE: NAME..." behind it.
+    static std::vector<std::string> notifications()
+    {
+        std::vector<std::string> all;
+        for (const Posted &one : read_posted(VELORA_SHARE_PACKAGE)) {
+            all.push_back(one.title + ": " + one.content);
+            if (one.operation == APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD_RESULT)
+                all.back() += " " + one.display_type + ":";
+            for (const std::string &path : one.paths)
+                all.back() += std::string(" ") + __last_segment(path.c_str());
+        }
+        return all;
+    }
+    static std::string uploaded(const std::string &path)
+    {
+        return fake_cloud_content(path).value_or("(missing)");
+    }
+
+    TempHome home;
+    LogCatcher log;
+
+  private:
+    static void add_account()
+    {
+        account_h account = nullptr;
+        int id = 0;
+        account_connect();
+        account_create(&account);
+        account_set_user_name(account, "ann@example.com");
+        account_insert_to_db(account, &id);
+        account_destroy(account);
+        account_disconnect();
+    }
+};
+
+using Texts = std::vector<std::string>;

@@ -1,0 +1,267 @@
+// Destination names, file types and sizes, and what the notifications of an upload hold.
+#include "fake_app.h"
+#include "posted.h"
+#include "temp_home.h"
+#include "vconf/vconf.h"
+#include "velora_upload_file/upload_internal.h"
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <ctime>
+
+namespace {
+std::vector<std::string> folder_files; // of the open folder, in the database's order
+int folder_error;                      // what the enumeration reports with each of them
+} // namespace
+
+int cloud_content_sync_folder_foreach_content_from_db(cloud_content_sync_h, cloud_content_sync_folder_h,
+                                                      cloud_content_sync_content_cb cb, void *user_data)
+{
+    for (std::string &name : folder_files)
+        if (!cb(reinterpret_cast<cloud_content_sync_content_h>(&name), folder_error, user_data))
+            break;
+    return CLOUD_CONTENT_SYNC_ERROR_NONE;
+}
+
+int cloud_content_sync_content_get_name(cloud_content_sync_content_h content, char **name)
+{
+    *name = strdup(reinterpret_cast<std::string *>(content)->c_str());
+    return CLOUD_CONTENT_SYNC_ERROR_NONE;
+}
+
+int cloud_content_sync_content_get_is_thumbnail_exist(cloud_content_sync_content_h, bool *)
+{
+    return CLOUD_CONTENT_SYNC_ERROR_NOT_FOUND;
+}
+
+int cloud_content_sync_content_get_thumbnail_path(cloud_content_sync_content_h, char **)
+{
+    return CLOUD_CONTENT_SYNC_ERROR_NOT_FOUND;
+}
+
+TEST(Names, TakeTheNextFreeCounter)
+{
+    const std::string x = std::string(251, 'x'), e = "\xc3\xa9"; // two bytes, one character
+    std::string accents;
+    for (int i = 0; i < 125; i++)
+        accents += e;
+    const struct {
+        std::string wanted;
+        std::vector<std::string> present;
+        std::string result;
+    } cases[] = {
+        {"photo.jpg", {"other.jpg", "photo.jpeg"}, "photo.jpg"},
+        {"photo.jpg", {"photo.jpg"}, "photo(1).jpg"},
+        {"photo.jpg", {"photo.jpg", "photo(1).jpg", "photo(2).jpg"}, "photo(3).jpg"},
+        {"photo.jpg", {"photo(2).jpg", "photo(1).jpg", "photo.jpg"}, "photo(3).jpg"}, // takes several walks
+        {"photo(3).jpg", {"photo(3).jpg"}, "photo(4).jpg"},
+        {"archive.tar.gz", {"archive.tar.gz"}, "archive.tar(1).gz"},
+        {"file.", {"file."}, "file(1)."},
+        {".profile", {".profile"}, "(1).profile"},
+        {"a(0).txt", {"a(0).txt"}, "a(0)(1).txt"},
+        {"a(-4).txt", {"a(-4).txt"}, "a(-4)(1).txt"},
+        {"a(x).txt", {"a(x).txt"}, "a(x)(1).txt"},
+        {"a(2b).txt", {"a(2b).txt"}, "a(3).txt"},
+        {"a(9)(2).txt", {"a(9)(2).txt"}, "a(9)(3).txt"},
+        {"a(99999999999).txt", {"a(99999999999).txt"}, "a(99999999999)(1).txt"},
+        {"a(2147483647).txt", {"a(2147483647).txt"}, "a(2147483647)(1).txt"},
+        {").txt", {").txt"}, ")(1).txt"},
+        {"Photo.JPG", {"photo.jpg", "photo.JPG"}, "Photo.JPG"},
+        {"README", {"README"}, "README(1)"},
+        {"README", {"README", "README(1)"}, "README(2)"},
+        {"a%s<b>&.txt", {"a%s<b>&.txt"}, "a%s<b>&(1).txt"},
+        // what a file system can hold: 255 bytes, cut between characters
+        {x + ".jpg", {x + ".jpg"}, x.substr(3) + "(1).jpg"},
+        {accents + ".jpeg", {accents + ".jpeg"}, accents.substr(4) + "(1).jpeg"},
+    };
+    for (const auto &c : cases) {
+        for (const char *folder : {"/", "/My Photos"}) {
+            AppData ad;
+            UploadViewData vd;
+            vd.ad = &ad;
+            ad.folder_path = const_cast<char *>(folder);
+            folder_files = c.present;
+            vd.folder = reinterpret_cast<cloud_content_sync_folder_h>(&folder_files);
+            const std::string prefix = std::string(folder) == "/" ? "/" : "/My Photos/";
+            EXPECT_EQ(taken(__get_upload_server_path(&vd, ("/local/dir.d/" + c.wanted).c_str())), prefix + c.result);
+            EXPECT_EQ(vd.new_name, nullptr);
+        }
+    }
+}
+
+TEST(Names, StandWhenTheFolderCannotBeRead)
+{
+    AppData ad;
+    UploadViewData vd;
+    LogCatcher log;
+    vd.ad = &ad;
+    folder_files = {"photo.jpg"};
+    EXPECT_EQ(taken(__get_upload_server_path(&vd, "/local/photo.jpg")), "/photo.jpg") << "no folder is open";
+    vd.folder = reinterpret_cast<cloud_content_sync_folder_h>(&folder_files);
+    folder_error = CLOUD_CONTENT_SYNC_ERROR_DB_FAILED;
+    EXPECT_EQ(taken(__get_upload_server_path(&vd, "/local/photo.jpg")), "/photo.jpg");
+    folder_error = 0;
+}
+
+TEST(Types, FollowTheExtensionAlone)
+{
+    LogCatcher log;
+    const struct {
+        const char *name;
+        int type;
+        const char *ext, *base; // null: none
+    } cases[] = {
+        {"photo.JPG", 3, "JPG", "photo"},    {"clip.Mp4", 4, "Mp4", "clip"},
+        {"song.mp3", 5, "mp3", "song"},      {"tone.ogg", 6, "ogg", "tone"},
+        {"paper.pdf", 7, "pdf", "paper"},    {"feed.OPML", 26, "OPML", "feed"},
+        {"a.tar.gz", 35, "gz", "a.tar"},     {"README", 0, nullptr, nullptr},
+        {"dir.d/file", 0, nullptr, nullptr}, {".jpg", 3, "jpg", ""},
+        {"ends.", 35, "", "ends"},           {"x.jpeg2", 35, "jpeg2", "x"},
+        {"", 0, nullptr, nullptr},           {"x.hwp", 34, "hwp", "x"},
+        {nullptr, 32, nullptr, nullptr},     {"/a/b.svgz", 25, "svgz", "/a/b"},
+    };
+    for (const auto &c : cases) {
+        SCOPED_TRACE(c.name ? c.name : "null");
+        EXPECT_EQ(__get_file_type(c.name), c.type);
+        EXPECT_EQ(taken(__get_file_ext_name(c.name)), c.ext ? c.ext : "(null)");
+        EXPECT_EQ(taken(__get_file_base_name(c.name)), c.base ? c.base : "(null)");
+    }
+}
+
+TEST(Sizes, HaveTwoDecimalsAndTheFittingUnit)
+{
+    const struct {
+        gint64 bytes;
+        const char *text;
+    } cases[] = {{0, "0.00KB"},
+                 {1023, "1.00KB"},
+                 {1004, "0.98KB"},
+                 {1048575, "1024.00KB"},
+                 {1048576, "1.00MB"},
+                 {1572864, "1.50MB"},
+                 {1073741823, "1024.00MB"},
+                 {1073741824, "1.00GB"},
+                 {5000000000000, "4656.61GB"},
+                 {-2048, "-2.00KB"}};
+    for (const auto &c : cases)
+        EXPECT_EQ(taken(__get_formatted_size(c.bytes)), c.text) << c.bytes;
+}
+
+namespace {
+
+class Notifications : public testing::Test {
+  protected:
+    void SetUp() override
+    {
+        fake_app::clear();
+        setenv("TZ", "XST-5:30", 1); // a local time that is not UTC
+        tzset();
+    }
+
+    static std::vector<Posted> all()
+    {
+        return read_posted(VELORA_SHARE_PACKAGE);
+    }
+
+    TempHome home;
+    LogCatcher log;
+};
+
+} // namespace
+
+TEST_F(Notifications, TheOngoingOneShowsAndFollowsTheQueue)
+{
+    int id = -1;
+    ASSERT_EQ(__progress_noti_new("0 / 5", &id), 0);
+    ASSERT_GT(id, 0);
+    EXPECT_EQ(__progress_noti_set_content(id, "2 / 5"), 0);
+    EXPECT_EQ(__progress_noti_set_progress(id, 0.4), 0);
+    ASSERT_EQ(all().size(), 1u);
+    const Posted noti = all()[0];
+    EXPECT_EQ(noti.id, id);
+    EXPECT_EQ(noti.type, NOTIFICATION_TYPE_ONGOING);
+    EXPECT_EQ(noti.flags, 0x104);
+    EXPECT_EQ(noti.places, 9);
+    EXPECT_EQ(noti.layout, NOTIFICATION_LY_ONGOING_PROGRESS);
+    EXPECT_DOUBLE_EQ(noti.progress, 0.4);
+    EXPECT_EQ(noti.title, "Velora");
+    EXPECT_EQ(noti.content, "2 / 5");
+    EXPECT_TRUE(noti.icon.ends_with("/res/images/com.orvant.velora.png"));
+    EXPECT_TRUE(noti.indicator.ends_with("/res/images/B03_velora.png"));
+    EXPECT_EQ(noti.operation, APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD);
+    EXPECT_EQ(noti.app_id, VELORA_SHARE_PACKAGE);
+    EXPECT_EQ(noti.activate, "Activate");
+
+    EXPECT_EQ(__progress_noti_delete(id), 0);
+    EXPECT_EQ(all().size(), 0u);
+    EXPECT_EQ(__progress_noti_set_content(id, "3 / 5"), -1);
+    EXPECT_TRUE(log.has("notification_load failed"));
+    for (const int invalid : {0, -1})
+        EXPECT_EQ(__progress_noti_set_content(invalid, "x") + __progress_noti_set_progress(invalid, 0.5) +
+                      __progress_noti_delete(invalid),
+                  -3);
+    EXPECT_TRUE(log.has("Invalid noti id"));
+}
+
+TEST_F(Notifications, AResultCarriesItsFilesAndTakesTheLastOnesPlace)
+{
+    char one[] = "/local/a<b>&.jpg", two[] = "/local/it's.txt";
+    char *paths[] = {one, two, nullptr};
+    int id = -1;
+    ASSERT_EQ(__box_noti_new("old", "old", "fail", paths, 1), 0);
+    // A full storage counts five files, of which two were tried.
+    ASSERT_EQ(__box_noti_new("5 files", "Upload failed", "fail", paths, 5), 0);
+    ASSERT_EQ(all().size(), 1u);
+    const Posted noti = all()[0];
+    EXPECT_EQ(noti.type, NOTIFICATION_TYPE_NOTI);
+    EXPECT_EQ(noti.flags, 0x100);
+    EXPECT_EQ(noti.places, 1);
+    EXPECT_EQ(noti.layout, NOTIFICATION_LY_NOTI_EVENT_MULTIPLE);
+    EXPECT_EQ(noti.title, "5 files");
+    EXPECT_EQ(noti.content, "Upload failed");
+    EXPECT_EQ(noti.info, "Upload failed");
+    EXPECT_EQ(noti.operation, APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD_RESULT);
+    EXPECT_EQ(noti.app_id, VELORA_SHARE_PACKAGE);
+    EXPECT_EQ(noti.activate, "Activate");
+    EXPECT_EQ(noti.display_type, "fail");
+    EXPECT_EQ(noti.paths, (std::vector<std::string>{one, two}));
+
+    ASSERT_EQ(__progress_noti_new("0 / 1", &id), 0);
+    ASSERT_EQ(all().size(), 1u) << "a new run takes the last result away";
+    EXPECT_EQ(all()[0].id, id);
+    ASSERT_EQ(__box_noti_new("x", "y", "success", nullptr, 0), 0);
+    EXPECT_EQ(all().size(), 2u) << "and its end leaves the ongoing one";
+}
+
+TEST_F(Notifications, NothingIsPostedWhenItsRequestCannotBeMade)
+{
+    const char *steps[] = {"app_control_create", "app_control_set_operation", "app_control_set_app_id",
+                           "app_control_add_extra_data", "app_control_to_bundle"};
+    for (const char *step : steps) {
+        int id = -1;
+        fake_app::fail(step, 1, APP_CONTROL_ERROR_OUT_OF_MEMORY);
+        EXPECT_EQ(__progress_noti_new("0 / 1", &id), -1) << step;
+        EXPECT_EQ(id, -1) << step;
+        fake_app::fail(step, 1, APP_CONTROL_ERROR_OUT_OF_MEMORY);
+        EXPECT_EQ(__box_noti_new("x", "y", "success", nullptr, 0), -1) << step;
+        EXPECT_TRUE(all().empty()) << step;
+    }
+}
+
+TEST_F(Notifications, TheClockHasTwelveOrTwentyFourHours)
+{
+    for (const bool is_24_hours : {true, false}) {
+        ASSERT_EQ(vconf_set_bool("db/menu_widget/regionformat_24hour", is_24_hours), 0);
+        std::vector<std::string> allowed; // the minute may change under way
+        std::string shown;
+        for (int i = 0; i < 2; i++) {
+            const time_t now = time(nullptr) + (5 * 60 + 30) * 60;
+            char text[32];
+            strftime(text, sizeof text, is_24_hours ? "%H:%M" : "%I:%M %p", gmtime(&now));
+            allowed.push_back(text);
+            if (i == 0)
+                shown = taken(__get_format_time());
+        }
+        EXPECT_TRUE(std::ranges::count(allowed, shown)) << shown << " " << allowed[0];
+    }
+}
