@@ -184,6 +184,12 @@ Evas_Object *__file_icon_create(Evas_Object *parent, ItemData *record, const cha
 // Forgets the media records that __get_local_thumbnail handed thumbnails out of.
 void __local_thumbnails_free();
 
+// upload_thumbnails.cpp
+// Has the rows' thumbnails told of when the client has fetched them, or no longer. The view's pipe must outlive that.
+void __cloud_thumbnails_watch(UploadViewData *vd, bool is_on);
+// "thumb.N": the row, when it is in sight, shows the thumbnail of the path that the handle N stands for.
+void __cloud_thumbnail_arrived(UploadViewData *vd, uint32_t handle);
+
 // upload_list.cpp: rows.
 Evas_Object *__genlist_create(UploadViewData *vd);
 void __item_classes_create(UploadViewData *vd);

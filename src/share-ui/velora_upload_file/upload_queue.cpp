@@ -5,6 +5,7 @@
 #include "velora_upload_file/upload_internal.h"
 #include <Ecore_File.h>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 
 static Eina_Bool __idler_load_cb(void *data)
@@ -193,6 +194,8 @@ void __pipe_cb(void *, void *buffer, unsigned int size)
         __run_ended(vd);
     else if (g_strcmp0(message, "meta_changed") == 0)
         __meta_changed(vd);
+    else if (std::strncmp(message, "thumb.", 6) == 0)
+        __cloud_thumbnail_arrived(vd, static_cast<uint32_t>(std::strtoul(message + 6, nullptr, 10)));
     else
         __item_message(vd, message);
 }

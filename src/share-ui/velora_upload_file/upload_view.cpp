@@ -67,6 +67,7 @@ void __destroy_view(UploadViewData *vd)
     if (vd->folder)
         cloud_content_sync_folder_destroy(vd->folder);
     _velora_common_local_data_disconnect();
+    __cloud_thumbnails_watch(vd, false);
     s_view_pipe = nullptr;
     if (vd->pipe)
         _velora_common_pipe_del(vd->pipe);
@@ -330,6 +331,7 @@ void _velora_upload_view_create(AppData *ad)
     if (ad->launch_mode == LAUNCH_MODE_SHARE && !__share_create(vd))
         return;
     __pipe_ensure(vd);
+    __cloud_thumbnails_watch(vd, true);
     __meta_refresh_start(vd);
     if (ad->is_meta_refreshed)
         _velora_upload_view_update();

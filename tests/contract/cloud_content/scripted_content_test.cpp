@@ -1,5 +1,6 @@
 // Requests about single files, against a service that answers wrongly, slowly or not at all.
 #include "backend.h"
+#include "cloud_content_sync/cache.h"
 #include "contents.h"
 #include "scripted_server.h"
 #include <sys/stat.h>
@@ -85,7 +86,10 @@ TEST_F(ScriptedContent, only_what_is_right_is_taken)
         {answer("500 Internal Server Error"), CLOUD_CONTENT_SYNC_ERROR_SERVER},
     };
     for (const auto &row : files) {
-        now = row.answer;
+        {
+            std::scoped_lock lock(server->mutex);
+            now = row.answer;
+        }
         for (const Kind kind : {Kind::DOWNLOAD, Kind::CACHED}) {
             Result result;
             EXPECT_EQ(fetch(handle, kind, "p0.jpg", result, target() + "/x"), row.error) << now;
@@ -110,13 +114,16 @@ TEST_F(ScriptedContent, only_what_is_right_is_taken)
         {answer("501 Not Implemented"), ""},
     };
     for (const auto &row : addresses) {
-        now = row.answer;
+        {
+            std::scoped_lock lock(server->mutex);
+            now = row.answer;
+        }
         Result result;
         EXPECT_EQ(fetch(handle, Kind::STREAM, "p0.jpg", result), row.url.empty() ? CLOUD_CONTENT_SYNC_ERROR_SERVER : 0)
             << now;
         EXPECT_EQ(result.text, row.url);
     }
-    const Request sent = server->requests.back();
+    const Request sent = server->requests().back();
     EXPECT_EQ(sent.method + " " + sent.path, "POST /api/1/media");
     EXPECT_EQ(sent.body, "{\"path\":\"/p0.jpg\",\"minutes\":30}");
     EXPECT_EQ(sent.authorization, "Bearer token");
@@ -137,12 +144,12 @@ TEST_F(ScriptedContent, nothing_calls_back_and_nothing_is_left_after_cancel_or_d
             ASSERT_EQ(ask(handle, kind, "p0.jpg", result, target() + "/x", &id), 0);
             for (Result &other : queued) // more than run at once
                 ASSERT_EQ(ask(handle, kind, "p0.jpg", other, target() + "/y", &last), 0);
-            EXPECT_TRUE(comes_true([&] { return server->log().size() >= 5; }));
+            EXPECT_TRUE(comes_true([&] { return server->requests().size() >= 5; }));
             EXPECT_EQ(cloud_content_sync_cancel(handle, last), 0);
             EXPECT_EQ(cloud_content_sync_cancel(handle, last), CLOUD_CONTENT_SYNC_ERROR_NOT_FOUND);
             EXPECT_EQ(cloud_content_sync_cancel(handle, id), 0);
             // The room that it leaves is the next one's.
-            EXPECT_TRUE(comes_true([&] { return server->log().size() >= 6; }));
+            EXPECT_TRUE(comes_true([&] { return server->requests().size() >= 6; }));
             if (by_destroy) {
                 cloud_content_sync_destroy(handle);
                 handle = nullptr;
@@ -172,33 +179,33 @@ TEST_F(ScriptedContent, nothing_calls_back_and_nothing_is_left_after_cancel_or_d
 
 TEST_F(ScriptedContent, thumbnails_wait_for_everybody_and_the_last_comes_first)
 {
-    std::atomic<bool> is_open = false;
-    const auto is_thumbnail = [](const std::string &line) { return line.find("/thumbnail") != line.npos; };
+    const auto is_thumbnail = [](const Request &request) {
+        return request.path.find("/thumbnail") != request.path.npos;
+    };
     const auto asked = [&] {
         Names names;
-        for (const std::string &line : server->log())
-            if (is_thumbnail(line))
-                names.push_back(line.substr(line.rfind('/') + 1));
+        for (const Request &request : server->requests())
+            if (is_thumbnail(request))
+                names.push_back(request.path.substr(request.path.rfind('/') + 1));
         return names;
     };
     serve(
-        [&](const Request &request) {
-            // The file that a person waits for does not come before the gate is open; p3.jpg is no picture.
-            while (!is_thumbnail(request.path) && !is_open)
-                g_usleep(1000);
+        [&](const Request &request) -> std::string {
+            if (!is_thumbnail(request)) // never comes to an end
+                return "HTTP/1.1 200 OK\r\nContent-Length: 5\r\n\r\nhe";
             return request.path.find("p3.jpg") != request.path.npos ? answer("415 Unsupported Media Type")
                                                                     : answer("200 OK", "thumb");
         },
         250);
     Result result;
-    ASSERT_EQ(ask(handle, Kind::CACHED, "p0.jpg", result), 0);
-    EXPECT_TRUE(comes_true([&] { return server->log().size() >= 2; }));
+    int id = 0;
+    ASSERT_EQ(ask(handle, Kind::CACHED, "p0.jpg", result, "", &id), 0);
+    EXPECT_TRUE(comes_true([&] { return server->requests().size() >= 2; }));
     for (int i = 0; i < 250; i++)
         EXPECT_FALSE(has_thumbnail(handle, "p" + std::to_string(i) + ".jpg"));
     EXPECT_FALSE(has_thumbnail(handle, "p100.jpg")); // came into sight again
     EXPECT_EQ(asked(), Names{}) << "before a person's request";
-    is_open = true;
-    EXPECT_EQ(result.end(), 0);
+    EXPECT_EQ(cloud_content_sync_cancel(handle, id), 0);
     EXPECT_TRUE(comes_true([&] { return asked().size() >= 200; }));
     Names names = asked();
     EXPECT_EQ(std::count(names.begin(), names.end(), "p50.jpg"), 1);
@@ -227,7 +234,7 @@ TEST_F(ScriptedContent, no_thumbnail_is_told_of_after_the_callback_was_taken_awa
         auto *self = static_cast<Slow *>(data);
         self->running++;
         self->calls++;
-        g_usleep(3000);
+        usleep(3000);
         self->running--;
     };
     for (int round = 0; round < 2; round++) {
@@ -244,7 +251,28 @@ TEST_F(ScriptedContent, no_thumbnail_is_told_of_after_the_callback_was_taken_awa
         }
         EXPECT_EQ(slow.running, 0);
         const int after = slow.calls;
-        g_usleep(30'000);
+        usleep(30'000);
         EXPECT_EQ(slow.calls, after);
     }
+}
+
+TEST(CloudCache, forgets_what_was_not_used_for_longest)
+{
+    const Scratch scratch;
+    const auto add = [&](const char *name, size_t size, int minutes_ago) {
+        const std::string file = scratch.file(name, std::string(size, 'x'));
+        std::filesystem::last_write_time(file, std::filesystem::file_time_type::clock::now() -
+                                                   std::chrono::minutes(minutes_ago));
+        return file;
+    };
+    const std::string oldest = add("oldest", 100, 50), old = add("old", 100, 40);
+    add("middle", 100, 30);
+    add("recent", 100, 20);
+    add(".download-a.part", 500, 60);
+    add(".download-b.part", 500, 25 * 60);
+    cloud::cache_trim(scratch.path, 400, "");
+    EXPECT_EQ(names_in(scratch.path), (Names{".download-a.part", "middle", "old", "oldest", "recent"}));
+    EXPECT_TRUE(cloud::cache_use(oldest, 100));
+    cloud::cache_trim(scratch.path, 250, old);
+    EXPECT_EQ(names_in(scratch.path), (Names{".download-a.part", "old", "oldest"}));
 }
