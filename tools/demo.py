@@ -4,6 +4,8 @@ import argparse
 import hashlib
 import os
 import re
+import signal
+import subprocess
 import sys
 import tempfile
 import time
@@ -53,82 +55,114 @@ class Pictures:
         self.device, self.count = device, 0
         self.folder = os.path.join(tempfile.gettempdir(), f"velora-pictures-{os.getuid()}")
         os.makedirs(self.folder, mode=0o700, exist_ok=True)
+        if os.stat(self.folder).st_uid != os.getuid():  # somebody else took the name
+            self.folder = tempfile.mkdtemp(prefix="velora-pictures-")
         for old in os.listdir(self.folder):
             os.unlink(os.path.join(self.folder, old))
 
     def take(self, name):
         self.count += 1
+        name = re.sub(r"[^\w.-]+", "-", printable(name)).strip("-")[:60]
         self.device.picture(os.path.join(self.folder, f"{self.count}-{name}.png"))
 
 
-def follow_upload(device, pictures, count):
+def show_progress(line):
+    _, kind, title, content, percent = line.split("\t")
+    say(f"  notification: {printable(title)}  {printable(content)}" + (f"  {percent}%" if kind == "ongoing" else ""))
+
+
+def follow_upload(device, pictures, application, launch):
     """Shows the ongoing notification move until the result is there."""
-    seen, shots = "", 0
-    end = time.monotonic() + 600
+    told, moments = None, ["uploading-as-a-notification", "uploading-as-a-list"] if pictures else []
+    end = time.monotonic() + 3600
     while time.monotonic() < end:
         lines = device.notifications()
         ongoing = next((line for line in lines if "\tongoing\t" in line), None)
-        if ongoing and ongoing != seen:
-            seen = ongoing
-            say("  notification: " + printable(ongoing.split("\tongoing\t")[1].replace("\t", "  ")))
-            if shots == 0:
-                pictures.take("uploading-notification")
-                # Back to the application, by a tap on its ongoing notification.
-                device.tool("platform/notification/notifications", "tap", "com.orvant.velora-share",
-                            ongoing.split("\t")[0])
-                shots = 1
-            elif shots == 1 and count > 1:
-                pictures.take("uploading-queue")
-                shots = 2
         result = next((line for line in lines if "\tnormal\t" in line), None)
+        if ongoing and ongoing != told:
+            told = ongoing
+            show_progress(ongoing)
+            if moments:
+                pictures.take(moments.pop(0))
+                device.raise_window()
         if result and not ongoing:
-            say("  notification: " + printable(result.split("\tnormal\t")[1].replace("\t", "  ")))
+            show_progress(result)
             return
-        time.sleep(0.1)
+        if launch.poll() is not None or application.poll() is not None:
+            return  # left before the files were up
+        time.sleep(0.05)
     raise Trouble("the uploads do not come to an end")
 
 
-def operate(device, pictures, folder, count):
-    """What a person would do: walk to the folder, press Done, watch, and leave."""
-    first, *others = folder.strip("/").split("/") if folder.strip("/") else [None]
-    if first:
-        wait_for("the folders of the account", lambda: device.find(first), 30)
-    else:
-        wait_for("the folder browser", lambda: device.find("Done"), 30)
-    pictures.take("folder-browser")
-    for segment in [first, *others] if first else []:
+def operate(device, pictures, folder):
+    """What a person would do up to Done: walk to the folder."""
+    segments = [segment for segment in folder.split("/") if segment]
+    wait_for("the folders of the account", lambda: device.find(segments[0] if segments else "Done"), 30)
+    pictures.take("folders-of-the-account")
+    for segment in segments:
         device.click(segment)
+        # The path bar shows it, and the row that was tapped is gone.
+        wait_for(f'the folder "{segment}"', lambda: device.find("Done", "Elm_Button"), 10)
         time.sleep(0.6)
-        pictures.take("folder-opened")
-    device.click("Done")
-    follow_upload(device, pictures, count)
-    device.run("xdotool", "search", "--sync", "--onlyvisible", "--name", "^velora$", "windowactivate")
-    time.sleep(0.5)
-    pictures.take("result")
-    device.key("Escape")
+        pictures.take(f"folder-{segment}")
+    device.click("Done", "Elm_Button")
 
 
-def report(device, folder, files, before):
+def escaped(path):
+    """A path as the log writes it."""
+    shown = os.fsencode(path).decode(errors="surrogateescape").replace("\n", "\\n").replace("\t", "\\t")
+    return re.sub(r"[\0-\x1f\x7f]", lambda control: f"\\x{ord(control[0]):02x}", shown)
+
+
+def report(device, files, before):
     """One line per file; true when each is on the server, byte for byte."""
     with open(device.log, encoding="utf-8", errors="surrogateescape") as log:
-        errors = {path: int(code) for code, path in re.findall(r"upload failed\[(\d+)\]: \[(.*?)\]\033", log.read())}
+        errors = {path: int(code) for code, path in re.findall(r"upload failed\[(\d+)\]: \[(.*)\]$", log.read(), re.M)}
     places = {}
     for place in sorted(device.all_files() - before):
         with device.get(place) as stream:
             places.setdefault(digest(stream), []).append(place)
     whole = True
     for path in files:
-        try:
-            with open(path, "rb") as stream:
-                found = places.get(digest(stream))
-        except OSError:
-            found = None
+        error = errors.get(escaped(path))
+        found = None
+        if not error:
+            try:
+                with open(path, "rb") as stream:
+                    found = places.get(digest(stream))
+            except OSError:
+                pass
         if found:
             say(f"uploaded {printable(path)} -> {printable(found.pop(0))}")
             continue
         whole = False
-        say(f"failed {printable(path)}: {REASONS.get(errors.get(path), 'not on the server')}")
+        reason = REASONS.get(error) or ("not sent: the storage is full" if 26 in errors.values() else "not sent")
+        say(f"failed {printable(path)}: {reason}")
     return whole
+
+
+def leave(device, pictures):
+    if device.raise_window():
+        time.sleep(0.5)
+        pictures.take("result")
+        device.key("Escape")
+
+
+def prepare(device, folder, headless):
+    """The service with the account, the display and the bus."""
+    # In pictures the uploads of small files would be over before they can be seen.
+    device.start_service(*(["--delay", "60"] if headless else []))
+    say(f"velora-cloud: {device.web}/  files: {device.data}/files")
+    for place in ("/Documents", "/Photos/Holidays", "/Photos/Family & friends", folder):
+        device.make_folder(place)
+    device.sign_in()
+    if headless:
+        device.start_display()
+    if headless or "DBUS_SESSION_BUS_ADDRESS" not in device.env or device.is_on_bus(APP):
+        device.start_bus()
+        device.start_notification_daemon()
+    # The service is on this machine, network or not.
+    device.setting("memory/connection/type", "ethernet")
 
 
 def main():
@@ -141,49 +175,43 @@ def main():
     options = parser.parse_args()
     folder = options.to or "/Photos/Holidays"
 
+    # However it is ended, nothing stays behind.
+    for number in (signal.SIGTERM, signal.SIGHUP):
+        signal.signal(number, lambda *_: sys.exit(1))
     device = Device(os.path.abspath(options.build), options.data, keep_display=not options.headless)
     try:
-        # In pictures the uploads of small files would be over before they can be seen.
-        device.start_service(*(["--delay", "40"] if options.headless else []))
-        say(f"velora-cloud: {device.web}/  files: {device.data}/files")
-        for place in ("/Documents", "/Photos/Holidays", "/Photos/Family & friends"):
-            device.make_folder(place)
-        if folder.strip("/"):
-            device.make_folder(folder)
-        device.sign_in()
-        if options.headless:
-            device.start_display()
-            device.start_bus()
-            device.start_notification_daemon()
-        elif "DBUS_SESSION_BUS_ADDRESS" not in device.env:
-            device.start_bus()
-        if device.tool("platform/vconf/settings-store", "list").find("memory/connection/type") < 0:
-            device.setting("memory/connection/type", "ethernet")  # the service is on this machine, network or not
+        if not options.headless and not device.has_display():
+            say("no window can be opened on this display; using a virtual one")
+            device.end()
+            options.headless = True
+            device = Device(os.path.abspath(options.build), options.data)
+        prepare(device, folder, options.headless)
         files = [os.path.abspath(file) for file in options.files] or sample_pictures(device)
         before = device.all_files()
-        device.start([device.program("src/setting/main/velora"), "--service"])
-        say(f"sharing {len(files)} file{'s' if len(files) != 1 else ''} to {folder if options.headless else 'your choice'}")
-        wait_for("the application on the bus", lambda: APP in device.run(
-            "gdbus", "call", "--session", "--dest", "org.freedesktop.DBus", "--object-path", "/", "--method",
-            "org.freedesktop.DBus.ListNames"))
+        application = device.start_application()
+        say(f"sharing {len(files)} file{'s' if len(files) != 1 else ''} to "
+            + (folder if options.headless else "your choice"))
         launch = device.launch(OPERATION, "--array", PATHS, *files)
         pictures = Pictures(device) if options.headless else None
         if pictures:
-            operate(device, pictures, folder, len(files))
+            operate(device, pictures, folder)
+            follow_upload(device, pictures, application, launch)
+            leave(device, pictures)
             launch.wait(30)
         else:
-            say("the window is open: choose a folder and press Done; leave it with Back when the files are up")
+            say("the window is open: choose a folder and press Done; leave it with Back (Escape) when the files are up")
+            follow_upload(device, None, application, launch)
             launch.wait()
-        whole = report(device, folder, files, before)
+        whole = report(device, files, before)
         say(launch.stdout.read().decode().strip() or "no reply")
         if pictures:
             say(f"pictures: {pictures.folder}")
         return 0 if whole and launch.returncode == 0 else 1
-    except Trouble as trouble:
+    except (Trouble, OSError, subprocess.SubprocessError) as trouble:
         say(f"tools/run: {trouble}")
-        keep = os.path.join(tempfile.gettempdir(), f"velora-log-{os.getuid()}.txt")
         if os.path.exists(device.log):
-            with open(device.log, "rb") as log, open(keep, "wb") as copy:
+            number, keep = tempfile.mkstemp(prefix="velora-log-", suffix=".txt")
+            with open(device.log, "rb") as log, open(number, "wb") as copy:
                 copy.write(log.read())
             say(f"log: {keep}")
         return 1

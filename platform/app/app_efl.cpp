@@ -6,6 +6,7 @@
 #include "app/language.h"
 #include "app/target.h"
 #include "base/base.h"
+#include "theme/theme.h"
 #include <Ecore_X.h>
 #include <Efreet.h>
 #include <Elementary.h>
@@ -86,6 +87,7 @@ void watch_windows()
         if (!window || std::ranges::find(app.windows, window) != app.windows.end())
             continue;
         app.windows.push_back(window);
+        platform_theme_window_watch(window);
         evas_object_smart_callback_add(window, "iconified", window_hidden, nullptr);
         evas_object_smart_callback_add(window, "withdrawn", window_hidden, nullptr);
         evas_object_smart_callback_add(window, "normal", window_shown, nullptr);

@@ -82,6 +82,15 @@ static void __path_item_del_cb(void *data, Evas_Object *, void *)
     g_free(data);
 }
 
+static void __last_item_show_cb(void *)
+{
+    UploadViewData *vd = s_vd;
+    if (!vd || !vd->toolbar)
+        return;
+    evas_smart_objects_calculate(evas_object_evas_get(vd->toolbar));
+    elm_toolbar_item_show(elm_toolbar_last_item_get(vd->toolbar), ELM_TOOLBAR_ITEM_SCROLLTO_LAST);
+}
+
 static void __path_bar_append(UploadViewData *vd, const char *label, const char *path)
 {
     char *markup = elm_entry_utf8_to_markup(label);
@@ -89,6 +98,7 @@ static void __path_bar_append(UploadViewData *vd, const char *label, const char 
     Elm_Object_Item *item = elm_toolbar_item_append(vd->toolbar, nullptr, markup, __toolbar_it_cb, data);
     elm_object_item_del_cb_set(item, __path_item_del_cb);
     elm_toolbar_item_bring_in(item, ELM_TOOLBAR_ITEM_SCROLLTO_LAST);
+    ecore_job_add(__last_item_show_cb, nullptr); // once more when the bar has given the new item its place
     std::free(markup);
 }
 

@@ -130,7 +130,6 @@ void __state_show(UploadViewData *vd, ViewState state)
         elm_object_domain_translatable_part_text_set(vd->state, "velora.text", VELORA_SHARE_DOMAIN, looks[state].text);
     if (!is_usable && state != VIEW_STATE_LOADING) {
         Evas_Object *button = elm_button_add(vd->state);
-        elm_object_style_set(button, "popup");
         elm_object_domain_translatable_text_set(button, VELORA_SHARE_DOMAIN, "IDS_VELORA_BUTTON_RETRY");
         evas_object_smart_callback_add(button, "clicked", __retry_cb, nullptr);
         elm_object_part_content_set(vd->state, "velora.swallow.action", button);
