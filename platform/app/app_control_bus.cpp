@@ -1,5 +1,6 @@
 // The receiving side: this process's names on the session bus, and the objects behind them.
 #include "app/bus.h"
+#include "base/base.h"
 #include <algorithm>
 
 namespace {
@@ -164,6 +165,7 @@ void export_object(const std::string &name)
 void app_set_id(const char *app_id)
 {
     receiver().id = app_id ? app_id : "";
+    platform_package_set(app_id); // whose accounts this process owns
 }
 
 const char *app_get_id()

@@ -5,6 +5,8 @@
 #include <cstdlib>
 #include <string>
 
+extern "C" int _nl_msg_cat_cntr; // gettext's own: a changed LANGUAGE counts from the next change of this on
+
 namespace {
 constexpr char neutral[] = "C.UTF-8"; // unlike "C" it lets gettext look for catalogues
 
@@ -52,6 +54,7 @@ bool language_apply()
     if (!chosen && !user_list.empty() && is_language(user_locale))
         list = (":" + user_list + ":").find(":en:") == std::string::npos ? user_list + ":en" : user_list;
     setenv("LANGUAGE", list.c_str(), 1);
+    ++_nl_msg_cat_cntr; // setlocale does it only when the name of the locale is another one
     if (chosen) {
         unsetenv("LC_ALL");
         setenv("LANG", locale.c_str(), 1);

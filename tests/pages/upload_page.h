@@ -15,6 +15,7 @@
 #include <clocale>
 #include <cstring>
 #include <fstream>
+#include <map>
 
 int velora_main(int argc, char **argv);
 
@@ -30,6 +31,7 @@ class UploadPage : public testing::Test {
         add_account();
         fake_app::clear();
         fake_cloud_reset();
+        driver::exit_requested();
         for (const char *folder : {"/Alpha", "/Alpha/Beta", "/Alpha/Beta/Gamma", "/R&D <b>", "/Velora"})
             fake_cloud_add_folder(folder);
         fake_cloud_add_file("/one.jpg", "was there before");
@@ -58,8 +60,7 @@ class UploadPage : public testing::Test {
         velora_main(1, arguments);
     }
 
-    static void request(const char *operation, const std::vector<std::string> &paths,
-                        const char *display_type = nullptr)
+    void request(const char *operation, const std::vector<std::string> &paths, const char *display_type = nullptr)
     {
         app_control_h request = fake_app::receive(operation, "gallery");
         std::vector<const char *> array;
@@ -71,6 +72,8 @@ class UploadPage : public testing::Test {
             app_control_add_extra_data(request, "display_type", display_type);
         fake_app::request(request);
         app_control_destroy(request);
+        if (s_vd)
+            app = s_vd.load()->ad;
         driver::settle();
     }
     // Local files of these names are shared; each holds its own name.
@@ -118,10 +121,23 @@ class UploadPage : public testing::Test {
         Evas_Object *popup = s_vd.load()->ad->popup;
         return popup && driver::click(elm_object_part_content_get(popup, ("button" + std::to_string(number)).c_str()));
     }
-    // The cancel button of the nth row that has one.
-    static bool press_row_cancel(int nth)
+    // Rows get their place when they are drawn.
+    void draw()
     {
-        return driver::click(driver::find_widget(s_vd.load()->genlist, "elm_button", nth));
+        driver::save_picture(window(), home.path + "/drawn.png");
+    }
+    // The nth cancel button from the top.
+    bool press_row_cancel(size_t nth)
+    {
+        draw();
+        std::map<int, Evas_Object *> buttons; // by their height on the screen
+        while (Evas_Object *button =
+                   driver::find_widget(s_vd.load()->genlist, "elm_button", static_cast<int>(buttons.size()))) {
+            int y = 0;
+            evas_object_geometry_get(button, nullptr, &y, nullptr, nullptr);
+            buttons[y] = button;
+        }
+        return nth < buttons.size() && driver::click(std::next(buttons.begin(), static_cast<long>(nth))->second);
     }
     static Elm_Object_Item *row(int nth)
     {
@@ -163,7 +179,7 @@ class UploadPage : public testing::Test {
     }
     bool wait_for_exit()
     {
-        return wait_for([] { return !s_vd.load(); }) && (driver::settle(), driver::exit_requested());
+        return wait_for([this] { return !s_vd.load() && !app->win_main; });
     }
 
     // The posted notifications: the ongoing one as "TITLE: CONTENT", results with "DISPLAY_TYPE: NAME..." behind it.
@@ -184,6 +200,7 @@ class UploadPage : public testing::Test {
         return fake_cloud_content(path).value_or("(missing)");
     }
 
+    static inline AppData *app; // the one record of the process
     TempHome home;
     LogCatcher log;
 

@@ -79,6 +79,7 @@ static void __network_popup_create(AppData *ad)
                                     ad->cellular_state == CONNECTION_CELLULAR_STATE_CALL_ONLY_AVAILABLE;
     _velora_app_popup_delete(ad);
     ad->popup = elm_popup_add(ad->win_main);
+    elm_popup_scrollable_set(ad->popup, EINA_TRUE); // long words in a low window
     elm_object_domain_translatable_part_text_set(ad->popup, "title,text", VELORA_DOMAIN,
                                                  "IDS_CLOUD_HEADER_NO_NETWORK_CONNECTION");
     ea_object_event_callback_add(ad->popup, EA_CALLBACK_BACK, __velora_network_error_popup_cancel_cb, ad);

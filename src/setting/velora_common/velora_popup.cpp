@@ -83,6 +83,7 @@ Evas_Object *_velora_common_create_warning_popup(Evas_Object *parent, const char
         return nullptr;
     }
     Evas_Object *popup = elm_popup_add(parent);
+    elm_popup_scrollable_set(popup, EINA_TRUE); // long words in a low window
     elm_object_domain_translatable_text_set(popup, VELORA_DOMAIN, text_id);
     elm_object_domain_translatable_text_set(__button_add(popup, "button1", cb, data), VELORA_DOMAIN,
                                             "IDS_CLOUD_BODY_OK");

@@ -198,7 +198,7 @@ static bool __content_info_cb(cloud_content_sync_content_h content, int error, v
     record->name = g_strdup(name);
     record->file_name = g_strdup(name);
     std::free(name);
-    __row_append(list->vd, list->vd->itc_file, record, nullptr);
+    __row_append(list->vd, list->vd->itc_file, record, __select_item_to_launch_app);
     list->count++;
     return true;
 }

@@ -183,6 +183,7 @@ static void __gl_del(void *data, Evas_Object *)
         if (UploadItem *item = __upload_item_find(vd, record->index); item && item->gen_it == record->gen_it)
             item->gen_it = nullptr;
     }
+    __content_row_forget(record);
     if (record->folder)
         cloud_content_sync_folder_destroy(record->folder);
     if (record->content)

@@ -5,6 +5,7 @@
 #include "velora_upload_file/upload_internal.h"
 #include <Ecore_File.h>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 
 static Eina_Bool __idler_load_cb(void *data)
@@ -128,14 +129,22 @@ static void __row_store(UploadItem *item, int index)
     elm_genlist_item_update(item->gen_it);
 }
 
+// What is on screen stays there when it can: a cancel button that is replaced while a finger is on it is never clicked.
 static void __row_refresh_progress(const UploadItem *item)
 {
     if (!item->gen_it) {
         VELORA_LOGI("upload_item->gen_it is NULL");
         return;
     }
-    for (const char *part : {"elm.swallow.progressbar", "elm.icon.2"})
-        elm_genlist_item_fields_update(item->gen_it, part, ELM_GENLIST_ITEM_FIELD_CONTENT);
+    const int state = item->state;
+    Evas_Object *bar = elm_object_item_part_content_get(item->gen_it, "elm.swallow.progressbar");
+    if (bar && state == UPLOAD_STATE_UPLOADING && g_strcmp0(elm_object_style_get(bar), "list_progress") == 0) {
+        elm_progressbar_value_set(bar, item->progress / 100.0);
+        return;
+    }
+    elm_genlist_item_fields_update(item->gen_it, "elm.swallow.progressbar", ELM_GENLIST_ITEM_FIELD_CONTENT);
+    if (state != UPLOAD_STATE_WAITING && state != UPLOAD_STATE_UPLOADING)
+        elm_genlist_item_fields_update(item->gen_it, "elm.icon.2", ELM_GENLIST_ITEM_FIELD_CONTENT);
 }
 
 // "store.N" or "update.N".
@@ -171,7 +180,7 @@ static void __meta_changed(UploadViewData *vd)
     elm_scroller_region_show(vd->genlist, x, y, w, h);
 }
 
-void __pipe_cb(void *, void *buffer, unsigned int)
+void __pipe_cb(void *, void *buffer, unsigned int size)
 {
     UploadViewData *vd = s_vd;
     if (!vd) {
@@ -182,6 +191,10 @@ void __pipe_cb(void *, void *buffer, unsigned int)
         VELORA_LOGE("Invalid argument: buffer is NULL");
         return;
     }
+    if (ContentResultMessage result; _velora_common_is_content_result(buffer, size, &result)) {
+        __content_result_handle(vd, result);
+        return;
+    }
     const auto *message = static_cast<const char *>(buffer);
     if (g_strcmp0(message, "storage_full") == 0)
         __storage_full(vd);
@@ -189,6 +202,8 @@ void __pipe_cb(void *, void *buffer, unsigned int)
         __run_ended(vd);
     else if (g_strcmp0(message, "meta_changed") == 0)
         __meta_changed(vd);
+    else if (std::strncmp(message, "thumb.", 6) == 0)
+        __cloud_thumbnail_arrived(vd, static_cast<uint32_t>(std::strtoul(message + 6, nullptr, 10)));
     else
         __item_message(vd, message);
 }
@@ -210,7 +225,7 @@ void __uploading_file_mutil_cancel(UploadItem *item, UploadViewData *vd)
             elm_object_item_del(item->gen_it);
         item->gen_it = nullptr;
         const bool was_running = seen == UPLOAD_STATE_UPLOADING;
-        const int result = was_running ? cloud_content_sync_cancel(vd->ad->sync_handle, vd->req_id) : 0;
+        const int result = was_running ? cloud_content_sync_cancel(vd->ad->sync_handle, item->request) : 0;
         __worker_wake();
         if (result != 0) {
             VELORA_LOGE("cloud_content_sync_cancel failed");
@@ -227,6 +242,12 @@ void __uploading_file_mutil_cancel(UploadItem *item, UploadViewData *vd)
         _velora_common_pipe_send_msg(vd->pipe, "end");
 }
 
+static void __cancel_job(void *data)
+{
+    if (UploadViewData *vd = s_vd)
+        __uploading_file_mutil_cancel(__upload_item_find(vd, GPOINTER_TO_INT(data)), vd);
+}
+
 void __upload_file_cancel_cb(void *data, Evas_Object *, void *)
 {
     auto *record = static_cast<ItemData *>(data);
@@ -240,7 +261,8 @@ void __upload_file_cancel_cb(void *data, Evas_Object *, void *)
         return;
     }
     VELORA_LOGI("-------To cancel: %d", record->index);
-    __uploading_file_mutil_cancel(__upload_item_find(vd, record->index), vd);
+    // The list may be at work on the row whose button this is; it must not lose the row before it is done.
+    ecore_job_add(__cancel_job, GINT_TO_POINTER(record->index));
 }
 
 static void __cancel_fail_popup(void *data, Evas_Object *, void *)

@@ -123,11 +123,10 @@ static bool __transfer(UploadViewData *vd, UploadItem *item)
     item->request = req_id;
     if (refused != 0) // no request, so no callback
         __transfer_report(vd, item, UPLOAD_STATE_FAILED, 0, refused);
-    else if (item->state == UPLOAD_STATE_CANCELED) // before the main loop could know the request
-        cloud_content_sync_cancel(vd->ad->sync_handle, req_id);
     while (__is_under_way(item) && !s_is_stopping)
         static_cast<void>(s_wake.try_acquire_for(std::chrono::seconds(1)));
-    if (s_is_stopping)
+    // A cancel on the main loop may come before it can know the request; nothing of it may run on behind our back.
+    if (refused == 0 && !__is_end_state(item->state))
         cloud_content_sync_cancel(vd->ad->sync_handle, req_id);
     // The last callback may still be on its way out; the item and the view are its until then.
     while (s_callbacks > 0)

@@ -1,5 +1,6 @@
 // GLib's sources on the Ecore main loop.
 #include "app/glib_loop.h"
+#include "driver.h"
 #include <Ecore.h>
 #include <Ecore_Evas.h>
 #include <Evas.h>
@@ -21,10 +22,12 @@ int counting(int n, fd_set *r, fd_set *w, fd_set *x, timeval *t)
 
 class Loop : public testing::Test {
   protected:
+    static void SetUpTestSuite()
+    {
+        driver::start();
+    }
     void SetUp() override
     {
-        setenv("EINA_LOG_LEVELS", "eldbus:0,eina_safety:0,ecore_system_upower:0,ecore_system_systemd:0", 0);
-        ecore_evas_init();
         glib_loop_start();
         bridge = ecore_main_loop_select_func_get();
         ecore_main_loop_select_func_set(counting);
@@ -34,7 +37,6 @@ class Loop : public testing::Test {
     {
         ecore_main_loop_select_func_set(bridge);
         glib_loop_stop();
-        ecore_evas_shutdown();
     }
 };
 

@@ -278,7 +278,7 @@ def main():
             number, name = futures[future]
             wrong, words = future.result()
             failed += bool(wrong)
-            print(f"{'not ok' if wrong else 'ok'} {number} - {name}")
+            print(f"{'not ok' if wrong else 'ok'} - {name}")  # unnumbered: they end in any order
             for word in ([wrong] if wrong else []) + words:
                 print("#", word.replace("\n", "\n# "))
             sys.stdout.flush()
