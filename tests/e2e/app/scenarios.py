@@ -15,7 +15,7 @@ import time
 
 from person import FOLDER, Person, check, wait_for
 
-GONE = "Upload failed · The file is gone or cannot be read"
+GONE = "Upload failed · File not readable"
 
 
 def hostile_names(person):
