@@ -86,7 +86,7 @@ std::string Accounts::issue_token(const std::string &email)
     return insert.done() && sqlite3_changes(db->handle.get()) == 1 ? token : "";
 }
 
-Account *Accounts::by_id(long long id)
+Account *Accounts::find(long long id)
 {
     Stmt row(*db, "SELECT email, display_name, quota FROM accounts WHERE id = ?");
     if (!row.bind(1, id).row())
@@ -110,7 +110,7 @@ Account *Accounts::by_token(const std::string &token)
 {
     const std::string hash = hex(sha256(token));
     Stmt row(*db, "SELECT account, hash FROM tokens WHERE hash = ?");
-    return row.bind(1, hash).row() && equal_in_constant_time(row.text(1), hash) ? by_id(row.integer(0)) : nullptr;
+    return row.bind(1, hash).row() && equal_in_constant_time(row.text(1), hash) ? find(row.integer(0)) : nullptr;
 }
 
 Account *Accounts::by_password(const std::string &email, const std::string &password)
@@ -128,7 +128,7 @@ Account *Accounts::by_password(const std::string &email, const std::string &pass
             proved.clear();
         proved.insert(proof);
     }
-    return by_id(row.integer(0));
+    return find(row.integer(0));
 }
 
 Account *Accounts::authorize(const char *header)

@@ -38,9 +38,10 @@ class Accounts {
     // Reads the value of an Authorization header (RFC 6750 Bearer, RFC 7617 Basic; null is allowed). Null when it
     // proves nothing. The account stays valid and at its address for the object's life.
     Account *authorize(const char *header);
+    // Null when there is no such account.
+    Account *find(long long id);
 
   private:
-    Account *by_id(long long id);
     Account *by_token(const std::string &token);
     Account *by_password(const std::string &email, const std::string &password);
 

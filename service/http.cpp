@@ -177,13 +177,14 @@ void refuse(Request &request, int status)
     lingering->read_on();
 }
 
-void in_thread(Request &request, std::function<void()> work, std::function<void()> done)
+void in_thread(Request &request, std::function<void()> work, std::function<void()> done, Workers *workers)
 {
     request.jobs++;
     soup_server_message_pause(request.message);
     // The message, and the request with it, outlives its connection until the job is done.
     g_object_ref(request.message);
-    request.service->workers.run(std::move(work), [&request, done = std::move(done)] {
+    Workers &those = workers ? *workers : request.service->workers;
+    those.run(std::move(work), [&request, done = std::move(done)] {
         SoupServerMessage *message = request.message;
         request.jobs--;
         done();
@@ -216,11 +217,20 @@ static void account_info(Request &request)
     request.answer(200, "application/json", json.text(0) + "\n");
 }
 
-static void handle(Request &request)
+static Area area_of(const char *path)
+{
+    if (std::strcmp(path, "/1/account/info") == 0)
+        return Area::ACCOUNT_INFO;
+    if (std::strcmp(path, "/1/media") == 0)
+        return Area::MEDIA_ADDRESS;
+    if (std::strcmp(path, "/1/thumbnail") == 0)
+        return Area::THUMBNAIL;
+    return std::strncmp(path, "/1/media/", 9) == 0 ? Area::MEDIA : Area::DAV;
+}
+
+static void handle_dav(Request &request)
 {
     const std::string method = request.method();
-    if (!request.is_dav)
-        return account_info(request);
     if (method == "PUT")
         return put_finish(request);
     if (method == "OPTIONS")
@@ -243,6 +253,22 @@ static void handle(Request &request)
         return dav_unlock(request);
     request.set_header("Allow", ALLOWED);
     request.answer(405);
+}
+
+static void handle(Request &request)
+{
+    switch (request.area) {
+    case Area::DAV:
+        return handle_dav(request);
+    case Area::ACCOUNT_INFO:
+        return account_info(request);
+    case Area::MEDIA_ADDRESS:
+        return media_address(request);
+    case Area::MEDIA:
+        return media_get(request);
+    case Area::THUMBNAIL:
+        return thumbnail(request);
+    }
 }
 
 static Request &request_of(SoupServerMessage *message)
@@ -289,12 +315,19 @@ static void on_headers(SoupServer *, SoupServerMessage *message, const char *, G
     g_socket_set_option(socket, IPPROTO_TCP, TCP_KEEPCNT, 4, nullptr);
 
     const char *path = g_uri_get_path(soup_server_message_get_uri(message));
-    request->is_dav = std::strcmp(path, "/1/account/info") != 0;
-    const int wrong = request->is_dav ? parse_path(path, request->path) : 0;
+    request->area = area_of(path);
+    const bool is_dav = request->area == Area::DAV;
+    const int wrong = is_dav ? parse_path(path, request->path) : 0;
     if (g_uri_get_fragment(soup_server_message_get_uri(message)))
         return refuse(*request, 400);
     if (wrong == 404)
         return refuse(*request, 404);
+    if (request->area == Area::MEDIA) {
+        request->account = media_account(*request);
+        if (!request->account)
+            refuse(*request, 403);
+        return;
+    }
     request->account = request->service->accounts.authorize(request->header("Authorization"));
     if (!request->account) {
         soup_message_headers_append(soup_server_message_get_response_headers(message), "WWW-Authenticate",
@@ -305,9 +338,9 @@ static void on_headers(SoupServer *, SoupServerMessage *message, const char *, G
     }
     if (wrong)
         return refuse(*request, wrong);
-    if (const int status = request->is_dav ? check_if_header(*request) : 0)
+    if (const int status = is_dav ? check_if_header(*request) : 0)
         return refuse(*request, status);
-    if (request->is_dav && std::strcmp(request->method(), "PUT") == 0)
+    if (is_dav && std::strcmp(request->method(), "PUT") == 0)
         return put_begin(*request);
     if (soup_message_headers_get_content_length(soup_server_message_get_request_headers(message)) > BODY_AT_MOST)
         refuse(*request, 413);

@@ -20,17 +20,24 @@ struct Service {
     Metadata metadata;
     Locks locks;
     Fd files, temporary; // the folders of the accounts and of unfinished work, on one file system
+    Fd thumbnails;
+    std::string media_secret; // of the signatures of addresses
     Faults faults;
-    Workers workers;
+    Workers workers{4};
+    Workers painters{2}; // of thumbnails: bounds their memory, and leaves time for others
 };
 
 struct Upload;
+
+// What an address belongs to. MEDIA proves by its signature who allowed it, all others by credentials.
+enum class Area { DAV, ACCOUNT_INFO, MEDIA_ADDRESS, MEDIA, THUMBNAIL };
+
 struct Request {
     Service *service = nullptr;
     SoupServerMessage *message = nullptr; // borrowed: the request lives as long as the message
     Account *account = nullptr;           // borrowed
-    Path path;                            // empty for addresses outside /dav/
-    bool is_dav = false;
+    Path path;                            // of the file or folder; empty until the address or the body has named it
+    Area area = Area::DAV;
     std::vector<std::string> tokens; // of locks, that the request has named
     Upload *upload = nullptr;        // owned; of a PUT whose body is being received
     int jobs = 0;                    // on other threads, for this request
@@ -82,7 +89,8 @@ enum class Reach { CONTENT, NAME, NAME_AND_BELOW };
 bool may_change(Request &request, const Path &path, Reach reach);
 // Runs `work` on another thread while the request waits, then `done` on the main loop; `done` answers, or calls this
 // again. Both run also when the client has gone meanwhile. `work` must touch nothing that the main loop uses.
-void in_thread(Request &request, std::function<void()> work, std::function<void()> done);
+// `workers` null: those of the service.
+void in_thread(Request &request, std::function<void()> work, std::function<void()> done, Workers *workers = nullptr);
 std::string http_date(int64_t nanoseconds);
 // The value of a Repr-Digest header (RFC 9530) for 64 hexadecimal digits.
 std::string repr_digest(const std::string &sha256_hex);
@@ -104,3 +112,14 @@ void put_begin(Request &request);
 void put_chunk(Request &request, GBytes *chunk);
 void put_finish(Request &request);
 void put_drop(Request &request);
+
+// The addresses of media.cpp and thumbnails.cpp. media_open makes the secret when it is missing; false when the
+// database fails. media_account reads the path of a signed address; null when the signature does not prove it, or no
+// more.
+bool media_open(Service &service);
+void media_address(Request &request);
+Account *media_account(Request &request);
+void media_get(Request &request); // and HEAD
+void thumbnail(Request &request);
+// Removes thumbnails that nobody has asked for in a month.
+void thumbnails_sweep(const Service &service);

@@ -91,14 +91,15 @@ static bool open_service(const std::string &root, Service &service, Fd &root_fol
     root_folder = Fd(open(root.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     service.files = root_folder ? folder_in(root_folder.fd, "files") : Fd();
     service.temporary = root_folder ? folder_in(root_folder.fd, "tmp") : Fd();
-    if (!service.files || !service.temporary) {
+    service.thumbnails = root_folder ? folder_in(root_folder.fd, "thumbnails") : Fd();
+    if (!service.files || !service.temporary || !service.thumbnails) {
         reason = "cannot use " + root + ": " + g_strerror(errno);
         return false;
     }
     const std::string database = root + "/velora-cloud.db";
     close(open(database.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600)); // it holds password hashes
     if (service.db.open(database, nullptr) && service.accounts.open(service.db, service.files.fd) &&
-        service.metadata.open(service.db))
+        service.metadata.open(service.db) && media_open(service))
         return true;
     reason = "cannot open " + database;
     return false;
@@ -122,6 +123,7 @@ static int run(Service &service, const Fd &root_folder, const char *listen_at)
     if (!lock || flock(lock.fd, LOCK_EX | LOCK_NB) != 0)
         return complain(EXIT_TROUBLE, "another velora-cloud serves this folder");
     remove_temporary_files(service);
+    thumbnails_sweep(service);
     struct rlimit files;
     if (getrlimit(RLIMIT_NOFILE, &files) == 0) {
         files.rlim_cur = files.rlim_max;
@@ -157,7 +159,7 @@ static int run(Service &service, const Fd &root_folder, const char *listen_at)
     g_main_loop_run(loop);
     soup_server_disconnect(server);
     g_object_unref(server);
-    while (service.workers.busy())
+    while (service.workers.busy() || service.painters.busy())
         g_main_context_iteration(nullptr, TRUE);
     g_main_loop_unref(loop);
     remove_temporary_files(service);

@@ -93,3 +93,15 @@ int parse_path(const char *uri_path, Path &path)
     }
     return 0;
 }
+
+int parse_plain_path(const std::string &text, Path &path)
+{
+    std::string encoded = "/dav/";
+    for (const char &c : text) {
+        if (c == '/')
+            encoded += c;
+        else
+            append_encoded(encoded, std::string_view(&c, 1));
+    }
+    return parse_path(encoded.c_str(), path);
+}

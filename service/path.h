@@ -35,3 +35,5 @@ bool valid_name(const std::string &name);
 // Reads the path of a URI as it was sent ("/dav/a%20b"). The result is 0, or the HTTP status that says what is wrong
 // with it: 404 not below /dav, 400 not a path of ours, 414 a name over 255 bytes or over 128 names.
 int parse_path(const char *uri_path, Path &path);
+// The same for a path below the account's root that is not encoded ("/a b").
+int parse_plain_path(const std::string &text, Path &path);

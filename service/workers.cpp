@@ -4,8 +4,6 @@
 #include <sys/eventfd.h>
 #include <unistd.h>
 
-static const size_t THREADS = 4;
-
 // GLib's own thread pool would do, but ThreadSanitizer cannot see how it hands over.
 void Workers::start()
 {
@@ -17,7 +15,7 @@ void Workers::start()
             return G_SOURCE_CONTINUE;
         },
         this);
-    for (size_t i = 0; i < THREADS; i++)
+    for (size_t i = 0; i < count; i++)
         threads.emplace_back(&Workers::take_jobs, this);
 }
 
@@ -69,8 +67,8 @@ void Workers::take_jobs()
 
 void Workers::finish_jobs()
 {
-    uint64_t count;
-    if (read(wake_up, &count, sizeof count) < 0)
+    uint64_t times;
+    if (read(wake_up, &times, sizeof times) < 0)
         return;
     std::deque<Job> jobs;
     {

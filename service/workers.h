@@ -9,7 +9,7 @@
 
 class Workers {
   public:
-    Workers() = default;
+    explicit Workers(size_t thread_count) : count(thread_count) {}
     // Every job that was started must be done: see busy().
     ~Workers();
     Workers(const Workers &) = delete;
@@ -36,6 +36,7 @@ class Workers {
     std::condition_variable something_to_do;
     std::deque<Job> waiting, finished;
     bool ending = false;
+    const size_t count;
     std::vector<std::thread> threads;
     int wake_up = -1; // an eventfd by which the main loop learns of finished jobs
     unsigned watch = 0;

@@ -112,6 +112,23 @@ bool Account::insert(const ContentRow &content)
     return insert_content(stmt, content);
 }
 
+std::optional<ContentRow> Account::content_at(const std::string &parent, const std::string &name)
+{
+    std::scoped_lock lock(reading);
+    Stmt stmt(reader, "SELECT size, mtime, etag FROM content WHERE parent = ? AND name = ?");
+    if (!stmt.bind(1, parent).bind(2, name).row())
+        return {};
+    return ContentRow{parent, name, stmt.integer(0), stmt.integer(1), stmt.text(2)};
+}
+
+bool Account::update(const ContentRow &row)
+{
+    std::scoped_lock lock(writing);
+    Stmt stmt(writer, "UPDATE content SET size = ?, mtime = ?, etag = ? WHERE parent = ? AND name = ?");
+    stmt.bind(1, row.size).bind(2, row.mtime).bind(3, row.etag).bind(4, row.parent).bind(5, row.name);
+    return stmt.done();
+}
+
 std::string Account::complete_for()
 {
     std::scoped_lock lock(reading);

@@ -2,6 +2,7 @@
 // The metadata database of one service: the account's folder tree as the last refresh and later uploads left it.
 #include "base/base.h"
 #include <mutex>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -39,6 +40,9 @@ class Account {
     bool replace(const std::vector<FolderRow> &folders, const std::vector<ContentRow> &contents,
                  const std::vector<ContentRow> &later, const std::string &identity);
     bool insert(const ContentRow &content);
+    std::optional<ContentRow> content_at(const std::string &parent, const std::string &name);
+    // Changes the row of that parent and name; nothing when there is none.
+    bool update(const ContentRow &content);
 
     // The account (account_identity()) whose whole tree the database holds; empty when there is none.
     std::string complete_for();

@@ -1,6 +1,8 @@
 #include "cloud_content_sync/client.h"
+#include "cloud_content_sync/content.h"
 #include "cloud_content_sync/names.h"
 #include "cloud_content_sync/refresh.h"
+#include "cloud_content_sync/thumbnails.h"
 #include "cloud_content_sync/upload.h"
 #include <algorithm>
 #include <csignal>
@@ -10,7 +12,8 @@ namespace cloud {
 static constexpr auto TICK = std::chrono::milliseconds(1000); // how often stalled transfers are looked for
 
 Client::Client(Service description, std::shared_ptr<Account> database)
-    : service(std::move(description)), account(std::move(database)), http(service)
+    : contents(std::make_unique<Contents>(*this)), thumbnails(std::make_unique<Thumbnails>(*this)),
+      service(std::move(description)), account(std::move(database)), http(service)
 {
 }
 
@@ -54,6 +57,15 @@ void Client::upload(UploadRequest request, int *id)
         upload_queue.push_back(std::move(request));
     }
     http.wake();
+}
+
+int Client::new_request()
+{
+    std::scoped_lock lock(mutex);
+    if (stopping)
+        return 0;
+    live.insert(++last_id);
+    return last_id;
 }
 
 bool Client::cancel(int id)
@@ -210,10 +222,15 @@ void Client::loop()
     while (!is_stopping()) {
         step_refresh();
         step_upload();
+        contents->step();
+        // Nobody waits for a thumbnail, so it waits for everybody.
+        thumbnails->step(!running_upload && contents->is_idle());
         http.run(TICK);
     }
     running_upload.reset();
     running_refresh.reset();
+    contents->end();
+    thumbnails->end();
 }
 
 } // namespace cloud

@@ -17,7 +17,9 @@
 
 namespace cloud {
 
+class Contents;
 class Refresh;
+class Thumbnails;
 class Upload;
 
 struct UploadRequest {
@@ -51,13 +53,25 @@ class Client : public std::enable_shared_from_this<Client> {
     bool cancel(int id);
     void refresh(RefreshRequest request);
     std::optional<std::string> uploaded_path(int id);
+    // A new request's id, to be cancelled by; 0 after stop().
+    int new_request();
+    bool is_stopping();
+    bool on_own_thread() const
+    {
+        return std::this_thread::get_id() == thread_id;
+    }
+    const std::unique_ptr<Contents> contents;
+    const std::unique_ptr<Thumbnails> thumbnails;
 
     const Service service;
     const std::shared_ptr<Account> account;
 
-    // The client thread only, for Upload and Refresh.
+    // The client thread only, for what runs on it.
     Http http;
     bool is_wanted(int id); // neither cancelled nor stopped
+    // Around a callback of a request. False when the request is not wanted any more: there is no callback then.
+    bool begin_callback(int id, bool is_last);
+    void end_callback();
     void report_progress(const UploadRequest &request, int percent);
     // The request's last callback. False, and nothing done, when the request is not wanted any more.
     bool report_done(const UploadRequest &request, const ContentRow &stored);
@@ -70,13 +84,6 @@ class Client : public std::enable_shared_from_this<Client> {
     void loop();
     void step_upload();
     void step_refresh();
-    bool is_stopping();
-    bool begin_callback(int id, bool is_last);
-    void end_callback();
-    bool on_own_thread() const
-    {
-        return std::this_thread::get_id() == thread_id;
-    }
 
     std::mutex mutex;
     std::condition_variable callback_ended;

@@ -1,6 +1,9 @@
 #include "cloud_content_sync/cloud_content_sync.h"
+#include "cloud_content_sync/cache.h"
 #include "cloud_content_sync/client.h"
+#include "cloud_content_sync/content.h"
 #include "cloud_content_sync/names.h"
+#include "cloud_content_sync/thumbnails.h"
 #include <algorithm>
 #include <cstring>
 
@@ -13,11 +16,13 @@ struct cloud_content_sync_s {
 // Folders and contents hold the account, so they outlive the client's handle.
 struct cloud_content_sync_folder_s {
     std::shared_ptr<Account> account;
+    std::weak_ptr<cloud::Client> client;
     std::string path;
     std::string name;
 };
 
 struct cloud_content_sync_content_s {
+    std::weak_ptr<cloud::Client> client;
     cloud::ContentRow row;
 };
 
@@ -106,16 +111,18 @@ int cloud_content_sync_get_is_meta_complete(cloud_content_sync_h handle, bool *c
     return DONE;
 }
 
-static cloud_content_sync_folder_h folder_at(const std::shared_ptr<Account> &account, const std::string &path)
+static cloud_content_sync_folder_h folder_at(const std::shared_ptr<Account> &account,
+                                             const std::weak_ptr<cloud::Client> &client, const std::string &path)
 {
-    return new cloud_content_sync_folder_s{account, path, path == "/" ? account->service : cloud::name_of(path)};
+    return new cloud_content_sync_folder_s{account, client, path,
+                                           path == "/" ? account->service : cloud::name_of(path)};
 }
 
 int cloud_content_sync_folder_get_root(cloud_content_sync_h handle, cloud_content_sync_folder_h *folder)
 {
     if (!handle || !folder)
         return INVALID;
-    *folder = folder_at(handle->client->account, "/");
+    *folder = folder_at(handle->client->account, handle->client, "/");
     return DONE;
 }
 
@@ -131,7 +138,7 @@ int cloud_content_sync_get_folder_by_server_path(cloud_content_sync_h handle, co
         return INVALID;
     if (!handle->client->account->folder_exists(plain))
         return NOT_FOUND;
-    *folder = folder_at(handle->client->account, plain);
+    *folder = folder_at(handle->client->account, handle->client, plain);
     return DONE;
 }
 
@@ -142,7 +149,7 @@ int cloud_content_sync_folder_get_parent(cloud_content_sync_folder_h folder, clo
     const std::string path = cloud::parent_of(folder->path);
     if (folder->path == "/" || !folder->account->folder_exists(path))
         return NOT_FOUND;
-    *parent = folder_at(folder->account, path);
+    *parent = folder_at(folder->account, folder->client, path);
     return DONE;
 }
 
@@ -179,8 +186,9 @@ int cloud_content_sync_folder_foreach_children_folder(cloud_content_sync_h, clou
         return NOT_FOUND;
     // The callback may destroy `folder`, and no lock is held while it runs.
     const std::shared_ptr<Account> account = folder->account;
+    const std::weak_ptr<cloud::Client> client = folder->client;
     for (cloud::FolderRow &row : account->folders_of(folder->path)) {
-        cloud_content_sync_folder_s child{account, std::move(row.path), std::move(row.name)};
+        cloud_content_sync_folder_s child{account, client, std::move(row.path), std::move(row.name)};
         if (!cb(&child, DONE, user_data))
             break;
     }
@@ -194,8 +202,9 @@ int cloud_content_sync_folder_foreach_content_from_db(cloud_content_sync_h, clou
         return INVALID;
     if (!folder->account->folder_exists(folder->path))
         return NOT_FOUND;
+    const std::weak_ptr<cloud::Client> client = folder->client;
     for (cloud::ContentRow &row : folder->account->contents_of(folder->path)) {
-        cloud_content_sync_content_s content{std::move(row)};
+        cloud_content_sync_content_s content{client, std::move(row)};
         if (!cb(&content, DONE, user_data))
             break;
     }
@@ -241,13 +250,70 @@ int cloud_content_sync_content_get_is_thumbnail_exist(cloud_content_sync_content
 {
     if (!content || !exists)
         return INVALID;
-    *exists = false;
+    const auto client = content->client.lock();
+    *exists = client && client->thumbnails->find(content->row);
+    if (client && !*exists)
+        client->thumbnails->want(content->row);
     return DONE;
 }
 
 int cloud_content_sync_content_get_thumbnail_path(cloud_content_sync_content_h content, char **path)
 {
-    return content && path ? NOT_FOUND : INVALID;
+    if (!content || !path)
+        return INVALID;
+    const auto client = content->client.lock();
+    const auto file = client ? client->thumbnails->find(content->row) : std::nullopt;
+    return file ? give(*file, path) : NOT_FOUND;
+}
+
+int cloud_content_sync_set_thumbnail_cb(cloud_content_sync_h handle, cloud_content_sync_thumbnail_cb cb,
+                                        void *user_data)
+{
+    if (!handle)
+        return INVALID;
+    handle->client->thumbnails->set_cb(cb, user_data);
+    return DONE;
+}
+
+static int ask(cloud_content_sync_content_h content, cloud::ContentRequest request, int *request_id)
+{
+    const auto client = content->client.lock();
+    const int id = client ? client->new_request() : 0;
+    if (!id)
+        return NOT_FOUND;
+    *request_id = id;
+    request.id = id;
+    request.row = content->row;
+    client->contents->add(std::move(request));
+    return DONE;
+}
+
+int cloud_content_sync_content_get_cached_file(cloud_content_sync_content_h content, int *request_id,
+                                               cloud_content_sync_result_cb cb, void *user_data)
+{
+    if (!content || !request_id)
+        return INVALID;
+    return ask(content, {.kind = cloud::ContentRequest::CACHED_FILE, .cb = cb, .user_data = user_data}, request_id);
+}
+
+int cloud_content_sync_content_get_streaming_url(cloud_content_sync_content_h content, int *request_id,
+                                                 cloud_content_sync_result_cb cb, void *user_data, int minutes)
+{
+    if (!content || !request_id || minutes <= 0)
+        return INVALID;
+    return ask(content,
+               {.kind = cloud::ContentRequest::STREAMING_ADDRESS, .cb = cb, .user_data = user_data, .minutes = minutes},
+               request_id);
+}
+
+int cloud_content_sync_content_download(cloud_content_sync_content_h content, const char *local_path, int *request_id,
+                                        cloud_content_sync_result_cb cb, void *user_data)
+{
+    if (!content || !local_path || !*local_path || !request_id)
+        return INVALID;
+    return ask(content,
+               {.kind = cloud::ContentRequest::DOWNLOAD, .cb = cb, .user_data = user_data, .local_path = local_path},
+               request_id);
 }
 
 int cloud_content_sync_upload(cloud_content_sync_h handle, const char *local_path, const char *server_path, int *req_id,
@@ -298,6 +364,8 @@ int cloud_content_sync_credentials_set(const char *service_name, const char *use
     const bool same_account = secret && account.complete_for() == cloud::account_identity(*service, credentials);
     if (!same_account && !account.clear())
         return CLOUD_CONTENT_SYNC_ERROR_DB_FAILED;
+    if (!same_account)
+        cloud::cache_clear(service_name);
     return cloud::credentials_store(service_name, secret ? &credentials : nullptr) ? DONE
                                                                                    : CLOUD_CONTENT_SYNC_ERROR_DB_FAILED;
 }

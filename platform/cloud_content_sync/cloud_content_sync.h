@@ -3,9 +3,10 @@
 //
 // The service is a WebDAV server (RFC 4918). It is found by its name in a description file, see README.md here.
 //
-// Threads. Every function may be called from any thread, also from within a callback. Transfer and refresh callbacks
-// run on the client's own thread, one per handle and one callback at a time; folder and content callbacks run on the
-// caller's thread, before the function returns. A callback that waits holds up the client's other transfers.
+// Threads. Every function may be called from any thread, also from within a callback. Callbacks of transfers,
+// refreshes, content requests and thumbnails run on the client's own thread, one per handle and one callback at a time;
+// those that list folders and contents run on the caller's thread, before the function returns. A callback that waits
+// holds up the client's other transfers.
 //
 // Results. Functions answer one of cloud_content_sync_error_e; output arguments are written only when it is 0. What
 // can only be known later, a missing account included, is reported by the callback.
@@ -108,9 +109,20 @@ int cloud_content_sync_content_get_name(cloud_content_sync_content_h content, ch
 int cloud_content_sync_content_get_size(cloud_content_sync_content_h content, long long *size);
 // IMAGE, VIDEO or NONE, by the extension of the name.
 int cloud_content_sync_content_get_content_type(cloud_content_sync_content_h content, int *type);
-// Always false and NOT_FOUND: thumbnails are not fetched.
+// Whether a thumbnail of the current version is in the client's cache; of its file the path, NOT_FOUND without one. It
+// is a JPEG or PNG picture, at most 256 pixels wide and high, in platform_data_dir()/cloud/thumbnails. When there is
+// none, asking for it has it fetched: a picture's, from a service that makes thumbnails, behind all uploads and
+// requests, what was asked for last first. Only the last 200 wait; what a service refuses is not asked for again by
+// this handle. Of the service's file as the last refresh knows it; false and NOT_FOUND once the client's handle is
+// destroyed.
 int cloud_content_sync_content_get_is_thumbnail_exist(cloud_content_sync_content_h content, bool *exists);
 int cloud_content_sync_content_get_thumbnail_path(cloud_content_sync_content_h content, char **path);
+// A thumbnail that was fetched is there now. Client thread; server_path is valid until the callback returns.
+typedef void (*cloud_content_sync_thumbnail_cb)(const char *server_path, void *user_data);
+// One callback per handle; null ends it. The former one does not run any more on return: if it is running it is waited
+// for, unless this is called from within it.
+int cloud_content_sync_set_thumbnail_cb(cloud_content_sync_h handle, cloud_content_sync_thumbnail_cb cb,
+                                        void *user_data);
 
 // Stores a local file at server_path, whose folder must exist. Returns at once; *req_id (above 0) is written before the
 // first callback. Uploads of one handle run one after the other, in the order in which they were asked for.
@@ -131,9 +143,9 @@ int cloud_content_sync_upload(cloud_content_sync_h handle, const char *local_pat
 // Where a finished upload really landed (it may be the next free name). Known until the handle is destroyed, and within
 // the last callback already; NOT_FOUND for a request that has not succeeded.
 int cloud_content_sync_get_uploaded_path(cloud_content_sync_h handle, int req_id, char **server_path);
-// Ends a queued or running upload, which then has no last callback. No callback of it runs any more on return: one that
-// is running is waited for, unless this is called from within it. What it has stored so far is removed. NOT_FOUND
-// when there is no such request or it has had its last callback.
+// Ends a queued or running upload or content request, which then has no last callback. No callback of it runs any more
+// on return: one that is running is waited for, unless this is called from within it. What it has stored so far is
+// removed. NOT_FOUND when there is no such request or it has had its last callback.
 int cloud_content_sync_cancel(cloud_content_sync_h handle, int req_id);
 
 // The credentials by which the device's user is known to a service, as a sign-in or a set-up tool leaves them.
@@ -142,3 +154,30 @@ int cloud_content_sync_cancel(cloud_content_sync_h handle, int req_id);
 // begin later use them. What the database holds of another account is removed. INVALID_PARAMETER for an empty user or
 // secret, for control characters, and for a user with a colon; NO_SERVICE; DB_FAILED when they cannot be stored.
 int cloud_content_sync_credentials_set(const char *service_name, const char *user, const char *secret);
+
+// The last, and only, callback of a request about one file. state: DONE, or FAILED with an error that is not 0. text:
+// the path or address that was asked for when it is DONE, else null; valid until the callback returns. status: the HTTP
+// status (RFC 9110, 15) of the service's last answer, 0 when it was not asked or did not answer. Client thread.
+typedef void (*cloud_content_sync_result_cb)(int state, const char *text, int status, int error, void *user_data);
+
+// All three return at once; *request_id (above 0) is written before the callback. Up to four run at the same time,
+// beside the uploads. The content may be destroyed right after the call. cb may be null. INVALID_PARAMETER for a null
+// or malformed argument, NOT_FOUND when the client's handle, from which the content came, is destroyed; there is no
+// request then. All else is reported by the callback: NO_ACCOUNT, NETWORK, UNAUTHORIZED, FORBIDDEN, SERVER, NOT_FOUND
+// (the service has no such file any more), CORRUPTED (the size or the SHA-256 is not what the service says, Repr-Digest
+// of RFC 9530), and LOCAL_FILE (it cannot be written, the disk is full).
+
+// The file's whole content in the client's cache, platform_data_dir()/cloud/cache, under a name of its own with the
+// file's extension. A version that is there already is answered without the service. The file belongs to the cache and
+// must not be changed; when the cache grows over 512 MiB what was used least recently is removed, and all of it when
+// somebody else signs in.
+int cloud_content_sync_content_get_cached_file(cloud_content_sync_content_h content, int *request_id,
+                                               cloud_content_sync_result_cb cb, void *user_data);
+// An address from which anyone can read the file without credentials, by HTTP with ranges, for `minutes` (above 0, and
+// at most as long as the service allows). SERVER from a service that has no such addresses.
+int cloud_content_sync_content_get_streaming_url(cloud_content_sync_content_h content, int *request_id,
+                                                 cloud_content_sync_result_cb cb, void *user_data, int minutes);
+// Stores the file at local_path, whose folder must exist, as a whole or not at all: a regular file of that name is
+// replaced when the content is complete. LOCAL_FILE when anything else has the name, a symbolic link for instance.
+int cloud_content_sync_content_download(cloud_content_sync_content_h content, const char *local_path, int *request_id,
+                                        cloud_content_sync_result_cb cb, void *user_data);

@@ -103,6 +103,26 @@ int Transfer::error() const
     }
 }
 
+std::string sha256_of(const std::string &repr_digest)
+{
+    static constexpr char START[] = "sha-256=:";
+    const size_t start = repr_digest.find(START);
+    if (start == repr_digest.npos)
+        return "";
+    const size_t begin = start + sizeof START - 1;
+    const size_t end = repr_digest.find(':', begin);
+    if (end == repr_digest.npos)
+        return "";
+    gsize size = 0;
+    g_autofree guchar *bytes = g_base64_decode(repr_digest.substr(begin, end - begin).c_str(), &size);
+    std::string hex;
+    for (gsize i = 0; i < size; i++) {
+        static constexpr char DIGITS[] = "0123456789abcdef";
+        hex.append({DIGITS[bytes[i] >> 4], DIGITS[bytes[i] & 15]});
+    }
+    return hex;
+}
+
 Http::Http(const Service &description) : service(description), multi(nullptr, curl_multi_cleanup)
 {
     static const CURLcode initialised = curl_global_init(CURL_GLOBAL_DEFAULT);
@@ -159,7 +179,8 @@ Transfer *Http::start(std::unique_ptr<Transfer> owned, const Credentials &creden
     transfer.stall_limit = std::chrono::seconds(service.stall_seconds);
     transfer.last_activity = std::chrono::steady_clock::now();
 
-    curl_easy_setopt(easy, CURLOPT_URL, (service.storage + percent_encode(transfer.path)).c_str());
+    const std::string url = transfer.url.empty() ? service.storage + percent_encode(transfer.path) : transfer.url;
+    curl_easy_setopt(easy, CURLOPT_URL, url.c_str());
     curl_easy_setopt(easy, CURLOPT_PATH_AS_IS, 1L);
     curl_easy_setopt(easy, CURLOPT_PROTOCOLS_STR, "http,https");
     curl_easy_setopt(easy, CURLOPT_FOLLOWLOCATION, 0L);

@@ -19,6 +19,7 @@ struct Transfer {
     // The request.
     std::string method;
     std::string path; // server path below the storage's root; a folder's ends in "/"
+    std::string url;  // instead of path: an address of the account interface
     std::vector<std::string> headers;
     std::string body;
     std::function<size_t(char *, size_t)> read; // instead of body: source of exactly body_size bytes, or READ_FAILED
@@ -48,6 +49,9 @@ struct Transfer {
     // One of cloud_content_sync_error_e for a request that did not succeed.
     int error() const;
 };
+
+// The SHA-256 among the digests of a Repr-Digest header (RFC 9530, 3) in hexadecimal digits, or "".
+std::string sha256_of(const std::string &repr_digest);
 
 class Http {
   public:

@@ -41,6 +41,11 @@ static bool load_description(GKeyFile *file, const std::string &name)
     return load(config_home + "/cloud-services") || load(CLOUD_SERVICES_DIR);
 }
 
+static bool is_http(const std::string &url)
+{
+    return g_str_has_prefix(url.c_str(), "http://") || g_str_has_prefix(url.c_str(), "https://");
+}
+
 std::optional<Service> service_find(const std::string &name)
 {
     g_autoptr(GKeyFile) file = g_key_file_new();
@@ -52,8 +57,10 @@ std::optional<Service> service_find(const std::string &name)
     service.ca_file = string_of(file, "Service", "CAFile");
     if (const int seconds = g_key_file_get_integer(file, "Service", "StallTimeout", nullptr); seconds > 0)
         service.stall_seconds = seconds;
-    if (!g_str_has_prefix(service.storage.c_str(), "http://") && !g_str_has_prefix(service.storage.c_str(), "https://"))
+    service.api = string_of(file, "Service", "Api");
+    if (!is_http(service.storage) || (!service.api.empty() && !is_http(service.api)))
         return {};
+    service.api.resize(service.api.find_last_not_of('/') + 1);
     const auto root = path_of_href(service.storage);
     if (!root)
         return {};

@@ -8,6 +8,7 @@ namespace cloud {
 struct Service {
     std::string name;
     std::string storage;   // root URL of the WebDAV tree, without a final "/"
+    std::string api;       // base URL of the account interface, without a final "/"; empty when there is none
     std::string root_path; // path of that URL as a server path
     std::string ca_file;   // certificates to trust instead of the system's, or empty
     int stall_seconds = 60;

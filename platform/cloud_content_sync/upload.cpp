@@ -190,27 +190,6 @@ void Upload::next_name_looked_at(const Look &result)
     try_next_name();
 }
 
-// "sha-256=:BASE64:" among other digests (RFC 9530, 3); the digest in hexadecimal digits, or "".
-static std::string sha256_of(const std::string &repr_digest)
-{
-    static constexpr char START[] = "sha-256=:";
-    const size_t start = repr_digest.find(START);
-    if (start == repr_digest.npos)
-        return "";
-    const size_t begin = start + sizeof START - 1;
-    const size_t end = repr_digest.find(':', begin);
-    if (end == repr_digest.npos)
-        return "";
-    gsize size = 0;
-    g_autofree guchar *bytes = g_base64_decode(repr_digest.substr(begin, end - begin).c_str(), &size);
-    std::string hex;
-    for (gsize i = 0; i < size; i++) {
-        static constexpr char DIGITS[] = "0123456789abcdef";
-        hex.append({DIGITS[bytes[i] >> 4], DIGITS[bytes[i] & 15]});
-    }
-    return hex;
-}
-
 void Upload::stored(const Transfer &transfer)
 {
     // 201: made by this request; 200 and 204 would mean that something was there and the condition was ignored.

@@ -93,7 +93,7 @@ static void __last_item_show_cb(void *)
 
 static void __path_bar_append(UploadViewData *vd, const char *label, const char *path)
 {
-    char *markup = elm_entry_utf8_to_markup(label);
+    char *markup = __one_line_markup(label);
     char *data = g_strdup(path);
     Elm_Object_Item *item = elm_toolbar_item_append(vd->toolbar, nullptr, markup, __toolbar_it_cb, data);
     elm_object_item_del_cb_set(item, __path_item_del_cb);
@@ -198,7 +198,7 @@ static bool __content_info_cb(cloud_content_sync_content_h content, int error, v
     record->name = g_strdup(name);
     record->file_name = g_strdup(name);
     std::free(name);
-    __row_append(list->vd, list->vd->itc_file, record, nullptr);
+    __row_append(list->vd, list->vd->itc_file, record, __select_item_to_launch_app);
     list->count++;
     return true;
 }

@@ -74,10 +74,13 @@ struct ItemData {
     bool is_selected = false;
     int type = ITEM_TYPE_CONTENT;
     char *path = nullptr; // owned; local path of an uploaded or failed file
+    unsigned handle = 0;  // by which a result finds the row; 0 before the first request
 };
 
 // The one view, or null. Set and cleared on the main loop; the client's thread reads it.
 extern std::atomic<UploadViewData *> s_vd;
+// Its pipe, or null: for callbacks that may come late, and need nothing else of the view.
+extern std::atomic<Ecore_Pipe *> s_view_pipe;
 
 // The text of an id in the language of the view, for texts that are not set on a widget for good.
 const char *__text(const char *id);
@@ -181,7 +184,16 @@ Evas_Object *__file_icon_create(Evas_Object *parent, ItemData *record, const cha
 // Forgets the media records that __get_local_thumbnail handed thumbnails out of.
 void __local_thumbnails_free();
 
+// upload_thumbnails.cpp
+// Has the rows' thumbnails told of when the client has fetched them, or no longer. The view's pipe must outlive that.
+void __cloud_thumbnails_watch(UploadViewData *vd, bool is_on);
+// "thumb.N": the row, when it is in sight, shows the thumbnail of the path that the handle N stands for.
+void __cloud_thumbnail_arrived(UploadViewData *vd, uint32_t handle);
+
 // upload_list.cpp: rows.
+// A name for a text of one line in the theme, to free: escaped, for the theme's texts are markup, and with the pictures
+// that Unicode has from U+2400 on for control characters. A line break as such makes Edje's layout run for ever.
+char *__one_line_markup(const char *text);
 Evas_Object *__genlist_create(UploadViewData *vd);
 void __item_classes_create(UploadViewData *vd);
 void __item_classes_free(UploadViewData *vd);
@@ -204,3 +216,10 @@ void __selection_row_tapped(UploadViewData *vd, ItemData *record, Elm_Object_Ite
 void __selection_title_refresh(UploadViewData *vd);
 // A layout with a check for the end of a row; *check is the check.
 Evas_Object *__check_create(Evas_Object *parent, bool is_on, Evas_Object **check);
+
+// upload_open.cpp: opening a file of the open cloud folder.
+struct ContentResultMessage;
+void __select_item_to_launch_app(void *data, Evas_Object *obj, void *event_info);
+void __content_result_handle(UploadViewData *vd, const ContentResultMessage &message);
+// A row is going away: results that are still on their way no longer find it.
+void __content_row_forget(ItemData *record);

@@ -5,6 +5,7 @@
 #include "velora_upload_file/upload_internal.h"
 #include <Ecore_File.h>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 
 static Eina_Bool __idler_load_cb(void *data)
@@ -179,7 +180,7 @@ static void __meta_changed(UploadViewData *vd)
     elm_scroller_region_show(vd->genlist, x, y, w, h);
 }
 
-void __pipe_cb(void *, void *buffer, unsigned int)
+void __pipe_cb(void *, void *buffer, unsigned int size)
 {
     UploadViewData *vd = s_vd;
     if (!vd) {
@@ -190,6 +191,10 @@ void __pipe_cb(void *, void *buffer, unsigned int)
         VELORA_LOGE("Invalid argument: buffer is NULL");
         return;
     }
+    if (ContentResultMessage result; _velora_common_is_content_result(buffer, size, &result)) {
+        __content_result_handle(vd, result);
+        return;
+    }
     const auto *message = static_cast<const char *>(buffer);
     if (g_strcmp0(message, "storage_full") == 0)
         __storage_full(vd);
@@ -197,6 +202,8 @@ void __pipe_cb(void *, void *buffer, unsigned int)
         __run_ended(vd);
     else if (g_strcmp0(message, "meta_changed") == 0)
         __meta_changed(vd);
+    else if (std::strncmp(message, "thumb.", 6) == 0)
+        __cloud_thumbnail_arrived(vd, static_cast<uint32_t>(std::strtoul(message + 6, nullptr, 10)));
     else
         __item_message(vd, message);
 }

@@ -38,7 +38,6 @@ struct MetaRefresh {
     AppData *ad = nullptr;
     std::atomic<int> error = 0;
     std::atomic<Ecore_Pipe *> main_pipe = nullptr;
-    std::atomic<Ecore_Pipe *> view_pipe = nullptr;
 };
 static MetaRefresh s_refresh;
 
@@ -47,9 +46,10 @@ static void __velora_refresh_cb(int status, int error, void *)
     if (status < 3 || status > 5)
         return;
     s_refresh.error = error;
-    if (s_refresh.ad->is_meta_refreshed.exchange(true))
-        _velora_common_pipe_send_msg(s_refresh.view_pipe, "meta_changed");
-    else
+    if (s_refresh.ad->is_meta_refreshed.exchange(true)) {
+        if (Ecore_Pipe *pipe = s_view_pipe)
+            _velora_common_pipe_send_msg(pipe, "meta_changed");
+    } else
         _velora_common_pipe_send_msg(s_refresh.main_pipe, "refresh_meta_done");
 }
 
@@ -58,7 +58,6 @@ void __meta_refresh_start(UploadViewData *vd)
     s_refresh.ad = vd->ad;
     s_refresh.error = 0;
     s_refresh.main_pipe = vd->ad->pipe;
-    s_refresh.view_pipe = vd->pipe;
     bool is_complete = false;
     if (cloud_content_sync_get_is_meta_complete(vd->ad->sync_handle, &is_complete) != 0)
         is_complete = false;

@@ -2,6 +2,7 @@
 #include "velora_common/velora_local_data.h"
 #include "velora_common/velora_paths.h"
 #include "velora_upload_file/upload_internal.h"
+#include <cstdlib>
 #include <cstring>
 #include <map>
 #include <string>

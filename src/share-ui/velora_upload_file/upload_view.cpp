@@ -10,6 +10,9 @@
 #include <cstring>
 
 std::atomic<UploadViewData *> s_vd = nullptr;
+std::atomic<Ecore_Pipe *> s_view_pipe = nullptr;
+
+static void __more_create_folder_cb(void *data, Evas_Object *obj, void *event_info);
 
 static void __more_create_folder_cb(void *data, Evas_Object *obj, void *event_info);
 
@@ -43,7 +46,7 @@ void __title_set(UploadViewData *vd, const char *id)
 void __pipe_ensure(UploadViewData *vd)
 {
     if (!vd->pipe)
-        vd->pipe = _velora_common_pipe_add(__pipe_cb, vd);
+        s_view_pipe = vd->pipe = _velora_common_pipe_add(__pipe_cb, vd);
 }
 
 void __destroy_view(UploadViewData *vd)
@@ -64,6 +67,8 @@ void __destroy_view(UploadViewData *vd)
     if (vd->folder)
         cloud_content_sync_folder_destroy(vd->folder);
     _velora_common_local_data_disconnect();
+    __cloud_thumbnails_watch(vd, false);
+    s_view_pipe = nullptr;
     if (vd->pipe)
         _velora_common_pipe_del(vd->pipe);
     if (vd->select_all_genlist)
@@ -326,6 +331,7 @@ void _velora_upload_view_create(AppData *ad)
     if (ad->launch_mode == LAUNCH_MODE_SHARE && !__share_create(vd))
         return;
     __pipe_ensure(vd);
+    __cloud_thumbnails_watch(vd, true);
     __meta_refresh_start(vd);
     if (ad->is_meta_refreshed)
         _velora_upload_view_update();

@@ -3,6 +3,7 @@
 #include "bus.h"
 #include "notification/notification.h"
 #include "support.h"
+#include <csignal>
 #include <map>
 #include <sys/wait.h>
 
@@ -10,6 +11,8 @@ namespace {
 
 constexpr const char *PACKAGE = "com.example.poster";
 constexpr const char *DAEMON = "org.freedesktop.Notifications";
+
+std::vector<pid_t> ongoing_posters;
 
 class Agent : public PlatformTest {
   protected:
@@ -29,6 +32,11 @@ class Agent : public PlatformTest {
 
     void TearDown() override
     {
+        for (const pid_t poster : ongoing_posters) {
+            kill(poster, SIGTERM);
+            waitpid(poster, nullptr, 0);
+        }
+        ongoing_posters.clear();
         daemon.reset();
         bus.reset(); // which ends the agent
         PlatformTest::TearDown();
@@ -106,7 +114,8 @@ class Agent : public PlatformTest {
     }
 };
 
-// A process posts and ends, and the id of its notification is all that is left of it.
+// A process posts and ends, and the id of its notification is all that is left of it. That of an ongoing notification
+// stays until the test ends.
 int post(notification_type_e type, const char *title, const char *content, int flags)
 {
     int ends[2];
@@ -121,6 +130,10 @@ int post(notification_type_e type, const char *title, const char *content, int f
     int id = 0, status = -1;
     EXPECT_EQ(read(ends[0], &id, sizeof id), static_cast<ssize_t>(sizeof id));
     close(ends[0]);
+    if (type == NOTIFICATION_TYPE_ONGOING) {
+        ongoing_posters.push_back(poster);
+        return id;
+    }
     waitpid(poster, &status, 0);
     EXPECT_EQ(status, 0);
     return id;

@@ -1,4 +1,5 @@
-// Posts a notification, writes its id to a file descriptor, and leaves: FD TYPE TITLE CONTENT FLAGS.
+// Posts a notification and writes its id to a file descriptor: FD TYPE TITLE CONTENT FLAGS. Leaves then, unless the
+// notification is an ongoing one, which would leave with its poster: that one waits to be ended.
 #include "app/app_control.h"
 #include "notification/notification.h"
 #include <cstdlib>
@@ -23,5 +24,8 @@ int main(int, char **argv)
     int id = 0;
     const int result = notification_insert(noti, &id);
     notification_free(noti);
-    return result == 0 && write(std::atoi(argv[1]), &id, sizeof id) == sizeof id ? 0 : 1;
+    const bool told = result == 0 && write(std::atoi(argv[1]), &id, sizeof id) == sizeof id;
+    if (told && std::atoi(argv[2]) == NOTIFICATION_TYPE_ONGOING)
+        pause();
+    return told ? 0 : 1;
 }

@@ -57,7 +57,9 @@ bool FakeClient::call(const Job &job, int state, int progress, int error, const 
         cloud.permits--;
     if (state != CLOUD_CONTENT_SYNC_STATE_RUNNING)
         live.erase(job.id);
-    calling = job.id;
+    calling = job.kind == Job::THUMBNAIL ? -1 : job.id;
+    const auto told = job.kind == Job::THUMBNAIL ? thumbnail_cb : nullptr;
+    void *const told_data = thumbnail_data;
     if (commit)
         commit();
     lock.unlock();
@@ -65,6 +67,10 @@ bool FakeClient::call(const Job &job, int state, int progress, int error, const 
         job.transfer_cb(state, 1, progress, error, job.user_data);
     if (job.refresh_cb)
         job.refresh_cb(state, error, job.user_data);
+    if (job.result_cb)
+        job.result_cb(state, error ? nullptr : job.local.c_str(), job.status, error, job.user_data);
+    if (told)
+        told(job.server.c_str(), told_data);
     lock.lock();
     calling = 0;
     cloud.changed.notify_all();
@@ -152,7 +158,12 @@ void FakeClient::loop()
             if (!is_wanted(job))
                 continue;
         }
-        job.id ? run_upload(job) : run_refresh(job);
+        if (job.kind == Job::THUMBNAIL)
+            run_thumbnail(job);
+        else if (job.kind != Job::TRANSFER)
+            run_content(std::move(job));
+        else
+            job.id ? run_upload(job) : run_refresh(job);
     }
 }
 
@@ -182,7 +193,8 @@ void FakeClient::add(Job job, int *id)
     if (job.id) {
         *id = job.id = ++last_id;
         live.insert(job.id);
-        fake().log.push_back(job.local + " -> " + job.server);
+        if (job.kind == Job::TRANSFER)
+            fake().log.push_back(job.local + " -> " + job.server);
     }
     jobs.push_back(job);
     fake().changed.notify_all();
@@ -223,10 +235,24 @@ void fake_cloud_reset()
         cloud.complete = cloud.held = false;
         cloud.reachable = cloud.signed_in = true;
         cloud.permits = cloud.delay = cloud.uploads_sent = cloud.refresh_error = cloud.create_error = 0;
+        cloud.content_error = 0;
+        cloud.cached.clear();
+        cloud.thumbnails.clear();
+        cloud.fetched_thumbnails.clear();
         cloud.upload_errors.clear();
         cloud.percentages = fresh.percentages;
         cloud.log.clear();
     });
+}
+
+void fake_cloud_fail_content(int error)
+{
+    change([&](FakeCloud &cloud) { cloud.content_error = error; });
+}
+
+void fake_cloud_add_thumbnail(const std::string &path, const std::string &picture)
+{
+    change([&](FakeCloud &cloud) { cloud.thumbnails[path] = picture; });
 }
 
 void fake_cloud_add_folder(const std::string &path)

@@ -34,9 +34,14 @@ void fake_cloud_fail_create(int error);
 
 // The percentages that an upload reports on its way; 0, 50 and 100 at first.
 void fake_cloud_set_percentages(const std::vector<int> &percentages);
+// Requests about single files: the next one ends with this error.
+void fake_cloud_fail_content(int error);
+// The service makes this picture, a file, the thumbnail of the file at `path`: the client has it once it was asked for.
+void fake_cloud_add_thumbnail(const std::string &path, const std::string &picture);
+
 // A pause before each callback of an upload, in milliseconds.
 void fake_cloud_set_delay(int milliseconds);
-// While held, no upload or refresh calls back, except for as many callbacks as are let through.
+// While held, nothing calls back, except for as many callbacks as are let through.
 void fake_cloud_hold(bool hold);
 void fake_cloud_let_through(int callbacks);
 

@@ -8,22 +8,15 @@
 
 using namespace cloud;
 
-struct cloud_content_sync_s {
-    std::shared_ptr<FakeClient> client;
-    std::string service;
-};
 struct cloud_content_sync_folder_s {
     std::string service, path;
-};
-struct cloud_content_sync_content_s {
-    std::string name;
-    long long size;
+    std::weak_ptr<FakeClient> client;
 };
 
 static constexpr int INVALID = CLOUD_CONTENT_SYNC_ERROR_INVALID_PARAMETER;
 static constexpr int NOT_FOUND = CLOUD_CONTENT_SYNC_ERROR_NOT_FOUND;
 
-static int give(const std::string &text, char **out)
+int give(const std::string &text, char **out)
 {
     *out = strdup(text.c_str());
     return 0;
@@ -110,7 +103,7 @@ int cloud_content_sync_folder_get_root(cloud_content_sync_h handle, cloud_conten
 {
     if (!handle || !folder)
         return INVALID;
-    *folder = new cloud_content_sync_folder_s{handle->service, "/"};
+    *folder = new cloud_content_sync_folder_s{handle->service, "/", handle->client};
     return 0;
 }
 
@@ -126,7 +119,7 @@ int cloud_content_sync_get_folder_by_server_path(cloud_content_sync_h handle, co
         return INVALID;
     if (!is_known_folder(plain))
         return NOT_FOUND;
-    *folder = new cloud_content_sync_folder_s{handle->service, plain};
+    *folder = new cloud_content_sync_folder_s{handle->service, plain, handle->client};
     return 0;
 }
 
@@ -136,7 +129,7 @@ int cloud_content_sync_folder_get_parent(cloud_content_sync_folder_h folder, clo
         return INVALID;
     if (folder->path == "/" || !is_known_folder(parent_of(folder->path)))
         return NOT_FOUND;
-    *parent = new cloud_content_sync_folder_s{folder->service, parent_of(folder->path)};
+    *parent = new cloud_content_sync_folder_s{folder->service, parent_of(folder->path), folder->client};
     return 0;
 }
 
@@ -184,7 +177,7 @@ int cloud_content_sync_folder_foreach_children_folder(cloud_content_sync_h, clou
         std::scoped_lock lock(fake().mutex);
         for (const std::string &path : fake().known_folders)
             if (path != "/" && parent_of(path) == folder->path)
-                rows.push_back({folder->service, path});
+                rows.push_back({folder->service, path, folder->client});
     }
     sort_by_name(rows, [](const auto &row) { return name_of(row.path); });
     for (auto &row : rows)
@@ -205,61 +198,13 @@ int cloud_content_sync_folder_foreach_content_from_db(cloud_content_sync_h, clou
         std::scoped_lock lock(fake().mutex);
         for (const auto &[path, size] : fake().known_files)
             if (parent_of(path) == folder->path)
-                rows.push_back({name_of(path), size});
+                rows.push_back({path, size, folder->client});
     }
-    sort_by_name(rows, [](const auto &row) { return row.name; });
+    sort_by_name(rows, [](const auto &row) { return name_of(row.path); });
     for (auto &row : rows)
         if (!cb(&row, 0, user_data))
             break;
     return 0;
-}
-
-int cloud_content_sync_content_clone(cloud_content_sync_content_h *copy, cloud_content_sync_content_h content)
-{
-    if (!copy || !content)
-        return INVALID;
-    *copy = new cloud_content_sync_content_s(*content);
-    return 0;
-}
-
-int cloud_content_sync_content_destroy(cloud_content_sync_content_h content)
-{
-    delete content;
-    return content ? 0 : INVALID;
-}
-
-int cloud_content_sync_content_get_name(cloud_content_sync_content_h content, char **name)
-{
-    return content && name ? give(content->name, name) : INVALID;
-}
-
-int cloud_content_sync_content_get_size(cloud_content_sync_content_h content, long long *size)
-{
-    if (!content || !size)
-        return INVALID;
-    *size = content->size;
-    return 0;
-}
-
-int cloud_content_sync_content_get_content_type(cloud_content_sync_content_h content, int *type)
-{
-    if (!content || !type)
-        return INVALID;
-    *type = content_type_of(content->name);
-    return 0;
-}
-
-int cloud_content_sync_content_get_is_thumbnail_exist(cloud_content_sync_content_h content, bool *exists)
-{
-    if (!content || !exists)
-        return INVALID;
-    *exists = false;
-    return 0;
-}
-
-int cloud_content_sync_content_get_thumbnail_path(cloud_content_sync_content_h content, char **path)
-{
-    return content && path ? NOT_FOUND : INVALID;
 }
 
 int cloud_content_sync_upload(cloud_content_sync_h handle, const char *local_path, const char *server_path, int *req_id,
