@@ -75,12 +75,13 @@ def follow_upload(device, pictures, application, launch):
     """Shows the ongoing notification move until the result is there."""
     told, moments = None, ["uploading-as-a-notification", "uploading-as-a-list"] if pictures else []
     end = time.monotonic() + 3600
-    while time.monotonic() < end:
+    stuck = time.monotonic() + 120 if pictures else end
+    while time.monotonic() < min(end, stuck):
         lines = device.notifications()
         ongoing = next((line for line in lines if "\tongoing\t" in line), None)
         result = next((line for line in lines if "\tnormal\t" in line), None)
         if ongoing and ongoing != told:
-            told = ongoing
+            told, stuck = ongoing, time.monotonic() + 120 if pictures else end
             show_progress(ongoing)
             if moments:
                 pictures.take(moments.pop(0))

@@ -63,9 +63,6 @@ class Device:
             VELORA_MEDIA_ROOT=os.path.join(self.home, "media"),
             ORVANT_INSPECT="1",
         )
-        if language:
-            self.env["LANGUAGE"] = language
-            self.env["LANG"] = "C.UTF-8"
         if scale:
             self.env["ELM_SCALE"] = str(scale)
         if dark:
@@ -73,6 +70,8 @@ class Device:
         for name in ("XDG_CONFIG_HOME", "XDG_DATA_HOME", "XDG_CACHE_HOME", "CLOUD_SERVICES_DIR", "VELORA_MEDIA_ROOT"):
             os.makedirs(self.env[name], exist_ok=True)
         self.log = os.path.join(self.home, "log.txt")
+        if language:
+            self.setting("db/menu_widget/language", language)
 
     def program(self, path):
         return os.path.join(self.build, path)

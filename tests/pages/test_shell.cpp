@@ -1,22 +1,10 @@
 // The shell: which page a request opens, and who is answered at the end. Each case is a whole run of the application;
 // the pages are stand-ins that write down that they were opened.
-#include "account/account.h"
-#include "base/base.h"
-#include "driver.h"
-#include "fake_app.h"
+#include "application.h"
 #include "main/velora_pending_pages.h"
-#include "notification/notification.h"
-#include "temp_home.h"
-#include "vconf/vconf.h"
-#include "velora_common/velora_popup.h"
-#include "velora_common/velora_thread.h"
+#include "posted.h"
 #include "velora_common/velora_upload_item.h"
 #include "velora_upload_file/velora_upload_view.h"
-#include <gtest/gtest.h>
-
-#include <utility>
-
-int velora_main(int argc, char **argv);
 
 namespace {
 struct Opened {
@@ -27,7 +15,7 @@ struct Opened {
 };
 std::vector<Opened> opened;
 AppData *app; // the application's one record
-int view_updates, view_ends, view_abandons;
+int view_ends, view_abandons;
 
 void page_opened(const char *page, AppData *ad)
 {
@@ -60,10 +48,7 @@ void _velora_upload_view_create(AppData *ad)
 {
     page_opened("upload", ad);
 }
-void _velora_upload_view_update()
-{
-    view_updates++;
-}
+void _velora_upload_view_update() {}
 void _velora_upload_view_end()
 {
     view_ends++;
@@ -75,60 +60,18 @@ void _velora_upload_view_abandon()
 
 namespace {
 
-class Shell : public testing::Test {
+constexpr const char *add = APP_CONTROL_OPERATION_ACCOUNT_ADD, *configure = APP_CONTROL_OPERATION_ACCOUNT_CONFIGURE,
+                     *share = APP_CONTROL_OPERATION_SHARE, *shares = APP_CONTROL_OPERATION_MULTI_SHARE,
+                     *tap = APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD,
+                     *result_tap = APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD_RESULT;
+constexpr const char *wizard = "Setup_Wizard_Velora_Signin";
+
+class Shell : public Application {
   protected:
-    void SetUp() override
+    Shell()
     {
-        driver::start();
-        platform_package_set(VELORA_PACKAGE);
-        vconf_set_str("memory/connection/type", "wifi");
-        fake_app::clear();
         opened.clear();
-        view_updates = view_ends = view_abandons = 0;
-    }
-    void TearDown() override
-    {
-        fake_app::clear();
-    }
-
-    static int run(std::function<void()> script)
-    {
-        char name[] = "velora";
-        char *arguments[] = {name, nullptr};
-        fake_app::run(std::move(script));
-        return velora_main(1, arguments);
-    }
-
-    struct Wish {
-        const char *operation = nullptr, *launch_mode = nullptr, *uri = nullptr;
-        std::vector<const char *> paths;
-        const char *display_type = nullptr, *sender = "com.example.sender";
-    };
-    static void request(const Wish &wish)
-    {
-        app_control_h request = fake_app::receive(wish.operation, wish.sender);
-        app_control_set_uri(request, wish.uri);
-        for (const auto &[key, value] :
-             {std::pair{"launch_mode", wish.launch_mode}, {"display_type", wish.display_type}})
-            if (value)
-                app_control_add_extra_data(request, key, value);
-        const bool is_result = g_strcmp0(wish.operation, APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD_RESULT) == 0;
-        std::vector<const char *> paths = wish.paths;
-        app_control_add_extra_data_array(request, is_result ? "path" : APP_CONTROL_DATA_PATH, paths.data(),
-                                         static_cast<int>(paths.size()));
-        fake_app::request(request);
-        app_control_destroy(request);
-    }
-    static void add_account()
-    {
-        account_h account = nullptr;
-        int id = 0;
-        account_connect();
-        account_create(&account);
-        account_set_user_name(account, "ann@example.com");
-        account_insert_to_db(account, &id);
-        account_destroy(account);
-        account_disconnect();
+        view_ends = view_abandons = 0;
     }
     // "SENDER RESULT EXTRA" of each reply, in the order in which they were sent.
     static std::vector<std::string> replies()
@@ -144,16 +87,12 @@ class Shell : public testing::Test {
         }
         return all;
     }
-
-    TempHome home;
-    LogCatcher log;
 };
 
 } // namespace
 
 TEST_F(Shell, OpensThePageThatARequestIsFor)
 {
-    const std::string prefix = APP_CONTROL_OPERATION_PREFIX;
     const struct {
         Wish wish;
         bool has_account;
@@ -166,28 +105,20 @@ TEST_F(Shell, OpensThePageThatARequestIsFor)
         {{.launch_mode = "whatever"}, false, "details", 4, {}},
         {{.launch_mode = "velora_signin"}, false, "details", 4, {}},
         {{.launch_mode = "Velora_Signin"}, true, "sign-in", 1, {}},
-        {{.launch_mode = "Setup_Wizard_Velora_Signin"}, false, "welcome", 2, {}},
+        {{.launch_mode = wizard}, false, "welcome", 2, {}},
         {{.launch_mode = "Setup_Wizard_Velora_Signin2"}, false, "camera upload", 3, {}},
         {{.operation = "http://example.com/other", .launch_mode = "Velora_Signin"}, false, "sign-in", 1, {}},
-        {{.operation = APP_CONTROL_OPERATION_ACCOUNT_ADD, .launch_mode = "Velora_Details"}, true, "sign-in", 5, {}},
-        {{.operation = APP_CONTROL_OPERATION_ACCOUNT_CONFIGURE}, false, "details", 6, {}},
-        {{.operation = APP_CONTROL_OPERATION_SHARE, .uri = "file:///a/b.jpg"}, true, "upload", 7, {"/a/b.jpg"}},
-        {{.operation = APP_CONTROL_OPERATION_SHARE, .uri = "/a/b 100%.jpg"}, true, "upload", 7, {"/a/b 100%.jpg"}},
-        {{.operation = APP_CONTROL_OPERATION_SHARE, .uri = "/a"}, false, "sign-in", 7, {"/a"}},
-        {{.operation = APP_CONTROL_OPERATION_SHARE}, true, "upload", 7, {}},
-        {{.operation = APP_CONTROL_OPERATION_MULTI_SHARE, .paths = {"/b", "file:///a", "/b"}},
-         true,
-         "upload",
-         7,
-         {"/b", "/a", "/b"}},
-        {{.operation = APP_CONTROL_OPERATION_MULTI_SHARE}, true, "upload", 7, {}},
-        {{.operation = APP_CONTROL_OPERATION_MULTI_SHARE}, false, "sign-in", 7, {}},
-        {{.operation = APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD}, true, nullptr, 0, {}},
-        {{.operation = APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD_RESULT, .paths = {"/x"}, .display_type = "fail"},
-         true,
-         "upload",
-         8,
-         {"/x"}},
+        {{.operation = add, .launch_mode = "Velora_Details"}, true, "sign-in", 5, {}},
+        {{.operation = configure}, false, "details", 6, {}},
+        {{.operation = share, .uri = "file:///a/b.jpg"}, true, "upload", 7, {"/a/b.jpg"}},
+        {{.operation = share, .uri = "/a/b 100%.jpg"}, true, "upload", 7, {"/a/b 100%.jpg"}},
+        {{.operation = share, .uri = "/a"}, false, "sign-in", 7, {"/a"}},
+        {{.operation = share}, true, "upload", 7, {}},
+        {{.operation = shares, .paths = {"/b", "file:///a", "/b"}}, true, "upload", 7, {"/b", "/a", "/b"}},
+        {{.operation = shares}, true, "upload", 7, {}},
+        {{.operation = shares}, false, "sign-in", 7, {}},
+        {{.operation = tap}, true, nullptr, 0, {}},
+        {{.operation = result_tap, .paths = {"/x"}, .display_type = "fail"}, true, "upload", 8, {"/x"}},
     };
     for (const auto &c : cases) {
         SCOPED_TRACE(testing::Message() << (c.wish.operation ? c.wish.operation : "no operation") << " "
@@ -213,17 +144,15 @@ TEST_F(Shell, ALaterRequestUsesTheSameWindow)
 {
     add_account();
     run([&] {
-        request({.launch_mode = "Setup_Wizard_Velora_Signin"});
+        request({.launch_mode = wizard});
         Evas_Object *window = app->win_main;
         EXPECT_TRUE(app->is_welcome_shown);
         app->exit_on_pause = 1;
-        request({.operation = APP_CONTROL_OPERATION_MULTI_SHARE, .paths = {"/a", "/b"}});
+        request({.operation = shares, .paths = {"/a", "/b"}});
         EXPECT_EQ(app->win_main, window);
         EXPECT_EQ(app->exit_on_pause, 0);
         EXPECT_FALSE(app->is_welcome_shown);
-        request({.operation = APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD_RESULT,
-                 .paths = {"file:///c"},
-                 .display_type = "success"});
+        request({.operation = result_tap, .paths = {"file:///c"}, .display_type = "success"});
         ASSERT_EQ(opened.size(), 3u);
         EXPECT_EQ(opened[2].queue, std::vector<std::string>{"/c"}) << "a result takes the queue's place";
         EXPECT_STREQ(app->display_type, "success");
@@ -235,58 +164,25 @@ TEST_F(Shell, ALaterRequestUsesTheSameWindow)
 
 TEST_F(Shell, AnswersThoseWhoWait)
 {
-    constexpr const char *share = APP_CONTROL_OPERATION_SHARE, *configure = APP_CONTROL_OPERATION_ACCOUNT_CONFIGURE,
-                         *notification = APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD,
-                         *result = APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD_RESULT;
     const struct {
         const char *name;
         std::vector<Wish> wishes;
-        const char *reply_result; // what the page stores
-        bool is_settings_waiting;
-        const char *failing; // a call of the framework
         std::vector<std::string> replies;
+        const char *reply_result = nullptr; // what the page stores
+        const char *failing = nullptr;      // a call of the framework
+        bool is_settings_waiting = false;
     } cases[] = {
-        {"share", {{.operation = share, .sender = "a"}}, nullptr, false, nullptr, {"a succeeded -"}},
-        {"wizard",
-         {{.launch_mode = "Setup_Wizard_Velora_Signin", .sender = "a"}},
-         "rbutton_skip",
-         false,
-         nullptr,
-         {"a succeeded rbutton_skip"}},
-        {"settings", {{.operation = configure, .sender = "a"}}, "lbutton_click", false, nullptr, {"a canceled -"}},
-        {"settings that wait", {{.operation = configure, .sender = "a"}}, nullptr, true, nullptr, {"a succeeded -"}},
-        {"two shares",
-         {{.operation = share, .sender = "a"}, {.operation = share, .sender = "b"}},
-         nullptr,
-         false,
-         nullptr,
-         {"b succeeded -", "a succeeded -"}},
-        {"a share and taps on notifications",
-         {{.operation = share, .sender = "a"},
-          {.operation = notification, .sender = "n"},
-          {.operation = result, .sender = "r"}},
-         nullptr,
-         false,
-         nullptr,
-         {"n canceled -", "a succeeded -", "r canceled -"}},
-        {"no extra data to be had",
-         {{.operation = share, .sender = "a"}},
-         "x",
-         false,
-         "app_control_add_extra_data",
-         {"a succeeded -"}},
-        {"no reply to be had",
-         {{.operation = share, .sender = "a"}},
-         "x",
-         false,
-         "app_control_create",
-         {"a canceled -"}},
-        {"reply refused",
-         {{.operation = share, .sender = "a"}},
-         "x",
-         false,
-         "app_control_reply_to_launch_request",
-         {"a canceled -"}},
+        {"share", {{.operation = share, .sender = "a"}}, {"a succeeded -"}},
+        {"wizard", {{.launch_mode = wizard, .sender = "a"}}, {"a succeeded rbutton_skip"}, "rbutton_skip"},
+        {"settings", {{.operation = configure, .sender = "a"}}, {"a canceled -"}, "lbutton_click"},
+        {"settings that wait", {{.operation = configure, .sender = "a"}}, {"a succeeded -"}, nullptr, nullptr, true},
+        {"two", {{.operation = share, .sender = "a"}, {.operation = share}}, {"b succeeded -", "a succeeded -"}},
+        {"a share, and taps",
+         {{.operation = share, .sender = "a"}, {.operation = tap}, {.operation = result_tap, .sender = "r"}},
+         {"b canceled -", "a succeeded -", "r canceled -"}},
+        {"no extra data", {{.operation = share}}, {"b succeeded -"}, "x", "app_control_add_extra_data"},
+        {"no reply", {{.operation = share}}, {"b canceled -"}, "x", "app_control_create"},
+        {"refused", {{.operation = share}}, {"b canceled -"}, "x", "app_control_reply_to_launch_request"},
     };
     add_account();
     for (const auto &c : cases) {
@@ -316,7 +212,7 @@ TEST_F(Shell, AShareWithoutANetworkLeavesAPopupWhoseCancelExits)
     vconf_set_str("memory/connection/type", "none");
     add_account();
     run([&] {
-        request({.operation = APP_CONTROL_OPERATION_SHARE, .uri = "/a", .sender = "a"});
+        request({.operation = share, .uri = "/a", .sender = "a"});
         EXPECT_TRUE(opened.empty());
         ASSERT_NE(app->popup, nullptr);
         EXPECT_EQ(app->upload_list, nullptr);
@@ -329,8 +225,7 @@ TEST_F(Shell, AShareWithoutANetworkLeavesAPopupWhoseCancelExits)
 
 TEST_F(Shell, PauseAndTerminateTidyUp)
 {
-    const int codes[] = {0, 1};
-    for (const int exit_on_pause : codes) {
+    for (const bool exit_on_pause : {false, true}) {
         run([&] {
             request({});
             app->exit_on_pause = exit_on_pause;
@@ -339,38 +234,12 @@ TEST_F(Shell, PauseAndTerminateTidyUp)
             notification_insert(noti, &app->noti_priv_id);
             notification_free(noti);
             fake_app::pause();
-            fake_app::resume();
-            EXPECT_EQ(app->win_main == nullptr, exit_on_pause != 0);
-            if (!exit_on_pause)
-                _velora_app_exit(app);
+            EXPECT_EQ(app->win_main == nullptr, exit_on_pause);
+            _velora_app_exit(app);
             fake_app::resume(); // after the exit
         });
         EXPECT_EQ(app->noti_priv_id, -1);
-        int left = 0;
-        notification_foreach(
-            nullptr,
-            [](notification_h, int, void *data) {
-                ++*static_cast<int *>(data);
-                return true;
-            },
-            &left);
-        EXPECT_EQ(left, 0);
+        EXPECT_TRUE(read_posted(nullptr).empty());
     }
-    EXPECT_GE(view_ends, 2);
     EXPECT_EQ(view_abandons, 2);
-}
-
-TEST_F(Shell, HearsThatTheTreeIsRefreshed)
-{
-    run([&] {
-        request({});
-        app->popup = _velora_common_create_processing_popup(app->win_main, nullptr, nullptr);
-        _velora_common_pipe_send_msg(app->pipe, "something else");
-        driver::settle();
-        EXPECT_NE(app->popup, nullptr);
-        _velora_common_pipe_send_msg(app->pipe, "refresh_meta_done");
-        EXPECT_TRUE(driver::run_until([] { return view_updates == 1; }));
-        EXPECT_EQ(app->popup, nullptr);
-        _velora_app_exit(app);
-    });
 }

@@ -62,8 +62,7 @@ TEST_F(Browser, WalksDownAndBackUp)
         press_back(); // at the root: the way out
         EXPECT_TRUE(wait_for_exit());
     });
-    ASSERT_EQ(fake_app::replies().size(), 1u);
-    EXPECT_EQ(fake_app::replies()[0].result, APP_CONTROL_RESULT_SUCCEEDED);
+    EXPECT_TRUE(is_answered());
 }
 
 TEST_F(Browser, JumpsByThePathBar)
@@ -95,34 +94,6 @@ TEST_F(Browser, JumpsByThePathBar)
         ASSERT_TRUE(tap_path("Alpha"));
         _velora_app_exit(s_vd.load()->ad); // with the jump still to come
     });
-}
-
-TEST_F(Browser, AFolderThatIsGoneLeavesNoneOpen)
-{
-    run([&] {
-        share({"new.txt"});
-        for (const char *name : {"Alpha", "Beta"})
-            ASSERT_TRUE(enter(name));
-        fake_cloud_remove("/Alpha");
-        fake_cloud_refresh_now();
-        ASSERT_TRUE(tap_path("Alpha"));
-        ASSERT_TRUE(jump_over());
-        EXPECT_EQ(folder(), "(none)");
-        press_back(); // does not crash; the root is one tap away
-        ASSERT_TRUE(s_vd.load());
-        EXPECT_TRUE(is_over() || !s_vd.load()->thread);
-    });
-}
-
-TEST_F(Browser, CancelLeavesAndTellsTheSender)
-{
-    run([&] {
-        share({"new.txt"});
-        ASSERT_TRUE(driver::click(s_vd.load()->cancel_btn));
-        EXPECT_TRUE(wait_for_exit());
-    });
-    EXPECT_EQ(fake_app::replies().size(), 1u);
-    EXPECT_TRUE(fake_cloud_upload_log().empty());
 }
 
 TEST_F(Browser, WaitsForTheFirstRefresh)
@@ -232,13 +203,6 @@ TEST_F(Browser, ShowsNoRawTextIdInAnyLanguage)
             share({"a.txt"});
             wait_for([] { return s_vd.load()->state && !s_vd.load()->ad->popup; });
             look(); // cannot be reached
-        });
-        fake_cloud_reset();
-        fake_cloud_set_signed_in(false);
-        run([&] {
-            share({"a.txt"});
-            wait_for([] { return s_vd.load()->state && !s_vd.load()->ad->popup; });
-            look(); // signed out
         });
         fake_cloud_reset();
         fake_cloud_refresh_now();

@@ -1,35 +1,22 @@
 #pragma once
 // The upload view inside a whole run of the application: real widgets, real notifications, a cloud that the test steps.
-#include "account/account.h"
-#include "base/base.h"
-#include "driver.h"
-#include "fake_app.h"
+#include "application.h"
 #include "fake_cloud.h"
 #include "posted.h"
-#include "temp_home.h"
-#include "vconf/vconf.h"
 #include "velora_upload_file/upload_internal.h"
-#include <gtest/gtest.h>
 
 #include <algorithm>
 #include <clocale>
-#include <cstring>
 #include <fstream>
 #include <map>
 
-int velora_main(int argc, char **argv);
-
-class UploadPage : public testing::Test {
+class UploadPage : public Application {
   protected:
     void SetUp() override
     {
         setlocale(LC_ALL, "C.UTF-8");
         setenv("LANGUAGE", "en", 1);
-        driver::start();
-        platform_package_set(VELORA_PACKAGE);
-        vconf_set_str("memory/connection/type", "wifi");
         add_account();
-        fake_app::clear();
         fake_cloud_reset();
         driver::exit_requested();
         for (const char *folder : {"/Alpha", "/Alpha/Beta", "/Alpha/Beta/Gamma", "/R&D <b>", "/Velora"})
@@ -42,36 +29,22 @@ class UploadPage : public testing::Test {
         fake_cloud_hold(false);
         EXPECT_EQ(s_vd.load(), nullptr);
         EXPECT_EQ(fake_cloud_open_handles(), 0);
-        fake_app::clear();
         driver::settle();
     }
 
     // One run of the application. A script that has not left it by itself is made to.
-    void run(const std::function<void()> &script)
+    static void run(const std::function<void()> &script)
     {
-        char name[] = "velora";
-        char *arguments[] = {name, nullptr};
-        fake_app::run([this, &script] {
+        Application::run([&script] {
             script();
             if (s_vd)
                 _velora_app_exit(s_vd.load()->ad);
             driver::settle();
         });
-        velora_main(1, arguments);
     }
-
-    void request(const char *operation, const std::vector<std::string> &paths, const char *display_type = nullptr)
+    static void request(const Wish &wish)
     {
-        app_control_h request = fake_app::receive(operation, "gallery");
-        std::vector<const char *> array;
-        for (const std::string &path : paths)
-            array.push_back(path.c_str());
-        app_control_add_extra_data_array(request, display_type ? "path" : APP_CONTROL_DATA_PATH, array.data(),
-                                         static_cast<int>(array.size()));
-        if (display_type)
-            app_control_add_extra_data(request, "display_type", display_type);
-        fake_app::request(request);
-        app_control_destroy(request);
+        Application::request(wish);
         if (s_vd)
             app = s_vd.load()->ad;
         driver::settle();
@@ -79,24 +52,23 @@ class UploadPage : public testing::Test {
     // Local files of these names are shared; each holds its own name.
     void share(const std::vector<std::string> &names)
     {
-        std::vector<std::string> paths;
-        for (const std::string &name : names)
-            paths.push_back(local(name));
-        request(APP_CONTROL_OPERATION_MULTI_SHARE, paths);
+        request({.operation = APP_CONTROL_OPERATION_MULTI_SHARE, .paths = locals(names)});
     }
     void show_result(const std::vector<std::string> &names, const char *display_type)
     {
-        std::vector<std::string> paths;
-        for (const std::string &name : names)
-            paths.push_back(local(name));
-        request(APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD_RESULT, paths, display_type);
+        request({.operation = APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD_RESULT,
+                 .paths = locals(names),
+                 .display_type = display_type});
     }
-    std::string local(const std::string &name) const
+    std::vector<std::string> locals(std::vector<std::string> names) const
     {
         std::filesystem::create_directories(home.path + "/files");
-        std::string path = home.path + "/files/" + name;
-        std::ofstream(path) << name;
-        return path;
+        for (std::string &name : names) {
+            const std::string path = home.path + "/files/" + name;
+            std::ofstream(path) << name;
+            name = path;
+        }
+        return names;
     }
 
     static Evas_Object *window()
@@ -182,18 +154,16 @@ class UploadPage : public testing::Test {
         return wait_for([this] { return !s_vd.load() && !app->win_main; });
     }
 
-    // The posted notifications: the ongoing one as "TITLE: CONTENT", results with "DISPLAY_TYPE: NAME..." behind it.
     static std::vector<std::string> notifications()
     {
         std::vector<std::string> all;
-        for (const Posted &one : read_posted(VELORA_SHARE_PACKAGE)) {
-            all.push_back(one.title + ": " + one.content);
-            if (one.operation == APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD_RESULT)
-                all.back() += " " + one.display_type + ":";
-            for (const std::string &path : one.paths)
-                all.back() += std::string(" ") + __last_segment(path.c_str());
-        }
+        for (const Posted &one : read_posted(VELORA_SHARE_PACKAGE))
+            all.push_back(one.text);
         return all;
+    }
+    static bool is_answered() // the one who shared
+    {
+        return fake_app::replies().size() == 1 && fake_app::replies()[0].result == APP_CONTROL_RESULT_SUCCEEDED;
     }
     static std::string uploaded(const std::string &path)
     {
@@ -201,21 +171,6 @@ class UploadPage : public testing::Test {
     }
 
     static inline AppData *app; // the one record of the process
-    TempHome home;
-    LogCatcher log;
-
-  private:
-    static void add_account()
-    {
-        account_h account = nullptr;
-        int id = 0;
-        account_connect();
-        account_create(&account);
-        account_set_user_name(account, "ann@example.com");
-        account_insert_to_db(account, &id);
-        account_destroy(account);
-        account_disconnect();
-    }
 };
 
 using Texts = std::vector<std::string>;

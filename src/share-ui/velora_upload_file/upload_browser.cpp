@@ -93,7 +93,7 @@ static void __last_item_show_cb(void *)
 
 static void __path_bar_append(UploadViewData *vd, const char *label, const char *path)
 {
-    char *markup = elm_entry_utf8_to_markup(label);
+    char *markup = __one_line_markup(label);
     char *data = g_strdup(path);
     Elm_Object_Item *item = elm_toolbar_item_append(vd->toolbar, nullptr, markup, __toolbar_it_cb, data);
     elm_object_item_del_cb_set(item, __path_item_del_cb);

@@ -191,6 +191,9 @@ void __cloud_thumbnails_watch(UploadViewData *vd, bool is_on);
 void __cloud_thumbnail_arrived(UploadViewData *vd, uint32_t handle);
 
 // upload_list.cpp: rows.
+// A name for a text of one line in the theme, to free: escaped, for the theme's texts are markup, and with the pictures
+// that Unicode has from U+2400 on for control characters. A line break as such makes Edje's layout run for ever.
+char *__one_line_markup(const char *text);
 Evas_Object *__genlist_create(UploadViewData *vd);
 void __item_classes_create(UploadViewData *vd);
 void __item_classes_free(UploadViewData *vd);

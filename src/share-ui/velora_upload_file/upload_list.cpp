@@ -15,10 +15,25 @@ static bool __is_icon_part(const char *part)
     return __is_part(part, "elm.icon") || __is_part(part, "elm.icon.1");
 }
 
-// A name as a row shows it: passed through the translation, and escaped, for the theme's texts are markup.
+char *__one_line_markup(const char *text)
+{
+    char *valid = g_utf8_make_valid(text, -1);
+    std::string shown;
+    for (const char *c = valid; *c; c++) {
+        const auto byte = static_cast<unsigned char>(*c);
+        if (byte < 0x20)
+            shown += {'\xe2', '\x90', static_cast<char>(0x80 + byte)};
+        else
+            shown += *c;
+    }
+    g_free(valid);
+    return elm_entry_utf8_to_markup(shown.c_str());
+}
+
+// A name as a row shows it: passed through the translation.
 static char *__name_markup(const char *name)
 {
-    return name ? elm_entry_utf8_to_markup(__text(name)) : nullptr;
+    return name ? __one_line_markup(__text(name)) : nullptr;
 }
 
 static char *__ud_genlist_dir_text_get(void *data, Evas_Object *, const char *part)

@@ -35,16 +35,20 @@ class Person(Device):
         super().__init__(build)
         self.folder = os.path.join(self.home, "files")
         os.mkdir(self.folder)
-        self.start_service(*service)
-        self.make_folder(FOLDER)
-        if account:
-            self.sign_in()
-        self.start_display()
-        self.start_bus()
-        self.start_notification_daemon(in_sight=False)
-        self.setting("memory/connection/type", "wifi")
         self.application = None
         self.request = None
+        try:
+            self.start_service(*service)
+            self.make_folder(FOLDER)
+            if account:
+                self.sign_in()
+            self.start_display()
+            self.start_bus()
+            self.start_notification_daemon(in_sight=False)
+            self.setting("memory/connection/type", "wifi")
+        except Exception:
+            self.end()
+            raise
 
     def file(self, name, content=None, size=None):
         """Makes a file to share; its path. A name may have folders."""

@@ -1,20 +1,15 @@
 #pragma once
-// What a package has posted in the notification area, read back from the real store.
+// What a package has posted in the notification area, read back from the real store as text.
 #include "app/app_control.h"
 #include "notification/notification.h"
 #include <cstdlib>
 #include <string>
-#include <utility>
 #include <vector>
 
 struct Posted {
-    int id = 0, flags = 0, places = 0;
-    notification_type_e type = NOTIFICATION_TYPE_NONE;
-    notification_ly_type_e layout = NOTIFICATION_LY_NONE;
-    double progress = -1;
-    std::string title, content, info, when, icon, indicator;
-    std::string operation, app_id, activate, display_type; // of the request that a tap sends
-    std::vector<std::string> paths;
+    int id = 0;
+    std::string text;  // "TITLE: CONTENT", for a result with " DISPLAY_TYPE: NAME..." of its files
+    std::string looks; // "TYPE FLAGS PLACES LAYOUT PROGRESS INFO ICON INDICATOR OPERATION APP ACTIVATE"
 };
 
 // Takes a text that was given to the caller; "(null)" for none.
@@ -25,57 +20,61 @@ inline std::string taken(char *text)
     return result;
 }
 
-inline void read_request(notification_h noti, Posted &posted)
+inline std::string last_part(const std::string &path)
 {
-    bundle *text = nullptr;
+    return path.substr(path.rfind('/') + 1);
+}
+
+inline bool read_posted_one(notification_h noti, int id, void *data)
+{
+    const auto text_of = [noti](notification_text_type_e part) {
+        char *value = nullptr;
+        notification_get_text(noti, part, &value);
+        return taken(value);
+    };
+    const auto image_of = [noti](notification_image_type_e part) {
+        char *value = nullptr;
+        notification_get_image(noti, part, &value);
+        return last_part(taken(value));
+    };
+    notification_type_e type = NOTIFICATION_TYPE_NONE;
+    notification_ly_type_e layout = NOTIFICATION_LY_NONE;
+    int flags = 0, places = 0, count = 0;
+    double progress = -1;
+    bundle *launch = nullptr;
     app_control_h request = nullptr;
-    notification_get_execute_option(noti, NOTIFICATION_EXECUTE_TYPE_SINGLE_LAUNCH, &text);
-    if (!text || app_control_from_bundle(text, &request) != APP_CONTROL_ERROR_NONE)
-        return;
-    char *value = nullptr, **paths = nullptr;
-    int count = 0;
-    app_control_get_operation(request, &value);
-    posted.operation = taken(std::exchange(value, nullptr));
-    app_control_get_app_id(request, &value);
-    posted.app_id = taken(std::exchange(value, nullptr));
-    app_control_get_extra_data(request, "operation_type", &value);
-    posted.activate = taken(std::exchange(value, nullptr));
-    app_control_get_extra_data(request, "display_type", &value);
-    posted.display_type = taken(value);
+    char *operation = nullptr, *app = nullptr, *activate = nullptr, *display_type = nullptr, **paths = nullptr;
+    notification_get_type(noti, &type);
+    notification_get_property(noti, &flags);
+    notification_get_display_applist(noti, &places);
+    notification_get_layout(noti, &layout);
+    notification_get_progress(noti, &progress);
+    notification_get_execute_option(noti, NOTIFICATION_EXECUTE_TYPE_SINGLE_LAUNCH, &launch);
+    app_control_from_bundle(launch, &request);
+    app_control_get_operation(request, &operation);
+    app_control_get_app_id(request, &app);
+    app_control_get_extra_data(request, "operation_type", &activate);
+    app_control_get_extra_data(request, "display_type", &display_type);
     app_control_get_extra_data_array(request, "path", &paths, &count);
-    for (int i = 0; i < count; i++)
-        posted.paths.push_back(taken(paths[i]));
-    free(paths);
     app_control_destroy(request);
+    Posted posted = {id, text_of(NOTIFICATION_TEXT_TYPE_TITLE) + ": " + text_of(NOTIFICATION_TEXT_TYPE_CONTENT), ""};
+    posted.text += display_type ? " " + taken(display_type) + ":" : "";
+    for (int i = 0; i < count; i++)
+        posted.text += " " + last_part(taken(paths[i]));
+    free(paths);
+    for (const int number :
+         {static_cast<int>(type), flags, places, static_cast<int>(layout), static_cast<int>(progress * 100)})
+        posted.looks += std::to_string(number) + " ";
+    posted.looks += text_of(NOTIFICATION_TEXT_TYPE_INFO_1) + " " + image_of(NOTIFICATION_IMAGE_TYPE_ICON) + " " +
+                    image_of(NOTIFICATION_IMAGE_TYPE_ICON_FOR_INDICATOR) + " " + last_part(taken(operation)) + " " +
+                    taken(app) + " " + taken(activate);
+    static_cast<std::vector<Posted> *>(data)->push_back(posted);
+    return true;
 }
 
 inline std::vector<Posted> read_posted(const char *package)
 {
-    const auto read = [](notification_h noti, int id, void *data) {
-        Posted posted = {.id = id};
-        notification_get_type(noti, &posted.type);
-        notification_get_property(noti, &posted.flags);
-        notification_get_display_applist(noti, &posted.places);
-        notification_get_layout(noti, &posted.layout);
-        notification_get_progress(noti, &posted.progress);
-        char *value = nullptr;
-        for (const auto &[part, to] : {std::pair{NOTIFICATION_TEXT_TYPE_TITLE, &posted.title},
-                                       {NOTIFICATION_TEXT_TYPE_CONTENT, &posted.content},
-                                       {NOTIFICATION_TEXT_TYPE_INFO_1, &posted.info},
-                                       {NOTIFICATION_TEXT_TYPE_INFO_SUB_2, &posted.when}}) {
-            notification_get_text(noti, part, &value);
-            *to = taken(std::exchange(value, nullptr));
-        }
-        for (const auto &[part, to] : {std::pair{NOTIFICATION_IMAGE_TYPE_ICON, &posted.icon},
-                                       {NOTIFICATION_IMAGE_TYPE_ICON_FOR_INDICATOR, &posted.indicator}}) {
-            notification_get_image(noti, part, &value);
-            *to = taken(std::exchange(value, nullptr));
-        }
-        read_request(noti, posted);
-        static_cast<std::vector<Posted> *>(data)->push_back(posted);
-        return true;
-    };
     std::vector<Posted> all;
-    notification_foreach(package, read, &all);
+    notification_foreach(package, read_posted_one, &all);
     return all;
 }
