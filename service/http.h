@@ -121,5 +121,5 @@ void media_address(Request &request);
 Account *media_account(Request &request);
 void media_get(Request &request); // and HEAD
 void thumbnail(Request &request);
-// Removes thumbnails that nobody has asked for in a month.
-void thumbnails_sweep(const Service &service);
+// Prepares for thumbnail(), and removes those that nobody has asked for in a month.
+void thumbnails_begin(const Service &service);

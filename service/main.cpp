@@ -123,7 +123,7 @@ static int run(Service &service, const Fd &root_folder, const char *listen_at)
     if (!lock || flock(lock.fd, LOCK_EX | LOCK_NB) != 0)
         return complain(EXIT_TROUBLE, "another velora-cloud serves this folder");
     remove_temporary_files(service);
-    thumbnails_sweep(service);
+    thumbnails_begin(service);
     struct rlimit files;
     if (getrlimit(RLIMIT_NOFILE, &files) == 0) {
         files.rlim_cur = files.rlim_max;

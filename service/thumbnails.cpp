@@ -14,8 +14,9 @@ static const int64_t PIXELS_AT_MOST = 64 << 20; // 256 MiB while it is decoded
 static const size_t THUMBNAIL_AT_MOST = 8 << 20;
 static const int SIZE_LEAST = 16, SIZE_MOST = 1024;
 
-void thumbnails_sweep(const Service &service)
+void thumbnails_begin(const Service &service)
 {
+    g_slist_free(gdk_pixbuf_get_formats()); // reads the table of decoders before there are threads
     std::vector<Entry> entries;
     list_folder(service.thumbnails.fd, entries);
     const int64_t oldest = static_cast<int64_t>(time(nullptr)) * 1000000000 - KEPT_FOR;

@@ -16,7 +16,7 @@ class Workers {
     Workers &operator=(const Workers &) = delete;
 
     // Runs `work` on a thread of the pool, then `done` on the main loop. From the main loop only. `work` must touch
-    // nothing that the main loop uses meanwhile, and nothing of GLib.
+    // nothing that the main loop uses meanwhile, and no GLib object of anybody else's.
     void run(std::function<void()> work, std::function<void()> done);
     // Whether a `done` is still to come. From the main loop only.
     bool busy() const
