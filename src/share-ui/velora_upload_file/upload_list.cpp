@@ -66,8 +66,9 @@ static char *__ud_genlist_file_text_get(void *data, Evas_Object *, const char *p
     std::string text = __text("IDS_CLOUD_POP_UPLOAD_FAILED");
     UploadViewData *vd = s_vd;
     const UploadItem *item = vd ? __upload_item_find(vd, record->index) : nullptr;
-    if (item && item->error != 0) // why, when that is known
-        text = text + " · " + __failure_text(item->error);
+    const char *why = item && item->error != 0 ? __failure_text(item->error) : nullptr;
+    if (why && text != why) // the words for a failure of no known kind say no more
+        text = text + " · " + why;
     return elm_entry_utf8_to_markup(text.c_str());
 }
 

@@ -117,6 +117,18 @@ static void __dismissed_cb(void *, Evas_Object *obj, void *)
     evas_object_del(obj);
 }
 
+static void __ctx_delete_job(void *)
+{
+    if (UploadViewData *vd = s_vd)
+        __ctx_delete_cb(vd, nullptr, nullptr);
+}
+
+// The menu must not go before its item has got the whole of the key that chose it.
+static void __ctx_item_cb(void *, Evas_Object *, void *)
+{
+    ecore_job_add(__ctx_delete_job, nullptr);
+}
+
 void __more_menu_open(UploadViewData *vd)
 {
     AppData *ad = vd->ad;
@@ -135,7 +147,7 @@ void __more_menu_open(UploadViewData *vd)
     ea_object_event_callback_add(vd->more_menu, EA_CALLBACK_MORE, __dismiss_cb, nullptr);
     if (vd->total > 0) {
         Elm_Object_Item *item =
-            elm_ctxpopup_item_append(vd->more_menu, "IDS_CLOUD_BUTTON_REMOVE", nullptr, __ctx_delete_cb, vd);
+            elm_ctxpopup_item_append(vd->more_menu, "IDS_CLOUD_BUTTON_REMOVE", nullptr, __ctx_item_cb, nullptr);
         elm_object_item_domain_translatable_text_set(item, VELORA_SHARE_DOMAIN, "IDS_CLOUD_BUTTON_REMOVE");
     }
     elm_ctxpopup_direction_priority_set(vd->more_menu, ELM_CTXPOPUP_DIRECTION_UP, ELM_CTXPOPUP_DIRECTION_LEFT,
@@ -347,16 +359,19 @@ static void __btn_delete_cb(void *data, Evas_Object *, void *)
         VELORA_LOGE("data is NULL");
         return;
     }
-    if (__selection_get(vd->cur_index)) {
-        _velora_app_popup_delete(vd->ad);
-        vd->ad->popup = _velora_common_with_title_btn_popup(
-            vd->ad->win_main, __text("IDS_KQ_HEADER_STOP_UPLOADS_ABB"),
-            __text("IDS_KQ_POP_THE_UPLOAD_WILL_STOP_BUT_THE_FILE_WILL_NOT_BE_DELETED"), __stop_popup_cancel_cb,
-            __btn_stop_cb, __text("IDS_CLOUD_SK2_CANCEL"), __text("IDS_KQ_BUTTON_STOP_ABB2"), vd);
-    } else {
+    const bool must_ask = __selection_get(vd->cur_index);
+    if (!must_ask)
         __stop_selected(vd);
-    }
+    // First, for a popup gives the focus back to what had it: to a button that is gone, if it came before.
     __remove_all_selete_item(vd);
+    if (!must_ask)
+        return;
+    elm_object_focus_set(vd->genlist, EINA_TRUE);
+    _velora_app_popup_delete(vd->ad);
+    vd->ad->popup = _velora_common_with_title_btn_popup(
+        vd->ad->win_main, __text("IDS_KQ_HEADER_STOP_UPLOADS_ABB"),
+        __text("IDS_KQ_POP_THE_UPLOAD_WILL_STOP_BUT_THE_FILE_WILL_NOT_BE_DELETED"), __stop_popup_cancel_cb,
+        __btn_stop_cb, __text("IDS_CLOUD_SK2_CANCEL"), __text("IDS_KQ_BUTTON_STOP_ABB2"), vd);
 }
 
 void __ctx_delete_cb(void *data, Evas_Object *, void *)
