@@ -34,8 +34,9 @@ std::string platform_data_file(const std::string &name)
          dir = dir.parent_path())
         if (const fs::path file = dir / "platform" / name; fs::exists(file, failed))
             return file;
-    if (const fs::path file = fs::path("/usr/share/orvant-platform") / name; fs::exists(file, failed))
-        return file;
+    for (const fs::path folder : {"/usr/local/share/orvant-platform", "/usr/share/orvant-platform"})
+        if (fs::exists(folder / name, failed))
+            return folder / name;
     return {};
 }
 

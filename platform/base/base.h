@@ -12,7 +12,7 @@ std::string platform_data_dir();
 
 // A file that is installed with the platform's libraries, such as "theme/platform.edj". The running program's own
 // folder and those above it are looked through first, so that a program of a build folder finds the files built beside
-// it; then /usr/share/orvant-platform. Empty when there is none. Any thread.
+// it; then the folders orvant-platform of /usr/local/share and /usr/share. Empty when there is none. Any thread.
 std::string platform_data_file(const std::string &name);
 
 // The package under which this process owns accounts and notifications; "" until it was set. platform_package_set

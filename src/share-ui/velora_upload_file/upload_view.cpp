@@ -206,6 +206,8 @@ static void __push_on_naviframe(UploadViewData *vd)
     static const char title[] = "IDS_KQ_HEADER_UPLOAD_TO_ABB2";
     Evas_Object *back = elm_button_add(vd->ad->naviframe);
     elm_object_style_set(back, "naviframe/end_btn/default");
+    // Drawn as a sign; the words are for the screen reader.
+    elm_object_domain_translatable_text_set(back, VELORA_SHARE_DOMAIN, "IDS_VELORA_BODY_BACK");
     vd->nf_item = elm_naviframe_item_push(vd->ad->naviframe, title, back, nullptr, vd->layout, nullptr);
     __title_set(vd, title);
     elm_naviframe_item_pop_cb_set(vd->nf_item, __btn_back_cb, vd);
@@ -236,6 +238,7 @@ static bool __share_create(UploadViewData *vd)
     AppData *ad = vd->ad;
     vd->more_btn = elm_button_add(ad->naviframe);
     elm_object_style_set(vd->more_btn, "naviframe/more/default");
+    elm_object_domain_translatable_text_set(vd->more_btn, VELORA_SHARE_DOMAIN, "IDS_VELORA_BODY_MORE_OPTIONS");
     evas_object_smart_callback_add(vd->more_btn, "clicked", __more_create_folder_cb, vd);
     evas_object_smart_callback_add(ad->naviframe, "elm,action,more_event", __more_create_folder_cb, vd);
     elm_object_item_part_content_set(vd->nf_item, "toolbar_more_btn", vd->more_btn);
