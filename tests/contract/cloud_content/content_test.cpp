@@ -187,12 +187,14 @@ TEST_P(CloudContent, a_download_replaces_a_file_or_leaves_everything_as_it_was)
 }
 
 static long get(const std::string &url, std::string &answer, const char *range = nullptr, const char *method = "GET",
-                std::string *type = nullptr)
+                std::string *type = nullptr, const std::string &login = "")
 {
     answer.clear();
     std::unique_ptr<CURL, decltype(&curl_easy_cleanup)> easy(curl_easy_init(), curl_easy_cleanup);
     curl_easy_setopt(easy.get(), CURLOPT_URL, url.c_str());
     curl_easy_setopt(easy.get(), CURLOPT_RANGE, range);
+    if (!login.empty())
+        curl_easy_setopt(easy.get(), CURLOPT_USERPWD, login.c_str());
     if (std::string(method) == "HEAD")
         curl_easy_setopt(easy.get(), CURLOPT_NOBODY, 1L);
     else
@@ -294,9 +296,9 @@ TEST_P(CloudContent, thumbnails_arrive_and_are_told_of)
 {
     if (!is_real())
         return;
-    // A PNG of 30,000 x 30,000 pixels, if it is to be believed.
-    std::string bomb = picture(8, 8, "png");
-    bomb.replace(16, 8, std::string("\0\0\x75\x30\0\0\x75\x30", 8));
+    // A bitmap of 8512 x 8000 black points, in 8 MB: too many to be decoded for anybody.
+    std::string huge("BM\0\0\0\0\0\0\0\0\x3e\0\0\0\x28\0\0\0\x40\x21\0\0\x40\x1f\0\0\x01\0\x01", 29);
+    huge.resize(62 + 1064 * 8000);
     const struct {
         const char *name;
         std::string bytes;
@@ -307,7 +309,7 @@ TEST_P(CloudContent, thumbnails_arrive_and_are_told_of)
         {"small.bmp", picture(20, 10, "bmp"), 20, 10},
         {"broken.jpg", picture(2000, 1000, "jpeg").substr(0, 400), 0, 0},
         {"text.png", "no picture at all", 0, 0},
-        {"bomb.png", bomb, 0, 0},
+        {"huge.bmp", huge, 0, 0},
         {"film.mp4", picture(100, 100, "jpeg"), 0, 0},
     };
     for (const auto &row : rows)
@@ -345,6 +347,26 @@ TEST_P(CloudContent, thumbnails_arrive_and_are_told_of)
               std::multiset<std::string>(expected.begin(), expected.end()));
     if (!makes_media())
         return;
+
+    const std::string file = bytes_of(data("Test.credentials"));
+    const auto field = [&](const std::string &name) {
+        const size_t at = file.find(name) + name.size();
+        return file.substr(at, file.find('\n', at) - at);
+    };
+    const struct {
+        const char *query;
+        long status;
+    } queries[] = {
+        {"path=/small.bmp&size=16", 200}, {"path=/small.bmp&size=15", 400},    {"path=/small.bmp", 400},
+        {"path=/none.bmp&size=64", 404},  {"path=/../small.bmp&size=64", 400}, {"path=/film.mp4&size=64", 404},
+        {"path=/huge.bmp&size=64", 415},  {"path=/broken.jpg&size=64", 415},   {"path=/text.png&size=64", 415},
+    };
+    std::string answer;
+    for (const auto &one : queries)
+        EXPECT_EQ(get(api + "/1/thumbnail?" + one.query, answer, nullptr, "GET", nullptr,
+                      field("User=") + ":" + field("Secret=")),
+                  one.status)
+            << one.query;
 
     // Another version is another picture; without a callback it comes as well.
     ASSERT_EQ(cloud_content_sync_set_thumbnail_cb(handle, nullptr, nullptr), 0);
