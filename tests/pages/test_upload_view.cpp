@@ -214,6 +214,9 @@ TEST_F(Browser, ShowsAThumbnailOnceTheClientHasIt)
 
 TEST_F(Browser, ShowsNoRawTextIdInAnyLanguage)
 {
+#ifdef __SANITIZE_THREAD__
+    GTEST_SKIP() << "a walk through texts, slow under the thread sanitizer and nothing to it";
+#endif
     std::set<std::string> all;
     for (const char *language : {"en", "de", "fr", "es", "ko", "zh_CN", ""}) {
         SCOPED_TRACE(*language ? language : "LANG unset");

@@ -86,7 +86,11 @@ class UploadPage : public Application {
     }
     static bool press_done()
     {
-        return driver::click(s_vd.load()->done_btn);
+        const auto is_ready = [] {
+            const UploadViewData *vd = s_vd;
+            return vd && vd->done_btn && !vd->ad->popup && !elm_object_disabled_get(vd->done_btn);
+        };
+        return wait_for(is_ready) && driver::click(s_vd.load()->done_btn);
     }
     static bool press_popup_button(int number)
     {
