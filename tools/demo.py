@@ -100,12 +100,19 @@ def operate(device, pictures, folder):
     segments = [segment for segment in folder.split("/") if segment]
     wait_for("the folders of the account", lambda: device.find(segments[0] if segments else "Done"), 30)
     pictures.take("folders-of-the-account")
-    for segment in segments:
+
+    def enter(segment, words):
         device.click(segment)
         # The path bar shows it, and the row that was tapped is gone.
         wait_for(f'the folder "{segment}"', lambda: device.find("Done", "Elm_Button"), 10)
         time.sleep(0.6)
-        pictures.take(f"folder-{segment}")
+        pictures.take(f"{words}-{segment}")
+    for segment in segments:
+        enter(segment, "folder")
+    above = (["Velora"] + segments)[-2:-1]
+    if len(segments) > 1 and segments.count(above[0]) == 1:  # one step back by the path bar, as who has gone too far
+        enter(above[0], "path-bar")
+        enter(segments[-1], "folder-again")
     device.click("Done", "Elm_Button")
 
 

@@ -237,6 +237,13 @@ class Device:
 
     def visible(self):
         """What the application shows: (kind, text, x, y, width, height), bottom to top; nothing while it is not there."""
+        return [entry for entry in self._inspect() if entry[0] != "focus"]
+
+    def focused(self):
+        """The text of what has the keys' focus, or its type."""
+        return next((text for kind, text, *_ in self._inspect() if kind == "focus"), None)
+
+    def _inspect(self):
         done = subprocess.run(["gdbus", "call", "--session", "--dest", APP, "--object-path", "/com/orvant/Inspect",
                                "--method", "com.orvant.Inspect.Visible"], env=self.env, capture_output=True, timeout=20)
         if done.returncode != 0:

@@ -13,6 +13,7 @@ constexpr char interface_xml[] = "<node><interface name='com.orvant.Inspect'>"
 struct Walk {
     GVariantBuilder *out = nullptr;
     int x = 0, y = 0; // of the window on the screen
+    Evas_Object *focused = nullptr;
 };
 
 bool is_in_sight(const Evas_Object *obj, Eina_Rectangle *place)
@@ -53,7 +54,7 @@ void add_markup(const Walk &walk, const char *kind, const char *markup, const Ei
     std::free(text);
 }
 
-void visit(const Walk &walk, Evas_Object *obj)
+void visit(Walk &walk, Evas_Object *obj)
 {
     Eina_Rectangle place = {};
     const char *type = evas_object_type_get(obj);
@@ -61,6 +62,8 @@ void visit(const Walk &walk, Evas_Object *obj)
     const bool is_seen = is_in_sight(obj, &place);
     if (!evas_object_visible_get(obj))
         return;
+    if (elm_object_widget_check(obj) && elm_object_focus_get(obj))
+        walk.focused = obj; // the innermost comes last
     if (is_seen && std::strcmp(type, "text") == 0)
         add(walk, "text", evas_object_text_text_get(obj), place);
     else if (is_seen && std::strcmp(type, "textblock") == 0)
@@ -74,6 +77,22 @@ void visit(const Walk &walk, Evas_Object *obj)
     void *member = nullptr;
     EINA_LIST_FREE(members, member)
     visit(walk, static_cast<Evas_Object *>(member));
+}
+
+void add_focus(const Walk &walk)
+{
+    if (!walk.focused)
+        return;
+    Eina_Rectangle place = {};
+    evas_object_geometry_get(walk.focused, &place.x, &place.y, &place.w, &place.h);
+    const char *text = elm_object_text_get(walk.focused);
+    if (Elm_Object_Item *item = elm_object_focused_item_get(walk.focused)) {
+        text = elm_object_item_text_get(item);
+        for (const char *part : {"elm.text.main.left", "elm.text.main.left.top"})
+            if (!text || !*text)
+                text = elm_object_item_part_text_get(item, part);
+    }
+    add_markup(walk, "focus", text && *text ? text : elm_object_widget_type_get(walk.focused), place);
 }
 
 void answer(GDBusConnection *, const gchar *, const gchar *, const gchar *, const gchar *, GVariant *,
@@ -90,6 +109,7 @@ void answer(GDBusConnection *, const gchar *, const gchar *, const gchar *, cons
         ecore_evas_geometry_get(ee, &walk.x, &walk.y, nullptr, nullptr);
         for (Evas_Object *obj = evas_object_bottom_get(ecore_evas_get(ee)); obj; obj = evas_object_above_get(obj))
             visit(walk, obj);
+        add_focus(walk);
     }
     g_dbus_method_invocation_return_value(invocation, g_variant_new("(a(ssiiii))", &out));
 }

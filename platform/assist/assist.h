@@ -24,6 +24,10 @@ void *ea_object_event_callback_del(Evas_Object *obj, ea_callback_type_e type, ea
 // (org.a11y.Status.ScreenReaderEnabled on the session bus), the window is offered to it over AT-SPI.
 void ea_screen_reader_support_set(Evas_Object *win, bool supported);
 
+// What a screen reader says of a widget in place of the text that it shows. `name` is plain text and copied. Null
+// `widget` or `name`: no effect.
+void ea_screen_reader_name_set(Evas_Object *widget, const char *name);
+
 // Until this is called with true the two functions that apply tables do nothing.
 void ea_theme_changeable_ui_enabled_set(bool enabled);
 
@@ -40,15 +44,20 @@ void ea_theme_colors_set(ea_theme_color_table_h table, int style);
 // The table's classes are the theme's own again, whatever the style they were set in.
 void ea_theme_colors_unset(ea_theme_color_table_h table, int style);
 
-// The same for Edje text classes; SIZE is in pixels, a whole number above 0:
-//   <fonts><font class="NAME" font="FAMILY" size="SIZE"/>...</fonts>
+// The same for Edje text classes; SIZE is in pixels, a whole number above 0, and so is MOST, which may be left out and
+// is at least SIZE:
+//   <fonts><font class="NAME" font="FAMILY" size="SIZE" largest="MOST"/>...</fonts>
 ea_theme_font_table_h ea_theme_font_table_new(const char *path);
 void ea_theme_font_table_free(ea_theme_font_table_h table);
+// Sets the table's classes for the whole process, each SIZE multiplied by what the person chose and MOST at most:
+// $ORVANT_TEXT_PERCENT, else the text of the key "db/setting/text_percent" of the settings store, else 100. What is no
+// whole number counts as not set; what is below 50 or above 200 counts as 50 or 200.
 void ea_theme_fonts_set(ea_theme_font_table_h table);
 
 // What a class stands for now: 0 to 255 each, not premultiplied. False, and everything 255, when nobody has set it.
 bool ea_theme_color_get(const char *color_class, int *r, int *g, int *b, int *a);
-// False, and null and 0, when nobody has set it. `*font` is the caller's (free), `*size` in pixels.
+// False, and null and 0, when nobody has set it. `*font` is the caller's (free), `*size` in pixels, the chosen text
+// size included.
 bool ea_theme_font_get(const char *font_class, char **font, int *size);
 // Colours the whole object by the class, as evas_object_color_set does. No effect when nobody has set the class.
 void ea_theme_object_color_set(Evas_Object *obj, const char *color_class);

@@ -2,9 +2,13 @@
 #include "base/base.h"
 #include "vconf/vconf.h"
 #include <Elementary.h>
+#include <algorithm>
 #include <array>
 #include <cstring>
-#include <gio/gio.h>
+#include <glib.h>
+
+#include <limits>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -21,7 +25,7 @@ struct ea_theme_color_table_s {
 struct ea_theme_font_table_s {
     struct Entry {
         std::string name, font;
-        int size;
+        int size, largest = std::numeric_limits<int>::max();
     };
     std::vector<Entry> entries;
 };
@@ -65,7 +69,19 @@ bool fill(ea_theme_font_table_s::Entry &entry, const std::string &attribute, con
 {
     return attribute == "class"  ? parse(value, entry.name)
            : attribute == "font" ? parse(value, entry.font)
-                                 : attribute == "size" && parse(value, entry.size);
+           : attribute == "size" ? parse(value, entry.size)
+                                 : attribute == "largest" && parse(value, entry.largest);
+}
+
+// Whether every attribute that must be there was given.
+bool is_whole(const ea_theme_color_table_s::Entry &, int filled)
+{
+    return filled == 3;
+}
+
+bool is_whole(const ea_theme_font_table_s::Entry &entry, int filled)
+{
+    return filled == (entry.largest == std::numeric_limits<int>::max() ? 3 : 4) && entry.largest >= entry.size;
 }
 
 constexpr const char *outer_element(const ea_theme_color_table_s *)
@@ -92,7 +108,7 @@ void element(GMarkupParseContext *context, const char *name, const char **attrib
     bool good = stack->next && !stack->next->next && outer.compare(0, outer.size() - 1, name) == 0;
     for (; good && *attributes; attributes++, values++, filled++)
         good = fill(entry, *attributes, *values);
-    if (good && filled == 3)
+    if (good && is_whole(entry, filled))
         table->entries.push_back(std::move(entry));
     else
         g_set_error(error, G_MARKUP_ERROR, G_MARKUP_ERROR_INVALID_CONTENT, "element %s is not as it should be", name);
@@ -129,33 +145,23 @@ bool dark_chosen()
     return vconf_get_bool("db/setting/theme_dark", &dark) == 0 && dark;
 }
 
-bool screen_reader_on()
+// A whole number, within what the themes are made for; nothing when the text is no number.
+std::optional<int> percent(const char *text)
 {
-    GDBusConnection *bus = g_bus_get_sync(G_BUS_TYPE_SESSION, nullptr, nullptr);
-    if (!bus)
-        return false;
-    gboolean on = FALSE;
-    GVariant *reply =
-        g_dbus_connection_call_sync(bus, "org.a11y.Bus", "/org/a11y/bus", "org.freedesktop.DBus.Properties", "Get",
-                                    g_variant_new("(ss)", "org.a11y.Status", "ScreenReaderEnabled"),
-                                    G_VARIANT_TYPE("(v)"), G_DBUS_CALL_FLAGS_NO_AUTO_START, 1000, nullptr, nullptr);
-    if (reply) {
-        GVariant *value = nullptr;
-        g_variant_get(reply, "(v)", &value);
-        on = g_variant_is_of_type(value, G_VARIANT_TYPE_BOOLEAN) && g_variant_get_boolean(value);
-        g_variant_unref(value);
-        g_variant_unref(reply);
-    }
-    g_object_unref(bus);
-    return on;
+    gint64 number = 0;
+    if (!text || !g_ascii_string_to_signed(text, 10, G_MININT, G_MAXINT, &number, nullptr))
+        return std::nullopt;
+    return static_cast<int>(std::clamp<gint64>(number, 50, 200));
+}
+
+int chosen_text_percent()
+{
+    if (const std::optional<int> chosen = percent(g_getenv("ORVANT_TEXT_PERCENT")))
+        return *chosen;
+    const CString stored(vconf_get_str("db/setting/text_percent"));
+    return percent(stored.get()).value_or(100);
 }
 } // namespace
-
-void ea_screen_reader_support_set(Evas_Object *win, bool supported)
-{
-    if (win && supported && screen_reader_on())
-        elm_config_atspi_mode_set(EINA_TRUE);
-}
 
 void ea_theme_changeable_ui_enabled_set(bool on)
 {
@@ -205,8 +211,11 @@ void ea_theme_fonts_set(ea_theme_font_table_h table)
 {
     if (!table || !enabled)
         return;
-    for (const auto &entry : table->entries)
-        edje_text_class_set(entry.name.c_str(), entry.font.c_str(), entry.size);
+    const int percent = chosen_text_percent();
+    for (const auto &entry : table->entries) {
+        const int size = std::min((entry.size * percent + 50) / 100, entry.largest);
+        edje_text_class_set(entry.name.c_str(), entry.font.c_str(), size);
+    }
 }
 
 bool ea_theme_color_get(const char *color_class, int *r, int *g, int *b, int *a)

@@ -104,7 +104,14 @@ bool Db::open(const std::string &path, const char *schema)
         return false;
     }
     sqlite3_busy_timeout(raw, 5000);
-    if (!run("PRAGMA journal_mode=WAL; PRAGMA synchronous=NORMAL; PRAGMA foreign_keys=ON;") || (schema && !run(schema)))
+    // The change to WAL does not wait for the timeout when several programs open a new database at once.
+    int switched = SQLITE_BUSY;
+    for (int tries = 0; switched == SQLITE_BUSY && tries < 500; tries++) {
+        if (tries > 0)
+            sqlite3_sleep(10);
+        switched = sqlite3_exec(raw, "PRAGMA journal_mode=WAL", nullptr, nullptr, nullptr);
+    }
+    if (switched != SQLITE_OK || !run("PRAGMA synchronous=NORMAL; PRAGMA foreign_keys=ON;") || (schema && !run(schema)))
         handle.reset();
     return handle != nullptr;
 }

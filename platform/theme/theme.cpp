@@ -2,6 +2,7 @@
 #include <Edje.h>
 #include <Elementary.h>
 #include <algorithm>
+#include <cstring>
 
 namespace {
 
@@ -9,25 +10,63 @@ namespace {
 constexpr double theme_scale = 1.8;
 constexpr int card_margins = 48; // from a card's content to both edges of the window
 constexpr int text_margins = 32; // from a dialog's text to both sides of that content
-constexpr int widest_dialog = 600;
+constexpr int card_edges = 16;   // what a card is wider than its content
+constexpr int path_margins = 64; // what a path bar needs beside one name
+constexpr int widest_dialog = 600, widest_dialog_of_large_text = 760;
 constexpr int narrowest_dialog = 160;
+constexpr int room_for_two = 480, room_for_three = 590; // buttons beside each other
+constexpr int plain_text = 26;                          // the size of "ui.body" that these widths are for
 
-void fit_dialogs(void *, Evas *, Evas_Object *win, void *)
+// Whether the buttons of a dialog stand beside each other, as the spacers of the theme take it.
+void buttons_beside(const char *size_class, bool beside)
+{
+    edje_size_class_set(size_class, 0, 0, beside ? -1 : 0, beside ? 0 : -1);
+}
+
+// A dialog that is open when the classes change asks for its size anew; Edje lays it out again by itself, but keeps to
+// the size that it was given.
+void measure_again(Evas_Object *object)
+{
+    for (const char *plain : {"rectangle", "image", "text", "textblock", "line", "polygon", "textgrid", "vectors"})
+        if (std::strcmp(evas_object_type_get(object), plain) == 0)
+            return;
+    if (elm_object_widget_check(object) && std::strcmp(elm_object_widget_type_get(object), "Elm_Layout") == 0)
+        elm_layout_sizing_eval(object);
+    Eina_List *members = evas_object_smart_members_get(object);
+    const Eina_List *node = nullptr;
+    void *member = nullptr;
+    EINA_LIST_FOREACH(members, node, member)
+    measure_again(static_cast<Evas_Object *>(member));
+    eina_list_free(members);
+}
+
+void fit_to_window(void *, Evas *, Evas_Object *win, void *)
 {
     int width = 0;
     evas_object_geometry_get(win, nullptr, nullptr, &width, nullptr);
     const double scale = elm_config_scale_get() * elm_object_scale_get(win) / theme_scale;
     if (width <= 1 || scale <= 0)
         return;
-    const int dialog = std::clamp(int(width / scale) - card_margins, narrowest_dialog, widest_dialog);
+    const char *font = nullptr;
+    Evas_Font_Size size = plain_text;
+    edje_text_class_get("ui.body", &font, &size);
+    const int widest = std::clamp(widest_dialog * size / plain_text, widest_dialog, widest_dialog_of_large_text);
+    const int dialog = std::clamp(int(width / scale) - card_margins, narrowest_dialog, widest);
     edje_size_class_set("ui.dialog", dialog, 0, -1, -1);
+    edje_size_class_set("ui.path", 24, 40, std::max(int(width / scale) - path_margins, narrowest_dialog), -1);
+    buttons_beside("ui.dialog.beside.2", dialog >= room_for_two);
+    buttons_beside("ui.dialog.beside.3", dialog >= room_for_three);
+    edje_size_class_set("ui.dialog.card", 0, 0, dialog + card_edges, 99999);
     edje_size_class_set("ui.dialog.text", dialog - text_margins, 0, -1, -1);
+    for (Evas_Object *object = evas_object_bottom_get(evas_object_evas_get(win)); object;
+         object = evas_object_above_get(object))
+        measure_again(object);
 }
 
 } // namespace
 
 void platform_theme_window_watch(Evas_Object *win)
 {
-    evas_object_event_callback_add(win, EVAS_CALLBACK_RESIZE, fit_dialogs, nullptr);
-    fit_dialogs(nullptr, nullptr, win, nullptr);
+    evas_object_event_callback_add(win, EVAS_CALLBACK_RESIZE, fit_to_window, nullptr);
+    fit_to_window(nullptr, nullptr, win, nullptr);
 }

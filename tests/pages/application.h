@@ -36,7 +36,7 @@ class Application : public testing::Test {
     struct Wish {
         const char *operation = nullptr, *launch_mode = nullptr, *uri = nullptr;
         std::vector<std::string> paths;
-        const char *display_type = nullptr, *sender = "b";
+        const char *display_type = nullptr, *sender = "b", *folder = nullptr;
     };
     static void request(const Wish &wish)
     {
@@ -46,6 +46,8 @@ class Application : public testing::Test {
             app_control_add_extra_data(request, "launch_mode", wish.launch_mode);
         if (wish.display_type)
             app_control_add_extra_data(request, "display_type", wish.display_type);
+        if (wish.folder)
+            app_control_add_extra_data(request, "folder_path", wish.folder);
         std::vector<const char *> paths;
         for (const std::string &path : wish.paths)
             paths.push_back(path.c_str());

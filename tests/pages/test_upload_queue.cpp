@@ -240,24 +240,13 @@ TEST_F(Queue, AFailedFileCanBeSentAgain)
     EXPECT_EQ(uploaded("/a.txt"), "a.txt");
 }
 
-TEST_F(Queue, AFileOfAnEarlierResultCanBeSentAgain)
-{
-    run([&] {
-        show_result({"a.txt", "b.txt"}, "fail");
-        ASSERT_TRUE(driver::click_row(row(1)));
-        ASSERT_TRUE(press_popup_button(2));
-        ASSERT_TRUE(wait_for([] { return is_over() && rows() == Texts{"failed a.txt", "uploaded b.txt"}; }));
-    });
-    EXPECT_EQ(uploaded("/b.txt"), "b.txt");
-}
-
 TEST_F(Queue, AResultOpenedDuringARunLeavesTheRunAlone)
 {
     run([&] {
         start({"a.txt", "b.txt", "c.txt"});
         show_result({"old.txt"}, "success");
         EXPECT_EQ(rows(), Texts{"uploaded old.txt"});
-        EXPECT_EQ(s_vd.load()->ad->exit_on_pause, 1);
+        EXPECT_EQ(s_vd.load()->ad->exit_on_pause, 0) << "the run goes on behind";
         fake_cloud_hold(false);
         ASSERT_TRUE(wait_for(is_over));
         EXPECT_EQ(states(), (std::vector<int>{done, done, done}));
@@ -270,17 +259,47 @@ TEST_F(Queue, AResultOpenedDuringARunLeavesTheRunAlone)
     EXPECT_EQ(uploaded("/c.txt"), "c.txt");
 }
 
-TEST_F(Queue, AnotherShareDuringARunWaits)
+TEST_F(Queue, ALaterShareIsNextWhenTheViewIsFree)
 {
-    run([&] {
-        start({"a.txt", "b.txt"});
-        share({"late.txt"});
-        fake_cloud_hold(false);
-        ASSERT_TRUE(wait_for(is_over));
-        EXPECT_EQ(rows(), (Texts{"uploaded a.txt", "uploaded b.txt"}));
-        EXPECT_EQ(g_list_length(s_vd.load()->ad->upload_list), 3u);
-    });
-    EXPECT_EQ(fake_app::replies().size(), 2u) << "each share has its answer";
+    const struct {
+        const char *name;
+        bool is_running;
+        bool has_result; // a result is opened during the run
+    } cases[] = {
+        {"during a run", true, false},
+        {"during a run, then a result", true, true},
+        {"behind the end of a run", false, false},
+        {"onto a result", false, true},
+    };
+    for (const auto &c : cases) {
+        SCOPED_TRACE(c.name);
+        fake_cloud_reset();
+        fake_cloud_add_folder("/Alpha");
+        fake_cloud_refresh_now();
+        run([&] {
+            start({"a.txt", "b.txt"});
+            if (c.is_running) {
+                share({"late.txt"});
+                EXPECT_TRUE(wait_for([&] { return log.has("Choose a folder for the new files"); }));
+            }
+            if (c.has_result)
+                show_result({"old.txt", "older.txt", "oldest.txt"}, "fail");
+            fake_cloud_hold(false);
+            ASSERT_TRUE(wait_for([] { return !s_vd.load()->thread; }));
+            if (!c.is_running)
+                share({"late.txt"});
+            EXPECT_EQ(s_vd.load()->ad->exit_on_pause, 0);
+            ASSERT_TRUE(wait_for([] { return rows() == Texts({"folder Alpha", "file a.txt", "file b.txt"}); }));
+            EXPECT_TRUE(shows("Upload to"));
+            ASSERT_TRUE(driver::click_row(row(0)));
+            ASSERT_TRUE(press_done());
+            ASSERT_TRUE(wait_for([] { return is_over() && rows() == Texts{"uploaded late.txt"}; }));
+            press_back();
+            EXPECT_TRUE(wait_for_exit());
+        });
+        EXPECT_EQ(uploaded("/Alpha/late.txt"), "late.txt");
+        EXPECT_EQ(fake_cloud_upload_log().size(), 3u) << "nothing goes up twice";
+    }
 }
 
 TEST_F(Queue, EndsInTheMiddleOfATransfer)

@@ -54,11 +54,12 @@ class UploadPage : public Application {
     {
         request({.operation = APP_CONTROL_OPERATION_MULTI_SHARE, .paths = locals(names)});
     }
-    void show_result(const std::vector<std::string> &names, const char *display_type)
+    void show_result(const std::vector<std::string> &names, const char *display_type, const char *folder = nullptr)
     {
         request({.operation = APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD_RESULT,
                  .paths = locals(names),
-                 .display_type = display_type});
+                 .display_type = display_type,
+                 .folder = folder});
     }
     std::vector<std::string> locals(std::vector<std::string> names) const
     {

@@ -3,6 +3,7 @@
 //   gallery OUTDIR [WIDTH HEIGHT [TEXT_PERCENT]]
 //
 // ELM_SCALE sets the density. It needs no display. It fails when a theme lacks what a scene asks for.
+#include "assist/assist.h"
 #include "scenes.h"
 #include "theme/theme.h"
 #include <Ecore_Evas.h>
@@ -10,59 +11,11 @@
 #include <cstdio>
 #include <cstdlib>
 #include <filesystem>
-#include <glib.h>
 #include <string>
-#include <vector>
 
 namespace fs = std::filesystem;
 
 namespace {
-
-// One table of changeable colours or fonts, applied while it is read.
-struct TableReader {
-    bool dark;
-    int text_percent;
-};
-
-const char *attribute(const char **names, const char **values, const char *name)
-{
-    for (; *names; ++names, ++values)
-        if (std::string_view(*names) == name)
-            return *values;
-    return "";
-}
-
-void element(GMarkupParseContext *, const char *tag, const char **names, const char **values, gpointer data, GError **)
-{
-    const auto *reader = static_cast<TableReader *>(data);
-    const char *name = attribute(names, values, "class");
-    if (std::string_view(tag) == "color") {
-        unsigned r = 0, g = 0, b = 0, a = 0;
-        if (sscanf(attribute(names, values, reader->dark ? "dark" : "light"), "#%2x%2x%2x%2x", &r, &g, &b, &a) == 4)
-            edje_color_class_set(name, int(r), int(g), int(b), int(a), 0, 0, 0, 0, 0, 0, 0, 0);
-    } else if (std::string_view(tag) == "font")
-        edje_text_class_set(name, attribute(names, values, "font"),
-                            atoi(attribute(names, values, "size")) * reader->text_percent / 100);
-}
-
-void apply_table(const fs::path &file, TableReader reader)
-{
-    gchar *text = nullptr;
-    gsize length = 0;
-    if (!g_file_get_contents(file.c_str(), &text, &length, nullptr)) {
-        fprintf(stderr, "cannot read %s\n", file.c_str());
-        exit(1);
-    }
-    static constexpr GMarkupParser parser = {element, nullptr, nullptr, nullptr, nullptr};
-    GMarkupParseContext *context = g_markup_parse_context_new(&parser, GMarkupParseFlags(0), &reader, nullptr);
-    GError *error = nullptr;
-    if (!g_markup_parse_context_parse(context, text, gssize(length), &error)) {
-        fprintf(stderr, "%s: %s\n", file.c_str(), error->message);
-        exit(1);
-    }
-    g_markup_parse_context_free(context);
-    g_free(text);
-}
 
 void run_for(double seconds)
 {
@@ -104,7 +57,7 @@ int main(int argc, char **argv)
     }
     const fs::path out = argv[1];
     const int width = argc > 3 ? atoi(argv[2]) : 480, height = argc > 3 ? atoi(argv[3]) : 800;
-    const int text_percent = argc > 4 ? atoi(argv[4]) : 100;
+    setenv("ORVANT_TEXT_PERCENT", argc > 4 ? argv[4] : "100", 1);
     fs::create_directories(out);
 
     setenv("ELM_ENGINE", "buffer", 1);
@@ -118,11 +71,20 @@ int main(int argc, char **argv)
     elm_theme_extension_add(nullptr, (root / "res/edje/velora_genlist.edj").c_str());
     gallery_resources = root / "res/edje";
 
+    const fs::path tables = root / "shared/res/tables";
+    ea_theme_color_table_h colors =
+        ea_theme_color_table_new((tables / "com.orvant.velora_ChangeableColorInfo.xml").c_str());
+    ea_theme_font_table_h fonts =
+        ea_theme_font_table_new((tables / "com.orvant.velora_ChangeableColorFontInfo.xml").c_str());
+    if (!colors || !fonts)
+        return 1;
+    ea_theme_changeable_ui_enabled_set(true);
+    ea_theme_fonts_set(fonts);
+
     int failed = 0;
     for (const bool dark : {false, true}) {
-        const fs::path tables = root / "shared/res/tables";
-        apply_table(tables / "com.orvant.velora_ChangeableColorInfo.xml", {dark, text_percent});
-        apply_table(tables / "com.orvant.velora_ChangeableColorFontInfo.xml", {dark, text_percent});
+        setenv("ORVANT_THEME", dark ? "dark" : "light", 1);
+        ea_theme_colors_set(colors, 0);
         for (const Scene &scene : gallery_scenes()) {
             Evas_Object *win = elm_win_add(nullptr, "gallery", ELM_WIN_BASIC);
             evas_object_resize(win, width, height);
@@ -139,6 +101,8 @@ int main(int argc, char **argv)
             run_for(0.01);
         }
     }
+    ea_theme_color_table_free(colors);
+    ea_theme_font_table_free(fonts);
     elm_shutdown();
     return failed || gallery_missing ? 1 : 0;
 }

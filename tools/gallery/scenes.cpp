@@ -435,6 +435,12 @@ void state_loading(Evas_Object *win)
     state(win, "velora_state_loading", "Wird geladen...", "Die Liste der Ordner wird geholt.", nullptr);
 }
 
+void state_stopped(Evas_Object *win)
+{
+    state(win, "velora_state_stopped", "Nichts mehr hochzuladen",
+          "Das Hochladen wurde beendet. Die Dateien sind weiterhin auf diesem Gerät", nullptr);
+}
+
 void icons(Evas_Object *win)
 {
     Evas_Object *frame = frame_add(win);
@@ -529,6 +535,7 @@ const std::vector<Scene> &gallery_scenes()
         {"state-offline", state_offline},
         {"state-error", state_error},
         {"state-loading", state_loading},
+        {"state-stopped", state_stopped},
         {"icons", icons},
         {"controls", controls},
     };

@@ -327,6 +327,7 @@ static void __dispatch_upload_result(AppData *ad, app_control_h request)
         return;
     }
     ad->launch_mode = LAUNCH_MODE_UPLOAD_RESULT;
+    _velora_upload_view_keep_waiting(ad);
     _velora_upload_list_free(&ad->upload_list);
     char **paths = nullptr;
     int count = 0;

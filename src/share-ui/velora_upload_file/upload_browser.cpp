@@ -1,26 +1,20 @@
 // The folders of the cloud: rows, path bar, and the ways from one folder to another.
-#include "velora_common/velora_paths.h"
 #include "velora_upload_file/upload_internal.h"
 #include <cstdlib>
 #include <cstring>
 
 static const char s_root_label[] = "Velora";
 
-// Makes a folder the open one; the old one is let go.
-static void __folder_open(UploadViewData *vd, cloud_content_sync_folder_h folder)
+void __folder_open(UploadViewData *vd, cloud_content_sync_folder_h folder)
 {
     if (vd->folder)
         cloud_content_sync_folder_destroy(vd->folder);
     vd->folder = folder;
-    if (folder)
-        __folder_path_take(vd);
-}
-
-void __folder_path_take(UploadViewData *vd)
-{
+    if (!folder)
+        return;
     std::free(vd->ad->folder_path);
     vd->ad->folder_path = nullptr;
-    cloud_content_sync_folder_get_path(vd->folder, &vd->ad->folder_path);
+    cloud_content_sync_folder_get_path(folder, &vd->ad->folder_path);
 }
 
 static Eina_Bool __timer_toolbar_append_cb(void *)
@@ -111,7 +105,6 @@ void __path_bar_create(UploadViewData *vd)
     elm_toolbar_align_set(vd->toolbar, 0.0);
     elm_toolbar_homogeneous_set(vd->toolbar, EINA_FALSE);
     elm_toolbar_select_mode_set(vd->toolbar, ELM_OBJECT_SELECT_MODE_NONE);
-    elm_theme_extension_add(nullptr, _velora_common_app_file("res/edje/velora_genlist.edj").c_str());
     __path_bar_append(vd, s_root_label, "/");
     elm_object_part_content_set(vd->layout, "elm.swallow.folder", vd->toolbar);
     evas_object_resize(vd->toolbar, 480, 51);

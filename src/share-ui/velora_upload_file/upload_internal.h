@@ -5,7 +5,9 @@
 #include "velora_common/velora_upload_item.h"
 #include "velora_upload_file/velora_upload_view.h"
 #include <atomic>
+#include <optional>
 #include <string>
+#include <unordered_set>
 #include <vector>
 
 enum ItemType {
@@ -55,6 +57,10 @@ struct UploadViewData {
     Evas_Object *more_menu = nullptr; // is AppData's popup while it is open
     Evas_Object *state = nullptr;     // what the list area says when there is no list
     std::vector<UploadItem *> run;    // the items of the running (or last) worker, kept alive for it
+    // Names of the open folder's files, while a TakenNames lives.
+    std::optional<std::unordered_set<std::string>> taken_names;
+    int settled = 0;       // items at the head of AppData's list that no Done is awaited for
+    GList *kept = nullptr; // items that wait for their Done while AppData's list is a result's
 };
 
 // The record of a row, freed with it.
@@ -88,6 +94,8 @@ const char *__text(const char *id);
 const char *__last_segment(const char *path);
 // The item at an index of AppData's list, which is what a row means by its index; null if there is none.
 UploadItem *__upload_item_find(UploadViewData *vd, int index);
+// The item of the running (or last) worker's run that has this index; null if there is none.
+UploadItem *__run_item(const UploadViewData *vd, int index);
 // The item that a worker's message means: one of its own run while it runs, for a result that was opened meanwhile has
 // replaced AppData's list; null if there is none.
 UploadItem *__upload_item_find_running(UploadViewData *vd, int index);
@@ -97,9 +105,18 @@ void __destroy_view(UploadViewData *vd);
 // Takes the view down and leaves the application, after the callback that asked for it has returned.
 void __leave(UploadViewData *vd);
 void __title_set(UploadViewData *vd, const char *id);
+// What the naviframe made of the view's layout: the object that a screen reader meets as the page.
+Evas_Object *__page_of(UploadViewData *vd);
 Evas_Object *__title_button_create(UploadViewData *vd, const char *style, const char *id, const char *part,
                                    Evas_Smart_Cb cb);
 void __pipe_ensure(UploadViewData *vd);
+// Folders make room for the list of uploads: no path bar, no title buttons.
+void __uploads_show(UploadViewData *vd);
+// Files that were shared while the view was busy with others get their choice of a folder now. False when there are
+// none, or when it is still busy. Without a root folder to show the view is gone then.
+bool __next_share_begin(UploadViewData *vd);
+// Extra data of a result's launch request, beside those that it must have: the path of the destination folder.
+inline constexpr char RESULT_FOLDER_KEY[] = "folder_path";
 
 // upload_state.cpp: the look of an empty folder, a failed refresh and the like.
 enum ViewState {
@@ -108,7 +125,9 @@ enum ViewState {
     VIEW_STATE_LOADING,
     VIEW_STATE_OFFLINE,
     VIEW_STATE_ERROR,
-    VIEW_STATE_SIGNED_OUT
+    VIEW_STATE_SIGNED_OUT,
+    VIEW_STATE_STOPPED, // nothing is left of a queue
+    VIEW_STATE_FULL     // a result without files: there was no room for any
 };
 // What the last refresh says about an empty list.
 ViewState __meta_state();
@@ -125,13 +144,17 @@ bool __folder_go_up(UploadViewData *vd);
 bool __is_at_root(UploadViewData *vd);
 // Appends the open folder's subfolders and files; the result is their number.
 int __folder_list_append(UploadViewData *vd);
-void __folder_path_take(UploadViewData *vd);
+// Makes a folder the open one and takes it over; the old one is let go. Null: none is open.
+void __folder_open(UploadViewData *vd, cloud_content_sync_folder_h folder);
 
 // upload_queue.cpp: the queue on the main loop.
 void __btn_upload_cb(void *data, Evas_Object *obj, void *event_info);
 void __pipe_cb(void *data, void *buffer, unsigned int size);
 void __upload_file_cancel_cb(void *data, Evas_Object *obj, void *event_info);
 void __uploading_file_mutil_cancel(UploadItem *item, UploadViewData *vd);
+// The same for many, with one word to the notification at the end: the last ones first, so that the worker gets none of
+// them when the running one goes.
+void __uploads_cancel(UploadViewData *vd, const std::vector<UploadItem *> &items);
 void __retry_popup_show(ItemData *record);
 
 // upload_worker.cpp: the worker of a run, the worker of a retry, and the transfer callback.
@@ -164,6 +187,14 @@ char *__get_format_time(); // g_free
 
 // upload_names.cpp: names of files. Strings are the caller's, g_free.
 char *__get_upload_server_path(UploadViewData *vd, const char *local_path);
+// Reads the open folder once for many calls of __get_upload_server_path: it may have many files, and the queue too.
+struct TakenNames {
+    explicit TakenNames(UploadViewData *view);
+    ~TakenNames();
+    TakenNames(const TakenNames &) = delete;
+    TakenNames &operator=(const TakenNames &) = delete;
+    UploadViewData *vd;
+};
 char *__get_file_base_name(const char *name); // null when the name has no dot
 char *__get_file_ext_name(const char *name);  // null when the name has no dot
 
@@ -189,6 +220,13 @@ void __local_thumbnails_free();
 void __cloud_thumbnails_watch(UploadViewData *vd, bool is_on);
 // "thumb.N": the row, when it is in sight, shows the thumbnail of the path that the handle N stands for.
 void __cloud_thumbnail_arrived(UploadViewData *vd, uint32_t handle);
+
+// upload_keys.cpp
+// Lets Up and Down go from one upload that something can be done with to the next.
+void __list_keys_add(Evas_Object *genlist);
+// Sets whether a row can be tapped. A row that cannot loses the keys' focus first: the list would keep it for a row
+// that takes no keys, and they would reach nothing.
+void __row_tappable_set(Elm_Object_Item *row, bool is_tappable);
 
 // upload_list.cpp: rows.
 // A name for a text of one line in the theme, to free: escaped, for the theme's texts are markup, and with the pictures

@@ -121,6 +121,9 @@ static Evas_Object *__cancel_button_create(Evas_Object *parent, ItemData *record
     Evas_Object *layout = __list_layout_create(parent, "list/C/type.3", &button, elm_button_add);
     elm_object_style_set(button, "editfield_clear");
     elm_object_domain_translatable_text_set(button, VELORA_SHARE_DOMAIN, "IDS_CLOUD_SK2_CANCEL");
+    // Heard, not seen: there is one such button in every row.
+    const std::string name = std::string(__text("IDS_CLOUD_SK2_CANCEL")) + ", " + record->name;
+    ea_screen_reader_name_set(button, name.c_str());
     evas_object_smart_callback_add(button, "clicked", __upload_file_cancel_cb, record);
     evas_object_propagate_events_set(button, EINA_FALSE);
     return layout;
@@ -130,14 +133,16 @@ static Evas_Object *__selection_check_create(Evas_Object *parent, const ItemData
 {
     Evas_Object *check = nullptr;
     Evas_Object *layout = __check_create(parent, __selection_get(record->index), &check);
+    ea_screen_reader_name_set(check, record->name);
     evas_object_pass_events_set(check, EINA_TRUE); // a tap on it selects the row
     evas_object_repeat_events_set(layout, EINA_TRUE);
     return layout;
 }
 
-static Evas_Object *__progress_create(Evas_Object *parent, const UploadItem *item)
+static Evas_Object *__progress_create(Evas_Object *parent, const ItemData *record, const UploadItem *item)
 {
     Evas_Object *bar = elm_progressbar_add(parent);
+    ea_screen_reader_name_set(bar, record->name);
     elm_object_style_set(bar, item->state == UPLOAD_STATE_UPLOADING ? "list_progress" : "pending_custom");
     elm_progressbar_horizontal_set(bar, EINA_TRUE);
     elm_progressbar_value_set(bar, item->progress / 100.0);
@@ -166,7 +171,7 @@ static Evas_Object *__ud_genlist_uploading_content_get(void *data, Evas_Object *
         }
         return vd->is_select_mode ? __selection_check_create(obj, record) : __cancel_button_create(obj, record);
     }
-    return __is_part(part, "elm.swallow.progressbar") ? __progress_create(obj, item) : nullptr;
+    return __is_part(part, "elm.swallow.progressbar") ? __progress_create(obj, record, item) : nullptr;
 }
 
 static void __gl_del(void *data, Evas_Object *)
@@ -178,11 +183,9 @@ static void __gl_del(void *data, Evas_Object *)
     }
     // No message may reach a row that is gone.
     if (UploadViewData *vd = s_vd; vd && record->index >= 0 && record->gen_it) {
-        for (UploadItem *item : vd->run)
-            if (item->gen_it == record->gen_it)
+        for (UploadItem *item : {__run_item(vd, record->index), __upload_item_find(vd, record->index)})
+            if (item && item->gen_it == record->gen_it)
                 item->gen_it = nullptr;
-        if (UploadItem *item = __upload_item_find(vd, record->index); item && item->gen_it == record->gen_it)
-            item->gen_it = nullptr;
     }
     __content_row_forget(record);
     if (record->folder)
@@ -239,6 +242,7 @@ Evas_Object *__genlist_create(UploadViewData *vd)
     elm_object_style_set(genlist, "dialogue");
     elm_genlist_mode_set(genlist, ELM_LIST_COMPRESS);
     evas_object_smart_callback_add(genlist, "language,changed", __language_changed_cb, nullptr);
+    __list_keys_add(genlist);
     evas_object_show(genlist);
     elm_object_part_content_set(vd->layout, "elm.swallow.genlist", genlist);
     return genlist;
@@ -283,8 +287,7 @@ void __upload_row_append(UploadViewData *vd, UploadItem *item, int index)
         return;
     }
     item->gen_it = __row_append(vd, vd->itc_uploading, record, __velora_uploading_item_selected);
-    elm_genlist_item_select_mode_set(item->gen_it, vd->is_select_mode ? ELM_OBJECT_SELECT_MODE_DEFAULT
-                                                                      : ELM_OBJECT_SELECT_MODE_DISPLAY_ONLY);
+    __row_tappable_set(item->gen_it, vd->is_select_mode);
 }
 
 void __result_rows_append(UploadViewData *vd, bool is_reentry)
@@ -292,6 +295,7 @@ void __result_rows_append(UploadViewData *vd, bool is_reentry)
     AppData *ad = vd->ad;
     const bool is_success = g_strcmp0(ad->display_type, "success") == 0;
     const bool is_failure = g_strcmp0(ad->display_type, "fail") == 0;
+    __state_show(vd, is_failure && ad->result_path_count == 0 ? VIEW_STATE_FULL : VIEW_STATE_NONE);
     for (int i = 0; i < ad->result_path_count; i++) {
         UploadItem *item = __upload_item_find(vd, i);
         if (!item) {
@@ -309,7 +313,6 @@ void __result_rows_append(UploadViewData *vd, bool is_reentry)
                                     .path = g_strdup(ad->result_paths[i])};
         item->gen_it = __row_append(vd, is_success ? vd->itc_file : vd->itc_fail, record,
                                     is_success ? nullptr : __velora_uploading_item_selected);
-        elm_genlist_item_select_mode_set(item->gen_it, is_success ? ELM_OBJECT_SELECT_MODE_DISPLAY_ONLY
-                                                                  : ELM_OBJECT_SELECT_MODE_DEFAULT);
+        __row_tappable_set(item->gen_it, !is_success);
     }
 }

@@ -74,42 +74,52 @@ static char *__check_file_name_postfix(const char *base, const char *ext)
 
 static bool __check_same_file_cb(cloud_content_sync_content_h content, int error, void *data)
 {
-    auto *vd = static_cast<UploadViewData *>(data);
+    auto *taken = static_cast<std::unordered_set<std::string> *>(data);
     if (error != 0) {
         VELORA_LOGE("__content_info_cb failed");
         return true;
     }
-    if (!content || !vd) {
+    if (!content || !taken) {
         VELORA_LOGE("Invalid argument");
         return true;
     }
     char *name = nullptr;
     cloud_content_sync_content_get_name(content, &name);
-    if (name && g_strcmp0(name, vd->new_name) == 0) {
-        char *base = __get_file_base_name(name);
-        char *ext = __get_file_ext_name(name);
-        g_free(vd->new_name);
-        vd->new_name = __check_file_name_postfix(base ? base : name, base ? ext : nullptr);
-        g_free(base);
-        g_free(ext);
-    }
+    if (name)
+        taken->insert(name);
     std::free(name);
     return true;
 }
 
+TakenNames::TakenNames(UploadViewData *view) : vd(view)
+{
+    vd->taken_names.emplace();
+    if (vd->folder)
+        cloud_content_sync_folder_foreach_content_from_db(nullptr, vd->folder, __check_same_file_cb, &*vd->taken_names);
+}
+
+TakenNames::~TakenNames()
+{
+    vd->taken_names.reset();
+}
+
 char *__get_upload_server_path(UploadViewData *vd, const char *local_path)
 {
+    std::optional<TakenNames> once;
+    if (!vd->taken_names)
+        once.emplace(vd);
     vd->new_name = g_strdup(ecore_file_file_get(local_path));
-    char *previous = nullptr;
-    while (g_strcmp0(vd->new_name, previous) != 0) {
-        g_free(previous);
-        previous = g_strdup(vd->new_name);
-        if (vd->folder)
-            cloud_content_sync_folder_foreach_content_from_db(nullptr, vd->folder, __check_same_file_cb, vd);
+    while (vd->taken_names->contains(vd->new_name)) {
+        char *base = __get_file_base_name(vd->new_name);
+        char *ext = __get_file_ext_name(vd->new_name);
+        char *next = __check_file_name_postfix(base ? base : vd->new_name, base ? ext : nullptr);
+        g_free(base);
+        g_free(ext);
+        g_free(vd->new_name);
+        vd->new_name = next;
     }
     const char *folder = vd->ad->folder_path ? vd->ad->folder_path : "/";
     char *destination = g_strdup_printf(std::strcmp(folder, "/") == 0 ? "%s%s" : "%s/%s", folder, vd->new_name);
-    g_free(previous);
     g_free(vd->new_name);
     vd->new_name = nullptr;
     return destination;

@@ -210,6 +210,10 @@ int __box_noti_new(const char *title, const char *text, const char *display_type
     const AppControl request = __request_create(APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD_RESULT);
     if (!request)
         return -1;
+    // The folder stays as it is while a worker, whose result this is, runs.
+    UploadViewData *vd = s_vd;
+    if (vd && vd->ad->folder_path)
+        app_control_add_extra_data(request.get(), RESULT_FOLDER_KEY, vd->ad->folder_path);
     std::vector<const char *> existing; // a full storage counts files that have no path in the list
     for (int i = 0; paths && i < count && paths[i]; i++)
         existing.push_back(paths[i]);

@@ -141,7 +141,8 @@ static void __take_string(char **field, const char *text)
 // A request that came to nothing: the person is told why, and ends the wait with Cancel.
 static void __content_failed(int error)
 {
-    __velora_popup_indicator_popup(__failure_text(error));
+    __velora_popup_indicator_popup(error == CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE ? __text("IDS_VELORA_BODY_NOT_SAVED")
+                                                                                : __failure_text(error));
 }
 
 void __content_result_handle(UploadViewData *vd, const ContentResultMessage &message)
@@ -226,9 +227,10 @@ static void __request_refused(ItemData *record, int err)
     __content_failed(err);
 }
 
-static void __open_picture(UploadViewData *vd, ItemData *record)
+// What is here already is opened at once; what is not is asked for behind a wait.
+static void __open_or_request(UploadViewData *vd, ItemData *record, bool is_here, int (*request)(ItemData *))
 {
-    if (record->local_path && ecore_file_exists(record->local_path)) { // the cache may have let it go
+    if (is_here) {
         _velora_app_popup_delete(vd->ad);
         __launch_apps_for_velora(record);
         return;
@@ -236,28 +238,22 @@ static void __open_picture(UploadViewData *vd, ItemData *record)
     if (!__is_online(vd))
         return;
     __processing_popup_show(vd, record);
-    if (const int err = cloud_content_sync_content_get_cached_file(
-            record->content, &record->request_id, __cloud_content_sync_cache_file_get_result_cb, __row_handle(record));
-        err != 0)
+    if (const int err = request(record); err != 0)
         __request_refused(record, err);
 }
 
-static void __open_stream(UploadViewData *vd, ItemData *record)
+static int __picture_request(ItemData *record)
 {
-    if (record->stream_url) {
-        _velora_app_popup_delete(vd->ad);
-        __launch_apps_for_velora(record);
-        return;
-    }
-    if (!__is_online(vd))
-        return;
-    __processing_popup_show(vd, record);
+    return cloud_content_sync_content_get_cached_file(
+        record->content, &record->request_id, __cloud_content_sync_cache_file_get_result_cb, __row_handle(record));
+}
+
+static int __stream_request(ItemData *record)
+{
     constexpr int minutes = 30;
-    if (const int err = cloud_content_sync_content_get_streaming_url(record->content, &record->request_id,
-                                                                     kq_cloud_content_sync_streaming_url_result_cb,
-                                                                     __row_handle(record), minutes);
-        err != 0)
-        __request_refused(record, err);
+    return cloud_content_sync_content_get_streaming_url(record->content, &record->request_id,
+                                                        kq_cloud_content_sync_streaming_url_result_cb,
+                                                        __row_handle(record), minutes);
 }
 
 static bool match_cb(app_control_h, const char *, void *user_data)
@@ -348,12 +344,12 @@ void __select_item_to_launch_app(void *data, Evas_Object *, void *event_info)
     if (record->request_id) // a second tap while the first one's wait is showing
         return;
     switch (record->file_type) {
-    case FILE_TYPE_IMAGE:
-        __open_picture(vd, record);
+    case FILE_TYPE_IMAGE: // the cache may have let it go
+        __open_or_request(vd, record, record->local_path && ecore_file_exists(record->local_path), __picture_request);
         break;
     case FILE_TYPE_VIDEO:
     case FILE_TYPE_SOUND:
-        __open_stream(vd, record);
+        __open_or_request(vd, record, record->stream_url, __stream_request);
         break;
     default:
         __open_document(vd, record);

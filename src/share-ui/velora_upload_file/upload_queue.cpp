@@ -31,6 +31,7 @@ static Eina_Bool __idler_load_cb(void *data)
         vd->noti_id = noti_id;
         vd->ad->noti_priv_id = noti_id;
     }
+    const TakenNames taken_names(vd);
     GList *entry = vd->ad->upload_list;
     for (int i = 0; i < vd->total; i++, entry = entry->next) {
         if (!entry) {
@@ -60,16 +61,8 @@ void __btn_upload_cb(void *data, Evas_Object *, void *)
     }
     AppData *ad = vd->ad;
     elm_win_lower(ad->win_main); // back to the application that shares, while the files go up
-    evas_object_del(vd->done_btn);
-    evas_object_del(vd->cancel_btn);
-    vd->done_btn = vd->cancel_btn = nullptr;
-    elm_object_part_content_unset(vd->layout, "elm.swallow.folder");
-    evas_object_del(vd->toolbar);
-    vd->toolbar = nullptr;
-    elm_object_signal_emit(vd->layout, "elm.navi.hide", "elm");
-    __title_set(vd, "IDS_KQ_HEADER_VELORA_UPLOADS_ABB");
-    vd->is_upload_started = true;
-    vd->total = static_cast<int>(g_list_length(ad->upload_list));
+    __uploads_show(vd);
+    vd->total = vd->settled = static_cast<int>(g_list_length(ad->upload_list));
     if (vd->more_btn)
         elm_object_disabled_set(vd->more_btn, vd->total == 0);
     ecore_idler_add(__idler_load_cb, vd);
@@ -102,6 +95,11 @@ static void __run_ended(UploadViewData *vd)
     _velora_app_popup_delete(vd->ad);
     if (vd->done_btn) // the selection mode is on, with nothing left to select
         __remove_all_selete_item(vd);
+    Evas_Object *window = vd->ad->win_main;
+    if (__next_share_begin(vd))   // the view may be gone now
+        elm_win_activate(window); // they are waiting for an answer
+    else if (!elm_genlist_first_item_get(vd->genlist))
+        __state_show(vd, VIEW_STATE_STOPPED);
 }
 
 static void __row_store(UploadItem *item, int index)
@@ -124,8 +122,7 @@ static void __row_store(UploadItem *item, int index)
     const bool is_done = item->state == UPLOAD_STATE_DONE;
     record->type = is_done ? ITEM_TYPE_UPLOADED : ITEM_TYPE_FAILED;
     elm_genlist_item_item_class_update(item->gen_it, is_done ? vd->itc_file : vd->itc_fail);
-    elm_genlist_item_select_mode_set(item->gen_it,
-                                     is_done ? ELM_OBJECT_SELECT_MODE_DISPLAY_ONLY : ELM_OBJECT_SELECT_MODE_DEFAULT);
+    __row_tappable_set(item->gen_it, !is_done);
     elm_genlist_item_update(item->gen_it);
 }
 
@@ -161,10 +158,9 @@ static void __item_message(UploadViewData *vd, const char *message)
     UploadItem *item = __upload_item_find_running(vd, index);
     if (!item)
         VELORA_LOGE("upload_item is NULL");
-    else if (std::strcmp(pieces[0], "store") == 0) {
+    else if (std::strcmp(pieces[0], "store") == 0)
         __row_store(item, index);
-        __selection_title_refresh(vd);
-    } else if (std::strcmp(pieces[0], "update") == 0)
+    else if (std::strcmp(pieces[0], "update") == 0)
         __row_refresh_progress(item);
     g_strfreev(pieces);
 }
@@ -200,6 +196,8 @@ void __pipe_cb(void *, void *buffer, unsigned int size)
         __storage_full(vd);
     else if (g_strcmp0(message, "end") == 0)
         __run_ended(vd);
+    else if (g_strcmp0(message, "selection") == 0)
+        __selection_title_refresh(vd);
     else if (g_strcmp0(message, "meta_changed") == 0)
         __meta_changed(vd);
     else if (std::strncmp(message, "thumb.", 6) == 0)
@@ -208,38 +206,57 @@ void __pipe_cb(void *, void *buffer, unsigned int size)
         __item_message(vd, message);
 }
 
-// Takes one upload out of the queue: a cancel that comes too late is refused, but has been counted.
-void __uploading_file_mutil_cancel(UploadItem *item, UploadViewData *vd)
+// Takes one upload out of the queue: a cancel that comes too late is refused, but has been counted. False when the
+// notification need not tell of it.
+static bool __take_out(UploadItem *item, UploadViewData *vd)
 {
     vd->canceled++;
     if (!item) {
         VELORA_LOGE("upload_item is NULL");
-        return;
+        return false;
     }
     int seen = UPLOAD_STATE_WAITING;
     bool is_canceled = item->state.compare_exchange_strong(seen, UPLOAD_STATE_CANCELED);
     if (!is_canceled && seen == UPLOAD_STATE_UPLOADING)
         is_canceled = item->state.compare_exchange_strong(seen, UPLOAD_STATE_CANCELED);
-    if (is_canceled) {
-        if (item->gen_it)
-            elm_object_item_del(item->gen_it);
-        item->gen_it = nullptr;
-        const bool was_running = seen == UPLOAD_STATE_UPLOADING;
-        const int result = was_running ? cloud_content_sync_cancel(vd->ad->sync_handle, item->request) : 0;
-        __worker_wake();
-        if (result != 0) {
-            VELORA_LOGE("cloud_content_sync_cancel failed");
-            return;
-        }
-    } else {
+    if (!is_canceled) {
         VELORA_LOGI("--- Cann't cancel it");
+        return true;
     }
+    if (item->gen_it)
+        elm_object_item_del(item->gen_it);
+    item->gen_it = nullptr;
+    const bool was_running = seen == UPLOAD_STATE_UPLOADING;
+    const int result = was_running ? cloud_content_sync_cancel(vd->ad->sync_handle, item->request) : 0;
+    __worker_wake();
+    if (result != 0)
+        VELORA_LOGE("cloud_content_sync_cancel failed");
+    return result == 0;
+}
+
+static void __tell_remaining(UploadViewData *vd)
+{
     char text[32];
     const int remaining = vd->total - vd->canceled;
     std::snprintf(text, sizeof text, "%d / %d", vd->success + vd->fail, remaining);
     __progress_noti_set_content(vd->noti_id, text);
     if (remaining < 1)
         _velora_common_pipe_send_msg(vd->pipe, "end");
+}
+
+void __uploading_file_mutil_cancel(UploadItem *item, UploadViewData *vd)
+{
+    if (__take_out(item, vd))
+        __tell_remaining(vd);
+}
+
+void __uploads_cancel(UploadViewData *vd, const std::vector<UploadItem *> &items)
+{
+    bool is_told = false;
+    for (auto item = items.rbegin(); item != items.rend(); ++item)
+        is_told |= __take_out(*item, vd);
+    if (is_told)
+        __tell_remaining(vd);
 }
 
 static void __cancel_job(void *data)
@@ -293,7 +310,9 @@ static void __upload_again_fail_popup(void *data, Evas_Object *, void *)
         VELORA_LOGE("data is NULL");
         return;
     }
+    _velora_app_popup_delete(vd->ad); // first: it gives the focus back to the row
     vd->is_uploading = true;
+    vd->ad->exit_on_pause = 0; // a result that is only looked at may go, not one that is tried again
     UploadItem *item = __upload_item_find(vd, record->index);
     if (item) { // the row shows a file that waits, not one that failed
         item->error = 0;
@@ -305,7 +324,7 @@ static void __upload_again_fail_popup(void *data, Evas_Object *, void *)
         record->vd = vd;
         record->type = ITEM_TYPE_UPLOADING;
         elm_genlist_item_item_class_update(record->gen_it, vd->itc_uploading);
-        elm_genlist_item_select_mode_set(record->gen_it, ELM_OBJECT_SELECT_MODE_DISPLAY_ONLY);
+        __row_tappable_set(record->gen_it, false);
         elm_genlist_item_update(record->gen_it);
     }
     if (vd->noti_id < 1) {
@@ -315,7 +334,6 @@ static void __upload_again_fail_popup(void *data, Evas_Object *, void *)
         vd->ad->noti_priv_id = noti_id;
     }
     ecore_idler_add(__idler_uploading_cb, GINT_TO_POINTER(record->index));
-    _velora_app_popup_delete(vd->ad);
 }
 
 void __retry_popup_show(ItemData *record)

@@ -33,6 +33,7 @@ static void __show_count(UploadViewData *vd, int count)
     char title[64];
     std::snprintf(title, sizeof title, __text("%d Selected"), count);
     elm_object_item_part_text_set(vd->nf_item, "elm.text.title", title);
+    ea_screen_reader_name_set(__page_of(vd), title);
     if (vd->done_btn)
         elm_object_disabled_set(vd->done_btn, count == 0);
 }
@@ -196,6 +197,7 @@ static Evas_Object *__ud_delete_all_content_get(void *data, Evas_Object *obj, co
     if (std::strcmp(part, "elm.icon.2") != 0)
         return nullptr;
     Evas_Object *layout = __check_create(obj, s_is_select_all, &s_select_all_check);
+    ea_screen_reader_name_set(s_select_all_check, __text("Select All"));
     evas_object_event_callback_add(s_select_all_check, EVAS_CALLBACK_DEL, __select_all_check_deleted_cb, nullptr);
     evas_object_pass_events_set(s_select_all_check, EINA_TRUE); // a tap on it is a tap on the row
     evas_object_repeat_events_set(layout, EINA_TRUE);
@@ -259,12 +261,13 @@ static void __select_all_list_delete(UploadViewData *vd)
 
 static void __rows_refresh(UploadViewData *vd)
 {
-    for (int i = 0; i < vd->total; i++) {
-        const UploadItem *item = __upload_item_find(vd, i);
-        if (!item) {
+    GList *entry = vd->ad->upload_list;
+    for (int i = 0; i < vd->total; i++, entry = entry->next) {
+        if (!entry) {
             VELORA_LOGE("upload_item is NULL");
             return;
         }
+        const auto *item = static_cast<const UploadItem *>(entry->data);
         if (!item->gen_it) // taken out, or not in the list
             continue;
         auto *record = static_cast<ItemData *>(elm_object_item_data_get(item->gen_it));
@@ -275,8 +278,7 @@ static void __rows_refresh(UploadViewData *vd)
         record->is_selected = __selection_get(i);
         const bool is_tappable =
             record->type == ITEM_TYPE_FAILED || (vd->is_select_mode && record->type == ITEM_TYPE_UPLOADING);
-        elm_genlist_item_select_mode_set(item->gen_it, is_tappable ? ELM_OBJECT_SELECT_MODE_DEFAULT
-                                                                   : ELM_OBJECT_SELECT_MODE_DISPLAY_ONLY);
+        __row_tappable_set(item->gen_it, is_tappable);
         elm_genlist_item_update(item->gen_it);
     }
 }
@@ -320,13 +322,16 @@ static void __btn_delete_cancel_cb(void *data, Evas_Object *, void *)
 // Takes every selected upload out of the queue.
 static void __stop_selected(UploadViewData *vd)
 {
-    for (int i = 0; i < vd->total; i++) {
+    std::vector<UploadItem *> selected;
+    GList *entry = vd->ad->upload_list;
+    for (int i = 0; i < vd->total && entry; i++, entry = entry->next) {
         if (!__selection_get(i))
             continue;
         __selection_set(i, false);
-        if (UploadItem *item = __upload_item_find(vd, i); item && item->gen_it)
-            __uploading_file_mutil_cancel(item, vd);
+        if (auto *item = static_cast<UploadItem *>(entry->data); item->gen_it)
+            selected.push_back(item);
     }
+    __uploads_cancel(vd, selected);
 }
 
 static void __btn_stop_cb(void *data, Evas_Object *, void *)

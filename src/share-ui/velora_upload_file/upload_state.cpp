@@ -109,14 +109,16 @@ void __state_show(UploadViewData *vd, ViewState state)
         {"velora_state_offline", "IDS_VELORA_STATE_OFFLINE_TITLE", "IDS_VELORA_STATE_OFFLINE_TEXT"},
         {"velora_state_error", "IDS_VELORA_STATE_ERROR_TITLE", "IDS_VELORA_STATE_ERROR_TEXT"},
         {"velora_state_error", "IDS_VELORA_STATE_SIGNED_OUT_TITLE", "IDS_VELORA_STATE_SIGNED_OUT_TEXT"},
+        {"velora_state_stopped", "IDS_VELORA_STATE_STOPPED_TITLE", "IDS_VELORA_STATE_STOPPED_TEXT"},
+        {"velora_state_error", "IDS_CLOUD_POP_UPLOAD_FAILED", "IDS_VELORA_BODY_STORAGE_FULL"},
     };
     if (vd->state)
         evas_object_del(vd->state);
     vd->state = nullptr;
     elm_object_signal_emit(vd->layout, state == VIEW_STATE_NONE ? "velora,state,hide" : "velora,state,show", "velora");
-    const bool is_usable = state == VIEW_STATE_NONE || state == VIEW_STATE_EMPTY;
+    const bool has_retry = state == VIEW_STATE_OFFLINE || state == VIEW_STATE_ERROR || state == VIEW_STATE_SIGNED_OUT;
     if (vd->done_btn && !vd->is_select_mode)
-        elm_object_disabled_set(vd->done_btn, !is_usable);
+        elm_object_disabled_set(vd->done_btn, has_retry || state == VIEW_STATE_LOADING);
     if (state == VIEW_STATE_NONE)
         return;
 
@@ -128,7 +130,7 @@ void __state_show(UploadViewData *vd, ViewState state)
     elm_object_domain_translatable_part_text_set(vd->state, "velora.title", VELORA_SHARE_DOMAIN, looks[state].title);
     if (looks[state].text)
         elm_object_domain_translatable_part_text_set(vd->state, "velora.text", VELORA_SHARE_DOMAIN, looks[state].text);
-    if (!is_usable && state != VIEW_STATE_LOADING) {
+    if (has_retry) {
         Evas_Object *button = elm_button_add(vd->state);
         elm_object_domain_translatable_text_set(button, VELORA_SHARE_DOMAIN, "IDS_VELORA_BUTTON_RETRY");
         evas_object_smart_callback_add(button, "clicked", __retry_cb, nullptr);

@@ -1,4 +1,6 @@
 // The upload view's life: built by a share or a result, left by Back, Cancel or a failure.
+#include "app/app_control.h"
+#include "notification/notification.h"
 #include "velora_common/velora_local_data.h"
 #include "velora_common/velora_network.h"
 #include "velora_common/velora_paths.h"
@@ -9,38 +11,19 @@
 #include <cstdlib>
 #include <cstring>
 
-std::atomic<UploadViewData *> s_vd = nullptr;
-std::atomic<Ecore_Pipe *> s_view_pipe = nullptr;
+static const char s_title[] = "IDS_KQ_HEADER_UPLOAD_TO_ABB2";
 
 static void __more_create_folder_cb(void *data, Evas_Object *obj, void *event_info);
 
-static void __more_create_folder_cb(void *data, Evas_Object *obj, void *event_info);
-
-const char *__last_segment(const char *path)
+Evas_Object *__page_of(UploadViewData *vd)
 {
-    const char *slash = path ? std::strrchr(path, '/') : nullptr;
-    return slash ? slash + 1 : path;
-}
-
-UploadItem *__upload_item_find(UploadViewData *vd, int index)
-{
-    return index < 0 ? nullptr
-                     : static_cast<UploadItem *>(g_list_nth_data(vd->ad->upload_list, static_cast<guint>(index)));
-}
-
-UploadItem *__upload_item_find_running(UploadViewData *vd, int index)
-{
-    if (!vd->thread)
-        return __upload_item_find(vd, index);
-    for (UploadItem *item : vd->run)
-        if (item->index == index)
-            return item;
-    return nullptr;
+    return elm_object_parent_widget_get(vd->layout);
 }
 
 void __title_set(UploadViewData *vd, const char *id)
 {
     elm_object_item_domain_translatable_part_text_set(vd->nf_item, "elm.text.title", VELORA_SHARE_DOMAIN, id);
+    ea_screen_reader_name_set(__page_of(vd), __text(id));
 }
 
 void __pipe_ensure(UploadViewData *vd)
@@ -62,6 +45,7 @@ void __destroy_view(UploadViewData *vd)
     if (vd->pathinfo_timer)
         ecore_timer_del(vd->pathinfo_timer);
     _velora_upload_list_free(&vd->ad->upload_list);
+    _velora_upload_list_free(&vd->kept);
     if (vd->noti_id != -1)
         __progress_noti_delete(vd->noti_id);
     if (vd->folder)
@@ -134,7 +118,7 @@ static void __go_away(UploadViewData *vd)
 {
     if (vd->thread)
         elm_win_lower(vd->ad->win_main);
-    else
+    else if (!__next_share_begin(vd))
         __leave(vd);
 }
 
@@ -196,21 +180,20 @@ static void __push_on_naviframe(UploadViewData *vd)
 {
     vd->layout = elm_layout_add(vd->ad->naviframe);
     elm_layout_file_set(vd->layout, _velora_common_app_file("res/edje/velora.edj").c_str(), "main");
+    elm_theme_extension_add(nullptr, _velora_common_app_file("res/edje/velora_genlist.edj").c_str());
     if (vd->ad->launch_mode != LAUNCH_MODE_UPLOAD_RESULT)
         __path_bar_create(vd);
-    else
-        elm_theme_extension_add(nullptr, _velora_common_app_file("res/edje/velora_genlist.edj").c_str());
     __item_classes_create(vd);
     vd->genlist = __genlist_create(vd);
 
-    static const char title[] = "IDS_KQ_HEADER_UPLOAD_TO_ABB2";
     Evas_Object *back = elm_button_add(vd->ad->naviframe);
     elm_object_style_set(back, "naviframe/end_btn/default");
     // Drawn as a sign; the words are for the screen reader.
     elm_object_domain_translatable_text_set(back, VELORA_SHARE_DOMAIN, "IDS_VELORA_BODY_BACK");
-    vd->nf_item = elm_naviframe_item_push(vd->ad->naviframe, title, back, nullptr, vd->layout, nullptr);
-    __title_set(vd, title);
+    vd->nf_item = elm_naviframe_item_push(vd->ad->naviframe, s_title, back, nullptr, vd->layout, nullptr);
+    __title_set(vd, s_title);
     elm_naviframe_item_pop_cb_set(vd->nf_item, __btn_back_cb, vd);
+    evas_object_smart_callback_add(vd->ad->naviframe, "elm,action,more_event", __more_create_folder_cb, vd);
     evas_object_smart_callback_add(
         back, "clicked",
         [](void *nf, Evas_Object *, void *) { elm_naviframe_item_pop(static_cast<Evas_Object *>(nf)); },
@@ -240,15 +223,15 @@ static bool __share_create(UploadViewData *vd)
     elm_object_style_set(vd->more_btn, "naviframe/more/default");
     elm_object_domain_translatable_text_set(vd->more_btn, VELORA_SHARE_DOMAIN, "IDS_VELORA_BODY_MORE_OPTIONS");
     evas_object_smart_callback_add(vd->more_btn, "clicked", __more_create_folder_cb, vd);
-    evas_object_smart_callback_add(ad->naviframe, "elm,action,more_event", __more_create_folder_cb, vd);
     elm_object_item_part_content_set(vd->nf_item, "toolbar_more_btn", vd->more_btn);
     elm_object_disabled_set(vd->more_btn, EINA_TRUE); // its menu belongs to a queue
-    if (cloud_content_sync_folder_get_root(ad->sync_handle, &vd->folder) != 0) {
+    cloud_content_sync_folder_h root = nullptr;
+    if (cloud_content_sync_folder_get_root(ad->sync_handle, &root) != 0) {
         VELORA_LOGE("cloud_content_sync_folder_get_root failed");
         __leave(vd);
         return false;
     }
-    __folder_path_take(vd);
+    __folder_open(vd, root);
     VELORA_LOGI("path: %s", ad->folder_path);
     vd->cancel_btn = __title_button_create(vd, "naviframe/title_text_left", "IDS_TPLATFORM_ACBUTTON_CANCEL_ABB",
                                            "title_left_text_btn", __btn_cancel_cb);
@@ -257,9 +240,96 @@ static bool __share_create(UploadViewData *vd)
     return true;
 }
 
+// Shows the folders, and a wait when the client does not know them yet.
+static void __browse(UploadViewData *vd)
+{
+    __cloud_thumbnails_watch(vd, true);
+    __meta_refresh_start(vd);
+    if (vd->ad->is_meta_refreshed)
+        _velora_upload_view_update();
+    else
+        vd->ad->popup = _velora_common_create_processing_popup(vd->ad->win_main, __popup_hide_cb, vd);
+}
+
+void __uploads_show(UploadViewData *vd)
+{
+    for (Evas_Object **widget : {&vd->done_btn, &vd->cancel_btn, &vd->toolbar}) {
+        if (*widget)
+            evas_object_del(*widget);
+        *widget = nullptr;
+    }
+    if (vd->pathinfo_timer)
+        ecore_timer_del(vd->pathinfo_timer);
+    vd->pathinfo_timer = nullptr;
+    remove_genlist_item(vd->genlist); // a long list that still measures its rows would keep idlers waiting
+    elm_object_signal_emit(vd->layout, "elm.navi.hide", "elm");
+    __title_set(vd, "IDS_KQ_HEADER_VELORA_UPLOADS_ABB");
+    vd->is_upload_started = true;
+}
+
+void _velora_upload_view_keep_waiting(AppData *ad)
+{
+    UploadViewData *vd = s_vd;
+    if (!vd)
+        return;
+    GList *waiting = g_list_nth(ad->upload_list, static_cast<guint>(vd->settled));
+    if (!waiting)
+        return;
+    if (waiting->prev)
+        waiting->prev->next = nullptr;
+    else
+        ad->upload_list = nullptr;
+    waiting->prev = nullptr;
+    vd->kept = g_list_concat(vd->kept, waiting);
+}
+
+static bool __is_any_waiting(const UploadViewData *vd)
+{
+    return vd->kept || g_list_nth(vd->ad->upload_list, static_cast<guint>(vd->settled));
+}
+
+bool __next_share_begin(UploadViewData *vd)
+{
+    if (!vd->is_upload_started || vd->thread || !__is_any_waiting(vd))
+        return false;
+    AppData *ad = vd->ad;
+    VELORA_LOGI("the files of another share are next");
+    _velora_app_popup_delete(ad);
+    remove_genlist_item(vd->genlist);
+    _velora_upload_view_keep_waiting(ad);
+    _velora_upload_list_free(&ad->upload_list);
+    ad->upload_list = vd->kept;
+    vd->kept = nullptr;
+    ad->exit_on_pause = 0;
+    vd->settled = 0;
+    vd->total = vd->canceled = vd->success = vd->fail = 0;
+    vd->is_upload_started = false;
+    vd->is_end_handled = false;
+    __path_bar_create(vd);
+    elm_object_signal_emit(vd->layout, "elm.navi.show", "elm");
+    __title_set(vd, s_title);
+    if (__share_create(vd))
+        __browse(vd);
+    return true;
+}
+
+// The folder that the files of a result were meant for, so that another try leads there again.
+static void __result_folder_open(UploadViewData *vd)
+{
+    AppData *ad = vd->ad;
+    char *path = nullptr;
+    cloud_content_sync_folder_h folder = nullptr;
+    if (ad->app_control && app_control_get_extra_data(ad->app_control, RESULT_FOLDER_KEY, &path) == 0 && path &&
+        cloud_content_sync_get_folder_by_server_path(ad->sync_handle, path, &folder) == 0)
+        __folder_open(vd, folder);
+    std::free(path);
+}
+
 // Prepares the items of a result; false when one is missing.
 static bool __result_items_prepare(UploadViewData *vd)
 {
+    vd->settled = vd->ad->result_path_count;
+    const TakenNames taken_names(vd);
     for (int i = 0; i < vd->ad->result_path_count; i++) {
         UploadItem *item = __upload_item_find(vd, i);
         if (!item) {
@@ -277,11 +347,10 @@ static bool __result_items_prepare(UploadViewData *vd)
 static void __result_create(UploadViewData *vd)
 {
     _velora_app_popup_delete(vd->ad);
+    __result_folder_open(vd);
     if (!__result_items_prepare(vd))
         return;
-    vd->is_upload_started = true;
-    __title_set(vd, "IDS_KQ_HEADER_VELORA_UPLOADS_ABB");
-    elm_object_signal_emit(vd->layout, "elm.navi.hide", "elm");
+    __uploads_show(vd);
     __result_rows_append(vd, false);
     __pipe_ensure(vd);
 }
@@ -289,17 +358,28 @@ static void __result_create(UploadViewData *vd)
 static void __uploaded_genlist(UploadViewData *vd)
 {
     remove_genlist_item(vd->genlist);
-    vd->ad->exit_on_pause = 1;
+    // Not behind the back of a queue or of files that still have to be sent somewhere.
+    vd->ad->exit_on_pause = !vd->thread && !__is_any_waiting(vd);
     __result_rows_append(vd, true);
 }
 
 static void __reenter(UploadViewData *vd)
 {
     _velora_app_popup_delete(vd->ad);
-    if (vd->ad->launch_mode != LAUNCH_MODE_UPLOAD_RESULT)
+    if (vd->ad->launch_mode != LAUNCH_MODE_UPLOAD_RESULT) {
+        if (vd->is_upload_started && vd->thread)
+            notification_status_message_post(__text("IDS_VELORA_BODY_FILES_FOLLOW"));
+        else
+            __next_share_begin(vd);
         return;
-    if (__result_items_prepare(vd))
-        __uploaded_genlist(vd);
+    }
+    if (!vd->thread)
+        __result_folder_open(vd);
+    if (!__result_items_prepare(vd))
+        return;
+    if (!vd->is_upload_started)
+        __uploads_show(vd);
+    __uploaded_genlist(vd);
 }
 
 void _velora_upload_view_create(AppData *ad)
@@ -334,12 +414,7 @@ void _velora_upload_view_create(AppData *ad)
     if (ad->launch_mode == LAUNCH_MODE_SHARE && !__share_create(vd))
         return;
     __pipe_ensure(vd);
-    __cloud_thumbnails_watch(vd, true);
-    __meta_refresh_start(vd);
-    if (ad->is_meta_refreshed)
-        _velora_upload_view_update();
-    else
-        ad->popup = _velora_common_create_processing_popup(ad->win_main, __popup_hide_cb, vd);
+    __browse(vd);
 }
 
 static void __nothing_to_upload(UploadViewData *vd)
@@ -357,6 +432,7 @@ void _velora_upload_view_update()
         VELORA_LOGE("vd is NULL");
         return;
     }
+    const bool was_focused = elm_object_focus_get(vd->genlist);
     remove_genlist_item(vd->genlist);
     if (vd->thread) {
         GList *entry = vd->ad->upload_list;
@@ -375,6 +451,8 @@ void _velora_upload_view_update()
         return;
     }
     const int rows = __folder_list_append(vd);
+    if (Elm_Object_Item *first = elm_genlist_first_item_get(vd->genlist); was_focused && first)
+        elm_object_item_focus_set(first, EINA_TRUE);
     const ViewState unreachable = __meta_state();
     __state_show(vd, rows > 0 ? VIEW_STATE_NONE : unreachable != VIEW_STATE_NONE ? unreachable : VIEW_STATE_EMPTY);
     __nothing_to_upload(vd);

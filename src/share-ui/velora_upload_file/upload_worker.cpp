@@ -209,6 +209,7 @@ void *__thread_upload_file(void *data)
             return nullptr; // the view is being taken down: nobody to report to
         __count_result(vd, item, &result);
         __selection_set(n, false);
+        _velora_common_pipe_send_msg(vd->pipe, "selection"); // "store.N" may have been read before
         if (result.is_storage_full)
             break;
         if (const int remaining = vd->total - vd->canceled; remaining > 0)

@@ -9,6 +9,10 @@ void _velora_upload_view_create(AppData *ad);
 // Fills the list again, from the queue and the open folder.
 void _velora_upload_view_update();
 
+// Call before AppData's list is replaced by a result's: the files in it that no folder was chosen for yet wait in the
+// view, which offers them again when it is free.
+void _velora_upload_view_keep_waiting(AppData *ad);
+
 // Takes the view down, if there is one, and stops its uploads. The widgets must still be there.
 void _velora_upload_view_end();
 

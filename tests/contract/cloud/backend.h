@@ -1,49 +1,50 @@
 #pragma once
 // What the contract of the cloud client is tried against: WebDAV servers, or the fake library.
+#include "transfers.h"
 #include <memory>
 #include <optional>
-#include <string>
-#include <vector>
 
-struct Ability {
-    bool real = true;               // a service on the network, with credentials and a description
-    bool atomic_names = true;       // two clients at once never get the same name
-    std::vector<std::string> taboo; // names that it refuses
+struct Backend {
+    bool is_real = true;        // a service on the network, with credentials and a description
+    Names taboo = {};           // names that it refuses
+    std::string media_url = {}; // of the account interface that gives thumbnails, and addresses to stream from
+
+    std::function<void(const std::string &path)> make_folder = {}, remove = {};
+    std::function<void(const std::string &path, const std::string &bytes)> store = {};
+    std::function<std::optional<std::string>(const std::string &path)> content = {};
+    std::function<Names(const std::string &folder)> list = {}; // unsorted
+    std::function<void()> go_down = {};                        // from now on the service cannot be reached
+    std::vector<std::shared_ptr<void>> owned = {};
 };
 
-// Options: what a test wants of the service, as long as it can.
-struct Wish {
-    int lose_reply = 0;  // store the nth upload but do not answer
-    int fail_status = 0; // answer the first upload with this status
-    int quota = 0;       // bytes
-};
-
-class Backend {
-  public:
-    virtual ~Backend() = default;
-    virtual Ability ability() const = 0;
-    virtual void make_folder(const std::string &path) = 0;
-    virtual void store(const std::string &path, const std::string &bytes) = 0;
-    virtual void remove(const std::string &path) = 0;
-    virtual std::optional<std::string> content(const std::string &path) = 0;
-    // Names below a folder, unsorted.
-    virtual std::vector<std::string> list(const std::string &folder) = 0;
-    // From now on the service cannot be reached.
-    virtual void go_down() = 0;
-};
+// Who is signed in.
+inline constexpr char USER[] = "someone@example.org", PASSWORD[] = "a secret: with colon";
 
 // The backends of this program; each is started with an empty tree, its service is called "Test", and somebody is
-// signed in to it. Null when the wish cannot be fulfilled.
-std::vector<std::string> backend_names();
-std::unique_ptr<Backend> start_backend(const std::string &name, const Wish &wish);
+// signed in to it. Nothing when it does not start.
+Names backend_names();
+std::optional<Backend> start_backend(const std::string &name);
 
-// A folder that is removed with everything in it.
-struct Scratch {
-    Scratch();
-    ~Scratch();
-    std::string path;
-    // Writes a file into the folder and gives its path.
-    std::string file(const std::string &name, const std::string &bytes) const;
+// A backend and a client of it.
+class OnBackend : public testing::TestWithParam<std::string> {
+  protected:
+    void TearDown() override
+    {
+        if (handle)
+            cloud_content_sync_destroy(handle);
+        handle = nullptr;
+    }
+    bool open()
+    {
+        backend = start_backend(GetParam());
+        if (backend) {
+            EXPECT_EQ(cloud_content_sync_create("Test", &handle), 0);
+        }
+        return backend && handle;
+    }
+
+    TempHome home;      // the client's
+    TempFolder scratch; // for local files
+    std::optional<Backend> backend;
+    cloud_content_sync_h handle = nullptr;
 };
-// Bytes that are the same for the same seed.
-std::string some_bytes(size_t size, unsigned seed);

@@ -1,15 +1,9 @@
 #pragma once
-// An HTTP server that says what a test tells it to, whole or broken.
-#include <algorithm>
-#include <cstdlib>
-#include <functional>
-#include <mutex>
+// An HTTP server that says what a test tells it to, whole or broken, and a client of it.
+#include "transfers.h"
 #include <netinet/in.h>
-#include <string>
 #include <sys/socket.h>
-#include <thread>
 #include <unistd.h>
-#include <vector>
 
 struct Request {
     std::string method, path, body, authorization;
@@ -19,7 +13,7 @@ struct Request {
 class ScriptedServer {
   public:
     // Gives the whole answer, header and body; "" closes the connection without one. "\x01" at the end of an answer
-    // closes the connection after it. Called under the lock below.
+    // closes the connection after it. Called under the lock.
     using Script = std::function<std::string(const Request &)>;
 
     explicit ScriptedServer(Script answers) : script(std::move(answers))
@@ -32,7 +26,7 @@ class ScriptedServer {
         if (bind(listener, reinterpret_cast<sockaddr *>(&address), size) != 0 || listen(listener, 16) != 0 ||
             getsockname(listener, reinterpret_cast<sockaddr *>(&address), &size) != 0)
             std::abort();
-        port = ntohs(address.sin_port);
+        url = "http://127.0.0.1:" + std::to_string(ntohs(address.sin_port));
         acceptor = std::thread([this] {
             for (int fd = 0; (fd = accept4(listener, nullptr, nullptr, SOCK_CLOEXEC)) >= 0;)
                 workers.emplace_back([this, fd, number = static_cast<int>(workers.size()) + 1] { run(fd, number); });
@@ -50,94 +44,59 @@ class ScriptedServer {
     ScriptedServer(const ScriptedServer &) = delete;
     ScriptedServer &operator=(const ScriptedServer &) = delete;
 
-    std::string url() const
-    {
-        return "http://127.0.0.1:" + std::to_string(port);
-    }
+    std::string url;
     std::vector<Request> requests()
     {
         std::scoped_lock lock(mutex);
         return seen;
     }
-    // What the script reads is changed under this.
-    std::mutex mutex;
+    // From now on this is the answer to everything.
+    void say(const std::string &answer)
+    {
+        std::scoped_lock lock(mutex);
+        script = [answer](const Request &) { return answer; };
+    }
 
   private:
-    static std::string field(const std::string &head, const std::string &name)
+    // False when the connection ends.
+    static bool read_request(FILE *stream, Request &request)
     {
-        const size_t at = head.find("\r\n" + name + ": ");
-        if (at == head.npos)
-            return "";
-        const size_t begin = at + name.size() + 4;
-        return head.substr(begin, head.find("\r\n", begin) - begin);
-    }
-
-    static bool send_all(int fd, const std::string &bytes)
-    {
-        for (size_t sent = 0; sent < bytes.size();) {
-            const ssize_t count = send(fd, bytes.data() + sent, bytes.size() - sent, MSG_NOSIGNAL);
-            if (count < 0)
-                return false;
-            sent += static_cast<size_t>(count);
-        }
-        return true;
-    }
-
-    // Appends what comes until there are `size` bytes.
-    static bool receive(int fd, std::string &bytes, size_t size)
-    {
-        char buffer[65536];
-        while (bytes.size() < size) {
-            const ssize_t got = read(fd, buffer, sizeof buffer);
-            if (got <= 0)
-                return false;
-            bytes.append(buffer, static_cast<size_t>(got));
-        }
-        return true;
-    }
-
-    bool read_request(int fd, std::string &bytes, Request &request)
-    {
-        size_t end = 0;
-        while ((end = bytes.find("\r\n\r\n")) == bytes.npos)
-            if (!receive(fd, bytes, bytes.size() + 1))
-                return false;
-        const std::string head = bytes.substr(0, end + 2);
-        const size_t length = std::strtoull(field(head, "Content-Length").c_str(), nullptr, 10);
-        if (!receive(fd, bytes, end + 4 + length))
+        char line[4096], method[16], path[2048];
+        if (!fgets(line, sizeof line, stream) || sscanf(line, "%15s %2047s", method, path) != 2)
             return false;
-        request.method = head.substr(0, head.find(' '));
-        request.path = head.substr(request.method.size() + 1);
-        request.path.resize(request.path.find(' '));
-        request.body = bytes.substr(end + 4, length);
-        request.authorization = field(head, "Authorization");
-        bytes.erase(0, end + 4 + length);
-        return true;
+        size_t length = 0;
+        request = {method, path, "", "", request.connection};
+        while (fgets(line, sizeof line, stream) && line[0] != '\r') {
+            const std::string field(line, std::strlen(line) - 2);
+            if (field.starts_with("Authorization: "))
+                request.authorization = field.substr(15);
+            if (field.starts_with("Content-Length: "))
+                length = std::stoul(field.substr(16));
+        }
+        request.body.resize(length);
+        return fread(request.body.data(), 1, length, stream) == length;
     }
 
     void run(int fd, int number)
     {
-        std::string bytes;
-        Request request;
-        request.connection = number;
-        for (bool goes_on = true; goes_on && read_request(fd, bytes, request);) {
-            std::string answer;
-            {
-                std::scoped_lock lock(mutex);
-                seen.push_back(request);
-                answer = script(request);
-            }
+        FILE *stream = fdopen(fd, "r");
+        Request request{"", "", "", "", number};
+        for (bool goes_on = true; goes_on && read_request(stream, request);) {
+            std::unique_lock lock(mutex);
+            seen.push_back(request);
+            std::string answer = script(request);
+            lock.unlock();
             goes_on = !answer.empty() && answer.back() != '\x01';
             if (!goes_on && !answer.empty())
                 answer.pop_back();
-            goes_on = send_all(fd, answer) && goes_on;
+            goes_on = send(fd, answer.data(), answer.size(), MSG_NOSIGNAL) >= 0 && goes_on;
         }
-        close(fd);
+        fclose(stream);
     }
 
+    std::mutex mutex;
     Script script;
     int listener = -1;
-    int port = 0;
     std::thread acceptor;
     std::vector<std::thread> workers; // the acceptor's until it has ended
     std::vector<Request> seen;
@@ -148,3 +107,53 @@ inline std::string answer(const std::string &status, const std::string &body = "
     return "HTTP/1.1 " + status + "\r\nContent-Length: " + std::to_string(body.size()) + "\r\n" + fields + "\r\n" +
            body;
 }
+
+inline std::string multistatus(const std::string &responses)
+{
+    return answer("207 Multi-Status",
+                  "<?xml version=\"1.0\"?><d:multistatus xmlns:d=\"DAV:\" xmlns:v=\"urn:velora:dav\">" + responses +
+                      "</d:multistatus>");
+}
+
+inline std::string folder(const std::string &href)
+{
+    return "<d:response><d:href>" + href + "</d:href><d:propstat><d:prop><d:resourcetype><d:collection/>" +
+           "</d:resourcetype></d:prop><d:status>HTTP/1.1 200 OK</d:status></d:propstat></d:response>";
+}
+
+inline std::string file(const std::string &href, const std::string &size = "5", const std::string &more = "")
+{
+    return "<d:response><d:href>" + href + "</d:href><d:propstat><d:prop><d:resourcetype/><d:getcontentlength>" + size +
+           "</d:getcontentlength>" + more + "</d:prop><d:status>HTTP/1.1 200 OK</d:status></d:propstat></d:response>";
+}
+
+// SHA-256 of "hello".
+inline constexpr char HELLO_HEX[] = "2cf24dba5fb0a30e26e83b2ac5b9e29e1b161e5c1fa7425e73043362938b9824";
+inline constexpr char HELLO_DIGEST[] = "Repr-Digest: sha-256=:LPJNul+wow4m6DsqxbninhsWHlwfp0JecwQzYpOLmCQ=:\r\n";
+inline constexpr char WRONG_DIGEST[] = "Repr-Digest: sha-256=:AAAAul+wow4m6DsqxbninhsWHlwfp0JecwQzYpOLmCQ=:\r\n";
+
+class Scripted : public testing::Test {
+  protected:
+    void serve(ScriptedServer::Script script, int stall_seconds = 1)
+    {
+        TearDown();
+        server = std::make_unique<ScriptedServer>(std::move(script));
+        home.file("Test.conf", "[Service]\nStorage=" + server->url + "/r%20t/\nApi=" + server->url +
+                                   "/api/\nStallTimeout=" + std::to_string(stall_seconds) + "\n");
+        setenv("CLOUD_SERVICES_DIR", home.path.c_str(), 1);
+        ASSERT_EQ(cloud_content_sync_credentials_set("Test", nullptr, "token"), 0);
+        ASSERT_EQ(cloud_content_sync_create("Test", &handle), 0);
+    }
+    void TearDown() override
+    {
+        if (handle)
+            cloud_content_sync_destroy(handle);
+        handle = nullptr;
+        server.reset();
+    }
+
+    TempHome home;
+    TempFolder scratch; // for local files
+    std::unique_ptr<ScriptedServer> server;
+    cloud_content_sync_h handle = nullptr;
+};

@@ -1,13 +1,18 @@
 #pragma once
-// What the client's callbacks brought, for tests that wait for it.
+// What the client's callbacks brought, for tests that wait for it, and what its database holds.
 #include "base/base.h"
 #include "cloud_content_sync/cloud_content_sync.h"
+#include "temp_home.h"
+#include <algorithm>
 #include <chrono>
 #include <condition_variable>
+#include <cstring>
 #include <functional>
-#include <mutex>
-#include <string>
+#include <gtest/gtest.h>
+#include <random>
 #include <vector>
+
+using Names = std::vector<std::string>;
 
 struct Call {
     int state;
@@ -15,12 +20,14 @@ struct Call {
     int error;
 };
 
-// User data of one upload or refresh.
+// User data of one upload, refresh or request about a file.
 struct Watch {
     std::function<void(const Call &)> hook; // runs within the callback
     std::mutex mutex;
     std::condition_variable changed;
     std::vector<Call> calls;
+    std::string text; // of a request's callback; paths of thumbnails, a line each
+    int status = 0;
 
     void add(const Call &call)
     {
@@ -42,6 +49,10 @@ struct Watch {
         std::unique_lock lock(mutex);
         return changed.wait_for(lock, std::chrono::seconds(60), [&] { return condition(calls); });
     }
+    bool wait_for_progress(int progress)
+    {
+        return wait([&](const auto &all) { return !all.empty() && all.back().progress >= progress; });
+    }
     // The error of the last callback; -1 when there was none.
     int end()
     {
@@ -61,6 +72,14 @@ inline void refresh_cb(int status, int error, void *data)
     static_cast<Watch *>(data)->add({status, 0, error});
 }
 
+inline void result_cb(int state, const char *text, int status, int error, void *data)
+{
+    auto *result = static_cast<Watch *>(data);
+    result->text = text ? text : "";
+    result->status = status;
+    result->add({state, 0, error});
+}
+
 inline int refresh(cloud_content_sync_h handle)
 {
     Watch watch;
@@ -68,25 +87,43 @@ inline int refresh(cloud_content_sync_h handle)
     return error ? error : watch.end();
 }
 
+inline int start(cloud_content_sync_h handle, const std::string &local, const std::string &server, Watch &watch)
+{
+    int id = 0;
+    EXPECT_EQ(cloud_content_sync_upload(handle, local.c_str(), server.c_str(), &id, transfer_cb, &watch), 0);
+    return id;
+}
+
 inline int upload(cloud_content_sync_h handle, const std::string &local, const std::string &server,
                   std::string *landed = nullptr)
 {
     Watch watch;
-    int id = 0;
-    const int refused = cloud_content_sync_upload(handle, local.c_str(), server.c_str(), &id, transfer_cb, &watch);
-    if (refused)
-        return refused;
-    const int error = watch.end();
+    const int id = start(handle, local, server, watch), error = watch.end();
     char *path = nullptr;
     if (landed && cloud_content_sync_get_uploaded_path(handle, id, &path) == 0)
         *landed = CString(path).get();
     return error;
 }
 
-// What the database holds below a folder, in its order: "name/" of folders, then "name:size" of files.
-inline std::vector<std::string> listing(cloud_content_sync_h handle, const std::string &path)
+using Content = std::unique_ptr<cloud_content_sync_content_s, decltype(&cloud_content_sync_content_destroy)>;
+
+inline std::string name_of(cloud_content_sync_content_h content)
 {
-    std::vector<std::string> rows;
+    char *name = nullptr;
+    cloud_content_sync_content_get_name(content, &name);
+    return taken(name);
+}
+
+// What the database holds below a folder, in its order: "name/" of folders, then "name:size" of files. The file of the
+// wanted name is kept in *content.
+inline Names listing(cloud_content_sync_h handle, const std::string &path, const std::string &wanted = "",
+                     Content *content = nullptr)
+{
+    struct Rows {
+        Names names;
+        std::string wanted;
+        cloud_content_sync_content_h content = nullptr;
+    } rows{{}, wanted};
     cloud_content_sync_folder_h folder = nullptr;
     if (cloud_content_sync_get_folder_by_server_path(handle, path.c_str(), &folder) != 0)
         return {"no such folder"};
@@ -95,22 +132,95 @@ inline std::vector<std::string> listing(cloud_content_sync_h handle, const std::
         [](cloud_content_sync_folder_h child, int, void *data) {
             char *name = nullptr;
             cloud_content_sync_folder_get_name(child, &name);
-            static_cast<std::vector<std::string> *>(data)->push_back(std::string(CString(name).get()) + "/");
+            static_cast<Rows *>(data)->names.push_back(taken(name) + "/");
             return true;
         },
         &rows);
     cloud_content_sync_folder_foreach_content_from_db(
         nullptr, folder,
-        [](cloud_content_sync_content_h content, int, void *data) {
-            char *name = nullptr;
+        [](cloud_content_sync_content_h row, int, void *data) {
+            auto *to = static_cast<Rows *>(data);
             long long size = -1;
-            cloud_content_sync_content_get_name(content, &name);
-            cloud_content_sync_content_get_size(content, &size);
-            static_cast<std::vector<std::string> *>(data)->push_back(std::string(CString(name).get()) + ":" +
-                                                                     std::to_string(size));
+            cloud_content_sync_content_get_size(row, &size);
+            to->names.push_back(name_of(row) + ":" + std::to_string(size));
+            if (name_of(row) == to->wanted)
+                cloud_content_sync_content_clone(&to->content, row);
             return true;
         },
         &rows);
     cloud_content_sync_folder_destroy(folder);
-    return rows;
+    if (content)
+        content->reset(rows.content);
+    return rows.names;
+}
+
+// The file /NAME of the database; null when there is none.
+inline Content content_at(cloud_content_sync_h handle, const std::string &name)
+{
+    Content content(nullptr, cloud_content_sync_content_destroy);
+    listing(handle, "/", name, &content);
+    return content;
+}
+
+enum class Kind { CACHED, DOWNLOAD, STREAM };
+
+// Sends a request about /NAME and lets the handle go at once; its id.
+inline int ask(cloud_content_sync_h handle, Kind kind, const std::string &name, Watch &result,
+               const std::string &local = "")
+{
+    const Content content = content_at(handle, name);
+    int id = 0;
+    const int refused = kind == Kind::CACHED
+                            ? cloud_content_sync_content_get_cached_file(content.get(), &id, result_cb, &result)
+                        : kind == Kind::DOWNLOAD
+                            ? cloud_content_sync_content_download(content.get(), local.c_str(), &id, result_cb, &result)
+                            : cloud_content_sync_content_get_streaming_url(content.get(), &id, result_cb, &result, 30);
+    EXPECT_EQ(refused, 0) << name;
+    return id;
+}
+
+// The same, and waits: the error of the callback.
+inline int fetch(cloud_content_sync_h handle, Kind kind, const std::string &name, Watch &result,
+                 const std::string &local = "")
+{
+    ask(handle, kind, name, result, local);
+    return result.end();
+}
+
+inline bool has_thumbnail(cloud_content_sync_h handle, const std::string &name)
+{
+    bool exists = false;
+    EXPECT_EQ(cloud_content_sync_content_get_is_thumbnail_exist(content_at(handle, name).get(), &exists), 0) << name;
+    return exists;
+}
+
+inline void thumbnail_cb(const char *path, void *data)
+{
+    auto *arrivals = static_cast<Watch *>(data);
+    std::scoped_lock lock(arrivals->mutex);
+    arrivals->calls.push_back({});
+    arrivals->text += path + std::string("\n");
+}
+
+// Names in a folder, hidden ones too, sorted.
+inline Names names_in(const std::string &folder)
+{
+    Names names;
+    std::error_code ignored;
+    for (const auto &entry : std::filesystem::directory_iterator(folder, ignored))
+        names.push_back(entry.path().filename());
+    std::sort(names.begin(), names.end());
+    return names;
+}
+
+// Bytes that are the same for the same seed.
+inline std::string some_bytes(size_t size, unsigned seed)
+{
+    std::mt19937_64 random(seed);
+    std::string bytes(size, '\0');
+    for (size_t at = 0; at < size; at += sizeof(uint64_t)) {
+        const uint64_t word = random();
+        std::memcpy(bytes.data() + at, &word, std::min(sizeof word, size - at));
+    }
+    return bytes;
 }

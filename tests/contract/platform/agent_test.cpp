@@ -1,8 +1,8 @@
 // The agent, against a notification daemon and an application that are played here.
-#include "app/app_control.h"
 #include "bus.h"
-#include "notification/notification.h"
+#include "posted.h"
 #include "support.h"
+#include <algorithm>
 #include <csignal>
 #include <map>
 #include <sys/wait.h>
@@ -25,7 +25,6 @@ class Agent : public PlatformTest {
 
     void SetUp() override
     {
-        PlatformTest::SetUp();
         bus = std::make_unique<PrivateBus>("DBUS_SESSION_BUS_ADDRESS");
         start_daemon();
     }
@@ -39,7 +38,6 @@ class Agent : public PlatformTest {
         ongoing_posters.clear();
         daemon.reset();
         bus.reset(); // which ends the agent
-        PlatformTest::TearDown();
     }
 
     void start_daemon()
@@ -102,15 +100,13 @@ class Agent : public PlatformTest {
     bool agent_runs() const
     {
         GDBusConnection *connection = bus->connect();
-        GVariant *reply = g_dbus_connection_call_sync(connection, "org.freedesktop.DBus", "/org/freedesktop/DBus",
-                                                      "org.freedesktop.DBus", "NameHasOwner",
-                                                      g_variant_new("(s)", "com.orvant.NotificationAgent"), nullptr,
-                                                      G_DBUS_CALL_FLAGS_NONE, -1, nullptr, nullptr);
-        gboolean has = FALSE;
-        g_variant_get(reply, "(b)", &has);
-        g_variant_unref(reply);
+        GVariant *reply = g_dbus_connection_call_sync(
+            connection, "org.freedesktop.DBus", "/org/freedesktop/DBus", "org.freedesktop.DBus", "GetNameOwner",
+            g_variant_new("(s)", "com.orvant.NotificationAgent"), nullptr, {}, -1, nullptr, nullptr);
         g_object_unref(connection);
-        return has;
+        if (reply)
+            g_variant_unref(reply);
+        return reply;
     }
 };
 
@@ -141,10 +137,7 @@ int post(notification_type_e type, const char *title, const char *content, int f
 
 bool in_store(int id)
 {
-    notification_h noti = notification_load(PACKAGE, id);
-    if (noti)
-        notification_free(noti);
-    return noti != nullptr;
+    return std::ranges::any_of(read_posted(PACKAGE), [id](const Posted &one) { return one.id == id; });
 }
 
 } // namespace

@@ -1,41 +1,24 @@
 #pragma once
 // What the tests of the platform's libraries share.
 #include "base/base.h"
+#include "temp_home.h"
 #include <chrono>
-#include <filesystem>
-#include <fstream>
 #include <gtest/gtest.h>
 #include <unistd.h>
+#include <vector>
 
 // Each test has a home of its own, so that no test sees another one's databases.
 class PlatformTest : public testing::Test {
   protected:
-    std::filesystem::path home;
-
-    void SetUp() override
-    {
-        char name[] = "/tmp/platform-test-XXXXXX";
-        home = mkdtemp(name);
-        setenv("PLATFORM_DATA_DIR", (home / "data").c_str(), 1);
-        setenv("XDG_CACHE_HOME", (home / "cache").c_str(), 1);
-    }
-
-    void TearDown() override
-    {
-        std::filesystem::remove_all(home);
-    }
-
-    void write(const std::filesystem::path &name, const std::string &text) const
-    {
-        std::filesystem::create_directories((home / name).parent_path());
-        std::ofstream(home / name, std::ios::binary) << text;
-    }
+    TempHome home;
 };
 
-inline std::string taken(char *text)
+// Makes a database believe that its passing records were written before the machine's last start.
+inline bool age_records(const char *database, const char *table)
 {
-    const CString owner(text);
-    return text ? text : "(null)";
+    Db db;
+    return db.open(platform_data_dir() + "/" + database, nullptr) &&
+           db.run(("UPDATE " + std::string(table) + " SET boot = 'an earlier start' WHERE boot IS NOT NULL").c_str());
 }
 
 inline double milliseconds_since(std::chrono::steady_clock::time_point start)

@@ -48,47 +48,12 @@ def bad_files(person):
     person.has_stored({"good.txt": good[0], "last.txt": good[1], "missing.txt": found})
 
 
-def nothing_shared(person):
-    person.share()
-    person.sees("There is nothing to upload")
-    person.click("OK", "Elm_Button")
-    person.ends()
-
-
 def no_account(person):
     person.share(person.file("one.txt"))
     wait_for("a popup", lambda: person.find("OK", "Elm_Button"))
     person.click("OK", "Elm_Button")
     person.ends()
     person.has_stored({})
-
-
-def no_network(person):
-    path = person.file("one.txt")
-    person.setting("memory/connection/type", "none")
-    person.share(path)
-    person.sees("No network connection", "Wi-Fi", "Cancel")
-    person.click("Cancel", "Elm_Button")
-    person.ends()
-    person.setting("memory/connection/type", "cellular")
-    person.upload(path)
-    person.finished("one.txt", "Upload complete")
-    person.leave()
-    person.has_stored({"one.txt": path})
-
-
-def service_away(person):
-    path = person.file("one.txt")
-    person.service.kill()
-    person.service.wait()
-    person.share(path)
-    person.sees("Velora", "Try again")
-    person.start_service()
-    person.click("Try again", "Elm_Button")
-    person.choose()
-    person.finished("one.txt", "Upload complete")
-    person.leave()
-    person.has_stored({"one.txt": path})
 
 
 def service_dies(person):
@@ -105,29 +70,6 @@ def service_dies(person):
         person.finished(name, "Upload complete")
     person.leave()
     person.has_stored(paths)
-
-
-def token_wrong_at_start(person):
-    person.token_set("wrong")
-    person.share(person.file("one.txt"))
-    person.sees("You are signed out", "Try again")
-    person.sign_in()
-    person.click("Try again", "Elm_Button")
-    person.choose()
-    person.finished("one.txt", "Upload complete")
-    person.leave()
-
-
-def token_revoked(person):
-    paths = [person.file("one.txt"), person.file("two.txt")]
-    person.share(*paths)
-    person.sees("Photos")
-    person.token_set("wrong")
-    person.choose()
-    person.finished("2 files", "Upload failed")
-    person.sees("one.txt", "two.txt", "Upload failed · Sign in again")
-    person.leave()
-    person.has_stored({})
 
 
 def storage_full(person):
@@ -183,22 +125,6 @@ def window_closed(person):
     person.has_stored({name: path for name, path in paths.items() if f"{FOLDER}/{name}" in person.all_files()})
 
 
-def many_files(person):
-    names = [f"{number:03}.txt" for number in range(300)]
-    paths = [person.file(name) for name in names]
-    person.share(*paths)
-    person.click("Photos")
-    person.sees("Done", "Photos", "Velora")
-    person.click("Done", "Elm_Button")
-    begun = time.monotonic()
-    person.finished("300 files", "Upload complete", seconds=120)
-    each = (time.monotonic() - begun) / len(names)
-    person.say(f"{each * 1000:.0f} ms per small file")
-    check(each < 0.3, f"{each:.2f} s for each small file")
-    person.leave()
-    person.has_stored(dict(zip(names, paths)))
-
-
 def no_bus(person):
     """The files are on the command line, the reply on standard output. Nothing tells where the button is."""
     path = person.file("-one.txt")
@@ -222,17 +148,11 @@ def no_bus(person):
 
 SLOW = ("--delay", "60")
 SCENARIOS = [  # the longest ones first
-    ("300 small files in one share", many_files, {}),
     ("the service dies in the middle, and comes back", service_dies, {"service": SLOW}),
     ("the application is killed in the middle", application_killed, {"service": SLOW}),
     ("names that could be mistaken for something else", hostile_names, {}),
     ("files that cannot be read, between good ones", bad_files, {}),
-    ("a request without files", nothing_shared, {}),
     ("nobody is signed in", no_account, {"account": False}),
-    ("no network", no_network, {}),
-    ("the service is away at first", service_away, {}),
-    ("the account is refused at first", token_wrong_at_start, {}),
-    ("the account is refused from Done on", token_revoked, {}),
     ("the storage is full with the second of five files", storage_full, {"service": ("--quota", "100000")}),
     ("names that are taken, also in the last moment", names_taken, {}),
     ("the window is closed in the middle", window_closed, {"service": SLOW}),
@@ -250,7 +170,6 @@ def run(build, scenario, options):
     person = None
     try:
         person = Person(build, **options)
-        person.say = words.append
         scenario(person)
         person.holds()
         return None, words

@@ -1,8 +1,7 @@
 #pragma once
-// A velora-cloud of a test's own, and requests to it.
-#include <filesystem>
+// Servers of a test's own, velora-cloud above all, and requests to them.
+#include "temp_home.h"
 #include <map>
-#include <string>
 #include <sys/types.h>
 #include <vector>
 
@@ -20,6 +19,20 @@ struct Answer {
 
 using Headers = std::vector<std::string>;
 
+// The address is sent as it is.
+Answer ask_url(const std::string &method, const std::string &url, Headers headers = {}, const std::string &body = "",
+               bool chunked = false);
+// "Authorization: Basic ..." of RFC 7617.
+std::string basic_authorization(const std::string &user, const std::string &password);
+// A port of 127.0.0.1 that nobody has now.
+int free_port();
+
+// Runs a program whose output and messages go to files; gives its process.
+pid_t spawn(std::vector<std::string> words, const std::filesystem::path &out, const std::filesystem::path &err,
+            unsigned user = 0);
+// Waits for its end: the exit code, or -1 when a signal killed it.
+int end_of(pid_t pid);
+
 struct Run {
     int code = -1;
     std::string out, err;
@@ -30,13 +43,13 @@ Run run_cloud(std::vector<std::string> arguments);
 // Serves a folder of its own until the end of the test. Its account is "ann@example.org" with the password "secret".
 class Cloud {
   public:
-    explicit Cloud(std::vector<std::string> options = {});
+    explicit Cloud(Headers options = {});
     ~Cloud();
     // Ends the service by the signal; the result is its exit code, or -1 when the signal killed it.
     int stop(int signal);
     void start();
 
-    // `path` is sent as it is. The account's Basic credentials are added unless a header has an Authorization.
+    // A request of the account, unless a header has another Authorization.
     Answer ask(const std::string &method, const std::string &path, Headers headers = {}, const std::string &body = "",
                bool chunked = false) const;
     // The used bytes as the account is told.
@@ -45,23 +58,25 @@ class Cloud {
     std::filesystem::path file(const std::string &name) const;
     size_t temporary_files() const;
 
-    std::filesystem::path root;
+    TempFolder place;
+    std::filesystem::path root = place / "root";
     std::string url; // without the final slash
     int port = 0;
 
   private:
-    std::vector<std::string> options;
+    Headers options;
     pid_t pid = 0;
 };
 
 // A connection on which a request is sent piece by piece.
 class Connection {
   public:
-    explicit Connection(const Cloud &cloud);
+    explicit Connection(int port);
     ~Connection();
     // A request of the account up to the end of its headers.
-    void begin(const std::string &method, const std::string &path, long long length, const std::string &headers = "");
-    void put(const std::string &path, long long length, const std::string &headers = "")
+    void begin(const std::string &method, const std::string &path, long long length,
+               const std::string &headers = "") const;
+    void put(const std::string &path, long long length, const std::string &headers = "") const
     {
         begin("PUT", path, length, headers);
     }
@@ -70,19 +85,8 @@ class Connection {
     int status() const;
 
   private:
-    int fd;
+    const int fd;
+
+  public:
+    const bool is_open;
 };
-
-std::string read_file(const std::filesystem::path &path);
-void write_file(const std::filesystem::path &path, const std::string &bytes);
-// Looks every 10 ms; false when five seconds have not been enough.
-template <typename Condition> bool comes_true(Condition condition);
-bool wait_a_little(int &rounds);
-
-template <typename Condition> bool comes_true(Condition condition)
-{
-    for (int rounds = 0; !condition();)
-        if (!wait_a_little(rounds))
-            return false;
-    return true;
-}

@@ -12,8 +12,8 @@ TEST(Uploads, OnlyOneTakesAFreeName)
     for (const bool guarded : {true, false}) {
         const std::string path = guarded ? "/dav/guarded" : "/dav/plain",
                           header = guarded ? "If-None-Match: *\r\n" : "";
-        Connection one(cloud), two(cloud);
-        for (Connection *connection : {&one, &two}) {
+        const Connection one(cloud.port), two(cloud.port);
+        for (const Connection *connection : {&one, &two}) {
             connection->put(path, 6, header);
             connection->send(connection == &one ? "one" : "two");
         }
@@ -34,7 +34,7 @@ TEST(Uploads, OnlyOneTakesAFreeName)
 TEST(Uploads, ObeyLocksTakenMeanwhile)
 {
     Cloud cloud;
-    Connection upload(cloud);
+    Connection upload(cloud.port);
     upload.put("/dav/f", 6);
     upload.send("one");
     ASSERT_TRUE(comes_true([&] { return cloud.temporary_files() == 1; }));
@@ -56,7 +56,7 @@ TEST(Uploads, CutOnesLeaveNothing)
     Cloud cloud({"--quota", "100K"});
     const std::string half(40000, 'h');
     {
-        Connection cut(cloud);
+        Connection cut(cloud.port);
         cut.put("/dav/f", 80000);
         cut.send(half);
         ASSERT_TRUE(comes_true([&] { return cloud.temporary_files() == 1; }));
@@ -67,23 +67,18 @@ TEST(Uploads, CutOnesLeaveNothing)
     EXPECT_EQ(cloud.ask("GET", "/dav/f").status, 404);
     EXPECT_EQ(cloud.ask("PUT", "/dav/g", {}, half).status, 201);
 
-    Connection lost(cloud);
-    lost.put("/dav/f", 50000);
-    lost.send(half);
-    ASSERT_TRUE(comes_true([&] { return cloud.temporary_files() == 1; }));
-    cloud.stop(SIGKILL);
-    EXPECT_EQ(cloud.temporary_files(), 1u);
-    cloud.start();
-    EXPECT_EQ(cloud.temporary_files(), 0u);
-    EXPECT_EQ(cloud.ask("GET", "/dav/f").status, 404);
-    EXPECT_EQ(cloud.ask("GET", "/dav/g").body, half);
-
-    Connection ended(cloud);
-    ended.put("/dav/f", 50000);
-    ended.send(half);
-    ASSERT_TRUE(comes_true([&] { return cloud.temporary_files() == 1; }));
-    EXPECT_EQ(cloud.stop(SIGTERM), 0);
-    EXPECT_EQ(cloud.temporary_files(), 0u);
+    for (const int signal : {SIGKILL, SIGTERM}) {
+        const Connection lost(cloud.port);
+        lost.put("/dav/f", 50000);
+        lost.send(half);
+        ASSERT_TRUE(comes_true([&] { return cloud.temporary_files() == 1; }));
+        EXPECT_EQ(cloud.stop(signal), signal == SIGTERM ? 0 : -1);
+        EXPECT_EQ(cloud.temporary_files(), signal == SIGTERM ? 0u : 1u);
+        cloud.start();
+        EXPECT_EQ(cloud.temporary_files(), 0u);
+        EXPECT_EQ(cloud.ask("GET", "/dav/f").status, 404);
+        EXPECT_EQ(cloud.ask("GET", "/dav/g").body, half);
+    }
 }
 
 TEST(Uploads, StayWithinTheQuota)
@@ -118,7 +113,7 @@ TEST(Uploads, StayWithinTheQuota)
         EXPECT_EQ(cloud.temporary_files(), 0u);
     }
     // Said before a body is sent that would take hours.
-    Connection patient(cloud);
+    Connection patient(cloud.port);
     patient.put("/dav/huge", 1LL << 40);
     EXPECT_EQ(patient.status(), 507);
 
@@ -126,26 +121,9 @@ TEST(Uploads, StayWithinTheQuota)
     write_file(cloud.file("by hand"), bytes(70));
     cloud.start();
     EXPECT_EQ(cloud.used(), 70 << 10);
-    const std::string quota = cloud
-                                  .ask("PROPFIND", "/dav/", {"Depth: 0"},
-                                       "<propfind xmlns='DAV:'><prop><quota-available-bytes/><quota-used-bytes/>"
-                                       "</prop></propfind>")
-                                  .body;
+    const std::string wanted = "<propfind xmlns='DAV:'><prop><quota-available-bytes/></prop></propfind>";
+    const std::string quota = cloud.ask("PROPFIND", "/dav/", {"Depth: 0"}, wanted).body;
     EXPECT_NE(quota.find("<D:quota-available-bytes>30720<"), std::string::npos) << quota;
-    EXPECT_NE(quota.find("<D:quota-used-bytes>71680<"), std::string::npos) << quota;
-}
-
-TEST(Uploads, AreDisturbedOnRequest)
-{
-    Cloud cloud({"--fail", "2:503", "--lose-reply", "1", "--delay", "40"});
-    const std::string body(5 * 65536, 'd');
-    EXPECT_EQ(cloud.ask("PUT", "/dav/f", {}, body).status, 503);
-    EXPECT_EQ(cloud.ask("PUT", "/dav/f", {}, body).status, 503);
-    const auto start = std::chrono::steady_clock::now();
-    EXPECT_EQ(cloud.ask("PUT", "/dav/f", {}, body).status, 0);
-    EXPECT_GE(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(160));
-    EXPECT_EQ(cloud.ask("GET", "/dav/f").body, body);
-    EXPECT_EQ(cloud.ask("PUT", "/dav/g", {}, "g").status, 201);
 }
 
 // Large bodies take other ways through the service: they wait for the disk on another thread and take turns.
@@ -159,15 +137,15 @@ TEST(Uploads, MayBeLarge)
     EXPECT_EQ(cloud.ask("COPY", "/dav/f", {"Destination: /dav/g"}).status, 201);
     EXPECT_TRUE(cloud.ask("GET", "/dav/g").body == content);
     EXPECT_EQ(cloud.ask("HEAD", "/dav/g").header("repr-digest"), cloud.ask("HEAD", "/dav/f").header("repr-digest"));
-    Connection refused(cloud);
+    Connection refused(cloud.port);
     refused.put("/dav/f", static_cast<long long>(content.size()), "If-None-Match: *\r\n");
     refused.send(content);
     EXPECT_EQ(refused.status(), 412);
     for (int i = 0; i < 10; i++) { // clients that do not wait for what they asked for
-        Connection impatient(cloud);
+        Connection impatient(cloud.port);
         impatient.put("/dav/h", static_cast<long long>(content.size()));
         impatient.send(content);
-        Connection copying(cloud);
+        Connection copying(cloud.port);
         copying.begin("COPY", "/dav/f", 0, "Destination: /dav/i" + std::to_string(i) + "\r\n");
         EXPECT_TRUE(comes_true([&] { return fs::exists(cloud.file("i0")) || cloud.temporary_files() > 0; }));
     }

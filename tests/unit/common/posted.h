@@ -2,7 +2,7 @@
 // What a package has posted in the notification area, read back from the real store as text.
 #include "app/app_control.h"
 #include "notification/notification.h"
-#include <cstdlib>
+#include "temp_home.h"
 #include <string>
 #include <vector>
 
@@ -11,14 +11,6 @@ struct Posted {
     std::string text;  // "TITLE: CONTENT", for a result with " DISPLAY_TYPE: NAME..." of its files
     std::string looks; // "TYPE FLAGS PLACES LAYOUT PROGRESS INFO ICON INDICATOR OPERATION APP ACTIVATE"
 };
-
-// Takes a text that was given to the caller; "(null)" for none.
-inline std::string taken(char *text)
-{
-    std::string result = text ? text : "(null)";
-    free(text);
-    return result;
-}
 
 inline std::string last_part(const std::string &path)
 {

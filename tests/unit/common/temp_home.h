@@ -1,30 +1,78 @@
 #pragma once
-// What tests of the application's parts share: a home of their own for the platform's libraries, and the log.
+// What tests of all kinds share: folders and files of their own, a home for the platform's libraries, and the log.
 #include "dlog/dlog.h"
+#include <chrono>
 #include <cstdlib>
 #include <filesystem>
+#include <fstream>
 #include <mutex>
 #include <string>
+#include <thread>
 
-// An empty folder in which all databases and caches of the test lie; it goes away with its owner.
-struct TempHome {
+inline void write_file(const std::filesystem::path &path, const std::string &bytes)
+{
+    std::ofstream(path, std::ios::binary) << bytes;
+}
+
+// An empty folder; it goes away with its owner.
+struct TempFolder {
     std::string path = (std::filesystem::temp_directory_path() / "velora-test-XXXXXX").string();
 
-    TempHome()
+    TempFolder()
     {
         if (!mkdtemp(path.data()))
             std::abort();
-        setenv("PLATFORM_DATA_DIR", path.c_str(), 1);
-        setenv("XDG_CACHE_HOME", (path + "/cache").c_str(), 1);
     }
-    TempHome(const TempHome &) = delete;
-    TempHome &operator=(const TempHome &) = delete;
-    ~TempHome()
+    TempFolder(const TempFolder &) = delete;
+    TempFolder &operator=(const TempFolder &) = delete;
+    ~TempFolder()
     {
         std::error_code ignored;
         std::filesystem::remove_all(path, ignored);
     }
+    std::filesystem::path operator/(const std::string &name) const
+    {
+        return std::filesystem::path(path) / name;
+    }
+    // Writes a file, with the folders above it, and gives its path.
+    std::string file(const std::string &name, const std::string &bytes) const
+    {
+        std::filesystem::create_directories((*this / name).parent_path());
+        write_file(*this / name, bytes);
+        return *this / name;
+    }
 };
+
+// One in which all databases and caches of the test lie.
+struct TempHome : TempFolder {
+    TempHome()
+    {
+        setenv("PLATFORM_DATA_DIR", path.c_str(), 1);
+        setenv("XDG_CACHE_HOME", (path + "/cache").c_str(), 1);
+    }
+};
+
+inline std::string read_file(const std::filesystem::path &path)
+{
+    std::ifstream file(path, std::ios::binary);
+    return {std::istreambuf_iterator<char>(file), {}};
+}
+
+// Takes a text that was given to the caller; "(null)" for none.
+inline std::string taken(char *text)
+{
+    std::string result = text ? text : "(null)";
+    free(text);
+    return result;
+}
+
+// Looks every 5 ms; false when ten seconds have not been enough.
+template <class Condition> bool comes_true(Condition condition)
+{
+    for (int i = 0; i < 2000 && !condition(); i++)
+        std::this_thread::sleep_for(std::chrono::milliseconds(5));
+    return condition();
+}
 
 // Takes the log instead of standard error while it lives.
 struct LogCatcher {

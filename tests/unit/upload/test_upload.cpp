@@ -2,12 +2,8 @@
 #include "fake_app.h"
 #include "posted.h"
 #include "temp_home.h"
-#include "vconf/vconf.h"
 #include "velora_upload_file/upload_internal.h"
 #include <gtest/gtest.h>
-
-#include <algorithm>
-#include <ctime>
 
 namespace {
 std::vector<std::string> folder_files; // of the open folder, in the database's order
@@ -41,7 +37,7 @@ int cloud_content_sync_content_get_thumbnail_path(cloud_content_sync_content_h, 
 
 TEST(Names, TakeTheNextFreeCounter)
 {
-    const std::string x = std::string(251, 'x'), e = "\xc3\xa9"; // two bytes, one character
+    const std::string e = "\xc3\xa9"; // two bytes, one character
     std::string accents;
     for (int i = 0; i < 125; i++)
         accents += e;
@@ -50,28 +46,15 @@ TEST(Names, TakeTheNextFreeCounter)
         std::vector<std::string> present;
         std::string result;
     } cases[] = {
-        {"photo.jpg", {"other.jpg", "photo.jpeg"}, "photo.jpg"},
-        {"photo.jpg", {"photo.jpg"}, "photo(1).jpg"},
         {"photo.jpg", {"photo.jpg", "photo(1).jpg", "photo(2).jpg"}, "photo(3).jpg"},
         {"photo.jpg", {"photo(2).jpg", "photo(1).jpg", "photo.jpg"}, "photo(3).jpg"}, // takes several walks
         {"photo(3).jpg", {"photo(3).jpg"}, "photo(4).jpg"},
-        {"archive.tar.gz", {"archive.tar.gz"}, "archive.tar(1).gz"},
-        {"file.", {"file."}, "file(1)."},
         {".profile", {".profile"}, "(1).profile"},
         {"a(0).txt", {"a(0).txt"}, "a(0)(1).txt"},
-        {"a(-4).txt", {"a(-4).txt"}, "a(-4)(1).txt"},
-        {"a(x).txt", {"a(x).txt"}, "a(x)(1).txt"},
         {"a(2b).txt", {"a(2b).txt"}, "a(3).txt"},
-        {"a(9)(2).txt", {"a(9)(2).txt"}, "a(9)(3).txt"},
-        {"a(99999999999).txt", {"a(99999999999).txt"}, "a(99999999999)(1).txt"},
         {"a(2147483647).txt", {"a(2147483647).txt"}, "a(2147483647)(1).txt"},
-        {").txt", {").txt"}, ")(1).txt"},
-        {"Photo.JPG", {"photo.jpg", "photo.JPG"}, "Photo.JPG"},
-        {"README", {"README"}, "README(1)"},
         {"README", {"README", "README(1)"}, "README(2)"},
-        {"a%s<b>&.txt", {"a%s<b>&.txt"}, "a%s<b>&(1).txt"},
         // what a file system can hold: 255 bytes, cut between characters
-        {x + ".jpg", {x + ".jpg"}, x.substr(3) + "(1).jpg"},
         {accents + ".jpeg", {accents + ".jpeg"}, accents.substr(4) + "(1).jpeg"},
     };
     for (const auto &c : cases) {
@@ -111,14 +94,10 @@ TEST(Types, FollowTheExtensionAlone)
         int type;
         const char *ext, *base; // null: none
     } cases[] = {
-        {"photo.JPG", 3, "JPG", "photo"},    {"clip.Mp4", 4, "Mp4", "clip"},
-        {"song.mp3", 5, "mp3", "song"},      {"tone.ogg", 6, "ogg", "tone"},
-        {"paper.pdf", 7, "pdf", "paper"},    {"feed.OPML", 26, "OPML", "feed"},
-        {"a.tar.gz", 35, "gz", "a.tar"},     {"README", 0, nullptr, nullptr},
-        {"dir.d/file", 0, nullptr, nullptr}, {".jpg", 3, "jpg", ""},
-        {"ends.", 35, "", "ends"},           {"x.jpeg2", 35, "jpeg2", "x"},
-        {"", 0, nullptr, nullptr},           {"x.hwp", 34, "hwp", "x"},
-        {nullptr, 32, nullptr, nullptr},     {"/a/b.svgz", 25, "svgz", "/a/b"},
+        {"photo.JPG", 3, "JPG", "photo"},    {"clip.Mp4", 4, "Mp4", "clip"}, {"feed.OPML", 26, "OPML", "feed"},
+        {"a.tar.gz", 35, "gz", "a.tar"},     {"ends.", 35, "", "ends"},      {"README", 0, nullptr, nullptr},
+        {"dir.d/file", 0, nullptr, nullptr}, {".jpg", 3, "jpg", ""},         {"x.jpeg2", 35, "jpeg2", "x"},
+        {nullptr, 32, nullptr, nullptr},
     };
     for (const auto &c : cases) {
         SCOPED_TRACE(c.name ? c.name : "null");
@@ -133,15 +112,8 @@ TEST(Sizes, HaveTwoDecimalsAndTheFittingUnit)
     const struct {
         gint64 bytes;
         const char *text;
-    } cases[] = {{0, "0.00KB"},
-                 {1023, "1.00KB"},
-                 {1004, "0.98KB"},
-                 {1048575, "1024.00KB"},
-                 {1048576, "1.00MB"},
-                 {1572864, "1.50MB"},
-                 {1073741823, "1024.00MB"},
-                 {1073741824, "1.00GB"},
-                 {5000000000000, "4656.61GB"},
+    } cases[] = {{0, "0.00KB"},       {1004, "0.98KB"},          {1048575, "1024.00KB"},
+                 {1048576, "1.00MB"}, {1073741823, "1024.00MB"}, {1073741824, "1.00GB"},
                  {-2048, "-2.00KB"}};
     for (const auto &c : cases)
         EXPECT_EQ(taken(__get_formatted_size(c.bytes)), c.text) << c.bytes;
@@ -154,8 +126,6 @@ class Notifications : public testing::Test {
     void SetUp() override
     {
         fake_app::clear();
-        setenv("TZ", "XST-5:30", 1); // a local time that is not UTC
-        tzset();
     }
 
     static std::vector<Posted> all()
@@ -184,7 +154,6 @@ TEST_F(Notifications, TheOngoingOneFollowsTheQueue)
     EXPECT_TRUE(all().empty());
     for (const int gone : {id, 0, -1})
         EXPECT_EQ(__progress_noti_set_content(gone, "x") + __progress_noti_set_progress(gone, 0.5), -2);
-    EXPECT_TRUE(log.has("notification_load failed") && log.has("Invalid noti id"));
 }
 
 TEST_F(Notifications, AResultCarriesItsFilesAndTakesTheLastOnesPlace)
@@ -203,37 +172,4 @@ TEST_F(Notifications, AResultCarriesItsFilesAndTakesTheLastOnesPlace)
     ASSERT_EQ(all().size(), 1u) << "a new run takes the last result away";
     ASSERT_EQ(__box_noti_new("x", "y", "success", nullptr, 0), 0);
     EXPECT_EQ(all().size(), 2u) << "and its end leaves the ongoing one";
-}
-
-TEST_F(Notifications, NothingIsPostedWhenItsRequestCannotBeMade)
-{
-    const char *steps[] = {"app_control_create", "app_control_set_operation", "app_control_set_app_id",
-                           "app_control_add_extra_data", "app_control_to_bundle"};
-    for (const char *step : steps) {
-        int id = -1;
-        fake_app::fail(step, 1, APP_CONTROL_ERROR_OUT_OF_MEMORY);
-        EXPECT_EQ(__progress_noti_new("0 / 1", &id), -1) << step;
-        EXPECT_EQ(id, -1) << step;
-        fake_app::fail(step, 1, APP_CONTROL_ERROR_OUT_OF_MEMORY);
-        EXPECT_EQ(__box_noti_new("x", "y", "success", nullptr, 0), -1) << step;
-        EXPECT_TRUE(all().empty()) << step;
-    }
-}
-
-TEST_F(Notifications, TheClockHasTwelveOrTwentyFourHours)
-{
-    for (const bool is_24_hours : {true, false}) {
-        ASSERT_EQ(vconf_set_bool("db/menu_widget/regionformat_24hour", is_24_hours), 0);
-        std::vector<std::string> allowed; // the minute may change under way
-        std::string shown;
-        for (int i = 0; i < 2; i++) {
-            const time_t now = time(nullptr) + (5 * 60 + 30) * 60;
-            char text[32];
-            strftime(text, sizeof text, is_24_hours ? "%H:%M" : "%I:%M %p", gmtime(&now));
-            allowed.push_back(text);
-            if (i == 0)
-                shown = taken(__get_format_time());
-        }
-        EXPECT_TRUE(std::ranges::count(allowed, shown)) << shown << " " << allowed[0];
-    }
 }
