@@ -156,6 +156,11 @@ static int run(Service &service, const Fd &root_folder, const char *listen_at)
     };
     g_unix_signal_add(SIGTERM, quit, loop);
     g_unix_signal_add(SIGINT, quit, loop);
+    const auto hurry = +[](gpointer data) -> gboolean {
+        static_cast<Service *>(data)->faults.delay = 0;
+        return G_SOURCE_CONTINUE;
+    };
+    g_unix_signal_add(SIGUSR1, hurry, &service);
     g_main_loop_run(loop);
     soup_server_disconnect(server);
     g_object_unref(server);
@@ -181,7 +186,8 @@ int main(int argc, char **argv)
          "Print a new bearer token of the account; serves only when --listen is given too", "EMAIL"},
         {"fail", 0, 0, G_OPTION_ARG_STRING, &options.fail, "For tests: answer the next COUNT uploads with STATUS",
          "COUNT:STATUS"},
-        {"delay", 0, 0, G_OPTION_ARG_INT, &options.delay, "For tests: wait after each 64 KiB of an upload", "MS"},
+        {"delay", 0, 0, G_OPTION_ARG_INT, &options.delay,
+         "For tests: wait after each 64 KiB of an upload, until a SIGUSR1", "MS"},
         {"lose-reply", 0, 0, G_OPTION_ARG_INT, &options.lose_reply,
          "For tests: store the N-th upload and drop its connection unanswered", "N"},
         {}};

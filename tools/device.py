@@ -148,8 +148,8 @@ class Device:
                 if attempt == 2:
                     raise Trouble("the virtual display does not start") from None
 
-    def start_notification_daemon(self, in_sight=True):
-        """Out of sight means: too small to cover what is to be clicked."""
+    def start_notification_daemon(self, in_sight=True, lasting=False):
+        """Out of sight means: too small to cover what is to be clicked. Lasting bubbles wait for their click."""
         if not shutil.which("dunst"):
             return
         rules = os.path.join(self.home, "dunstrc")
@@ -161,6 +161,8 @@ class Device:
             if not in_sight:
                 file.write("width = 8\nheight = 8\norigin = bottom-right\noffset = 0x0\nicon_position = off\n"
                            "padding = 0\nhorizontal_padding = 0\nframe_width = 0\nfont = Sans 1\n")
+            if lasting:
+                file.write("[urgency_low]\ntimeout = 0\n[urgency_normal]\ntimeout = 0\n")
         self.start(["dunst", "-conf", rules], stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL)
         wait_for("the notification daemon", lambda: self.is_on_bus("org.freedesktop.Notifications"))
 
@@ -183,6 +185,10 @@ class Device:
         with open(os.path.join(self.env["CLOUD_SERVICES_DIR"], "Velora.conf"), "w", encoding="utf-8") as file:
             file.write(f"[Service]\nWeb={self.web}/\nApi={self.web}/\nStorage={self.web}/dav/\n")
         return cloud
+
+    def hurry(self):
+        """Ends what was asked of the service with --delay."""
+        self.service.send_signal(signal.SIGUSR1)
 
     def sign_in(self):
         self.token_set(self.tool("service/velora-cloud", "--root", self.data, "--token", EMAIL).split()[-1])
@@ -243,13 +249,14 @@ class Device:
         """The text of what has the keys' focus, or its type."""
         return next((text for kind, text, *_ in self._inspect() if kind == "focus"), None)
 
-    def _inspect(self):
+    def _ask_application(self, method):
         done = subprocess.run(["gdbus", "call", "--session", "--dest", APP, "--object-path", "/com/orvant/Inspect",
-                               "--method", "com.orvant.Inspect.Visible"], env=self.env, capture_output=True, timeout=20)
-        if done.returncode != 0:
-            return []
+                               "--method", "com.orvant.Inspect." + method], env=self.env, capture_output=True, timeout=20)
+        return done.stdout.decode(errors="replace") if done.returncode == 0 else ""
+
+    def _inspect(self):
         rows = re.findall(r"\('((?:[^'\\]|\\.)*)', (?:'((?:[^'\\]|\\.)*)'|\"((?:[^\"\\]|\\.)*)\"), "
-                          r"(-?\d+), (-?\d+), (-?\d+), (-?\d+)\)", done.stdout.decode(errors="replace"))
+                          r"(-?\d+), (-?\d+), (-?\d+), (-?\d+)\)", self._ask_application("Visible"))
         return [(kind, ast.literal_eval(f"'{single}'" if single else f'"{double}"'), *map(int, place))
                 for kind, single, double, *place in rows]
 
@@ -271,7 +278,12 @@ class Device:
                  "sleep", "0.05", "mouseup", "1")
 
     def key(self, name):
+        """Presses a key, and comes back when the application has dealt with it or has left, or will not get it."""
+        before = self._ask_application("Keys")
         self.run("xdotool", "key", name)
+        end = time.monotonic() + 3
+        while before and self._ask_application("Keys") == before and time.monotonic() < end:
+            time.sleep(0.02)
 
     def raise_window(self):
         """Brings the application's window back to the front; false when there is none."""

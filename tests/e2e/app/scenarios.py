@@ -56,30 +56,6 @@ def no_account(person):
     person.has_stored({})
 
 
-def service_dies(person):
-    paths = {name: person.file(name, size=600_000) for name in ("first", "second", "third")}
-    person.upload(*paths.values())
-    person.notified("1 / 3", ongoing=True)
-    person.service.kill()
-    person.service.wait()
-    person.finished("2 files", "Upload failed", seconds=90)
-    person.sees("second", "third", "Upload failed · No connection")
-    person.start_service()
-    for name in ("second", "third"):
-        person.retry(name)
-        person.finished(name, "Upload complete")
-    person.leave()
-    person.has_stored(paths)
-
-
-def storage_full(person):
-    first, *others = [person.file(name, size=60_000) for name in ("1", "2", "3", "4", "5")]
-    person.upload(first, *others)
-    person.finished("4 files", "Upload failed")
-    person.ends()
-    person.has_stored({"1": first})
-
-
 def names_taken(person):
     person.put(f"{FOLDER}/photo.jpg", b"taken before")
     paths = [person.file(name) for name in ("photo.jpg", "elsewhere/photo.jpg", "late.jpg", "a/late.jpg")]
@@ -146,14 +122,12 @@ def no_bus(person):
         check(stored.read() == file.read(), "what is stored is not the file")
 
 
-SLOW = ("--delay", "60")
+SLOW = ("--delay", "300")
 SCENARIOS = [  # the longest ones first
-    ("the service dies in the middle, and comes back", service_dies, {"service": SLOW}),
     ("the application is killed in the middle", application_killed, {"service": SLOW}),
     ("names that could be mistaken for something else", hostile_names, {}),
     ("files that cannot be read, between good ones", bad_files, {}),
     ("nobody is signed in", no_account, {"account": False}),
-    ("the storage is full with the second of five files", storage_full, {"service": ("--quota", "100000")}),
     ("names that are taken, also in the last moment", names_taken, {}),
     ("the window is closed in the middle", window_closed, {"service": SLOW}),
     ("no session bus", no_bus, {}),
