@@ -166,7 +166,6 @@ TEST_F(Opening, DropsTheAnswerOfACancelledRequestAndOfARowThatIsGone)
 
 TEST_F(Opening, DoesNotTakeAnotherFoldersCopy)
 {
-    fake_cloud_add_folder("/Other");
     run([&] {
         browse({"paper.pdf"});
         std::filesystem::create_directories(scratch);

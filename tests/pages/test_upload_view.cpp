@@ -115,6 +115,22 @@ TEST_F(Browser, BackOnTheWaitGivesUpTheShareAndStays)
     });
 }
 
+TEST_F(Browser, ARefreshLeavesTheRowsAloneThatAreStillTrue)
+{
+    for (const bool is_changed : {false, true}) {
+        run([&] {
+            fake_cloud_hold(true);
+            share({"new.txt"});
+            Elm_Object_Item *const first = row(0);
+            if (is_changed)
+                fake_cloud_add_file("/zebra.txt", "");
+            fake_cloud_hold(false);
+            EXPECT_EQ(wait_for([] { return rows().back() == "file zebra.txt"; }, is_changed ? 20 : 0.3), is_changed);
+            EXPECT_EQ(row(0) == first, !is_changed);
+        });
+    }
+}
+
 TEST_F(Browser, SaysWhatIsWrongAndTriesAgain)
 {
     for (const auto &[error, words] : {std::pair(CLOUD_CONTENT_SYNC_ERROR_NETWORK, "You are offline"),

@@ -150,9 +150,9 @@ class UploadPage : public Application {
     {
         return s_vd.load() && s_vd.load()->is_end_handled && !s_vd.load()->thread;
     }
-    static bool wait_for(const std::function<bool()> &condition)
+    static bool wait_for(const std::function<bool()> &condition, double seconds = 20)
     {
-        return driver::run_until(condition, 20);
+        return driver::run_until(condition, seconds);
     }
     bool wait_for_exit()
     {

@@ -2,6 +2,7 @@
 #include "velora_upload_file/upload_internal.h"
 #include <cstdlib>
 #include <cstring>
+#include <functional>
 
 static const char s_root_label[] = "Velora";
 
@@ -152,8 +153,16 @@ static void __ud_genlist_dir_sel(void *data, Evas_Object *, void *event_info)
 
 struct Enumeration {
     UploadViewData *vd = nullptr;
+    bool has_rows = true; // or only looks
     int count = 0;
+    size_t listing = 0; // stands for all that the rows show
 };
+
+static void __listing_add(Enumeration *list, const char *name, long long size)
+{
+    const std::string words = std::to_string(size) + (name ? name : "");
+    list->listing = list->listing * 31 + std::hash<std::string>()(words);
+}
 
 static bool __folder_info_cb(cloud_content_sync_folder_h folder, int error, void *data)
 {
@@ -166,10 +175,16 @@ static bool __folder_info_cb(cloud_content_sync_folder_h folder, int error, void
         VELORA_LOGE("Invalid argument");
         return true;
     }
+    list->count++;
+    char *name = nullptr;
+    cloud_content_sync_folder_get_name(folder, &name);
+    __listing_add(list, name, -1);
+    std::free(name);
+    if (!list->has_rows)
+        return true;
     auto *record = new ItemData{.vd = list->vd};
     cloud_content_sync_folder_clone(&record->folder, folder);
     __row_append(list->vd, list->vd->itc_dir, record, __ud_genlist_dir_sel);
-    list->count++;
     return true;
 }
 
@@ -184,24 +199,41 @@ static bool __content_info_cb(cloud_content_sync_content_h content, int error, v
         VELORA_LOGE("Invalid argument");
         return true;
     }
-    auto *record = new ItemData{.vd = list->vd, .type = ITEM_TYPE_CONTENT};
-    cloud_content_sync_content_clone(&record->content, content);
-    char *name = nullptr;
-    cloud_content_sync_content_get_name(content, &name);
-    record->name = g_strdup(name);
-    record->file_name = g_strdup(name);
-    std::free(name);
-    __row_append(list->vd, list->vd->itc_file, record, __select_item_to_launch_app);
     list->count++;
+    char *name = nullptr;
+    long long size = 0;
+    cloud_content_sync_content_get_name(content, &name);
+    cloud_content_sync_content_get_size(content, &size);
+    __listing_add(list, name, size);
+    if (list->has_rows) {
+        auto *record = new ItemData{.vd = list->vd, .type = ITEM_TYPE_CONTENT};
+        cloud_content_sync_content_clone(&record->content, content);
+        record->name = g_strdup(name);
+        record->file_name = g_strdup(name);
+        __row_append(list->vd, list->vd->itc_file, record, __select_item_to_launch_app);
+    }
+    std::free(name);
     return true;
 }
 
-int __folder_list_append(UploadViewData *vd)
+static Enumeration __folder_enumerate(UploadViewData *vd, bool has_rows)
 {
-    Enumeration list = {.vd = vd};
+    Enumeration list = {.vd = vd, .has_rows = has_rows};
     if (vd->folder) {
         cloud_content_sync_folder_foreach_children_folder(nullptr, vd->folder, __folder_info_cb, &list);
         cloud_content_sync_folder_foreach_content_from_db(nullptr, vd->folder, __content_info_cb, &list);
     }
+    return list;
+}
+
+int __folder_list_append(UploadViewData *vd)
+{
+    const Enumeration list = __folder_enumerate(vd, true);
+    vd->listing = list.listing;
     return list.count;
+}
+
+bool __folder_list_has_changed(UploadViewData *vd)
+{
+    return __folder_enumerate(vd, false).listing != vd->listing;
 }

@@ -59,6 +59,7 @@ struct UploadViewData {
     std::vector<UploadItem *> run;    // the items of the running (or last) worker, kept alive for it
     // Names of the open folder's files, while a TakenNames lives.
     std::optional<std::unordered_set<std::string>> taken_names;
+    size_t listing = 0;    // what the rows of the open folder were made of, as a hash
     int settled = 0;       // items at the head of AppData's list that no Done is awaited for
     GList *kept = nullptr; // items that wait for their Done while AppData's list is a result's
 };
@@ -144,6 +145,8 @@ bool __folder_go_up(UploadViewData *vd);
 bool __is_at_root(UploadViewData *vd);
 // Appends the open folder's subfolders and files; the result is their number.
 int __folder_list_append(UploadViewData *vd);
+// Whether the client knows something else of the open folder by now than its rows show.
+bool __folder_list_has_changed(UploadViewData *vd);
 // Makes a folder the open one and takes it over; the old one is let go. Null: none is open.
 void __folder_open(UploadViewData *vd, cloud_content_sync_folder_h folder);
 

@@ -165,10 +165,11 @@ static void __item_message(UploadViewData *vd, const char *message)
     g_strfreev(pieces);
 }
 
-// The tree was refreshed while the list was already there: the rows change, the place in the list does not.
+// The tree was refreshed while the list was already there: the rows change, the place in the list does not. Rows that
+// would be the same stay, for there may be a finger on one.
 static void __meta_changed(UploadViewData *vd)
 {
-    if (vd->is_upload_started)
+    if (vd->is_upload_started || (!vd->state && !__folder_list_has_changed(vd)))
         return;
     int x = 0, y = 0, w = 0, h = 0;
     elm_scroller_region_get(vd->genlist, &x, &y, &w, &h);

@@ -29,7 +29,8 @@ Program::Program(const PrivateBus &bus, const char *name, const char *path, cons
     GDBusNodeInfo *node = g_dbus_node_info_new_for_xml(introspection, nullptr);
     static const GDBusInterfaceVTable table = {called, nullptr, nullptr, {}};
     for (GDBusInterfaceInfo **info = node->interfaces; *info; info++)
-        g_dbus_connection_register_object(connection, path, *info, &table, this, nullptr, nullptr);
+        registrations.push_back(
+            g_dbus_connection_register_object(connection, path, *info, &table, this, nullptr, nullptr));
     g_dbus_node_info_unref(node);
     g_variant_unref(g_dbus_connection_call_sync(connection, "org.freedesktop.DBus", "/org/freedesktop/DBus",
                                                 "org.freedesktop.DBus", "RequestName", g_variant_new("(su)", name, 4u),
@@ -38,6 +39,8 @@ Program::Program(const PrivateBus &bus, const char *name, const char *path, cons
 
 Program::~Program()
 {
+    for (const guint registration : registrations) // a call may lie in the main context already
+        g_dbus_connection_unregister_object(connection, registration);
     g_dbus_connection_close_sync(connection, nullptr, nullptr);
     g_object_unref(connection);
 }

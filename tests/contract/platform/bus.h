@@ -34,6 +34,7 @@ class Program {
   private:
     GDBusConnection *connection;
     std::string object;
+    std::vector<guint> registrations;
     Answer answer_call;
     static void called(GDBusConnection *, const char *, const char *, const char *, const char *method,
                        GVariant *arguments, GDBusMethodInvocation *invocation, gpointer self);
