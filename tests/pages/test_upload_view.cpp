@@ -89,9 +89,20 @@ TEST_F(Browser, JumpsByThePathBar)
         EXPECT_EQ(folder(), "/");
         EXPECT_EQ(rows().size(), 4u);
 
-        ASSERT_TRUE(enter("Alpha"));
-        ASSERT_TRUE(enter("Beta"));
+        for (const char *name : {"Alpha", "Beta", "Gamma"})
+            ASSERT_TRUE(enter(name));
+        fake_cloud_remove("/Alpha/Beta");
+        fake_cloud_refresh_now();
+        ASSERT_TRUE(tap_path("Beta"));
+        ASSERT_TRUE(jump_over());
+        EXPECT_EQ(folder(), "(none)");
+        EXPECT_TRUE(elm_object_disabled_get(s_vd.load()->done_btn));
         ASSERT_TRUE(tap_path("Alpha"));
+        ASSERT_TRUE(jump_over());
+        EXPECT_EQ(folder(), "/Alpha");
+        EXPECT_FALSE(elm_object_disabled_get(s_vd.load()->done_btn));
+
+        ASSERT_TRUE(tap_path("Velora"));
         _velora_app_exit(s_vd.load()->ad); // with the jump still to come
     });
 }

@@ -40,6 +40,8 @@ static Eina_Bool __timer_toolbar_append_cb(void *)
         __folder_open(vd, nullptr);
         if (cloud_content_sync_get_folder_by_server_path(vd->ad->sync_handle, vd->tapped_path, &folder) != 0) {
             VELORA_LOGE("cloud_content_sync_get_folder_by_server_path failed");
+            if (vd->done_btn)
+                elm_object_disabled_set(vd->done_btn, EINA_TRUE); // there is nothing to upload into
             return ECORE_CALLBACK_CANCEL;
         }
     }

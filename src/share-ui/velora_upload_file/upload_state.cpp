@@ -118,7 +118,7 @@ void __state_show(UploadViewData *vd, ViewState state)
     elm_object_signal_emit(vd->layout, state == VIEW_STATE_NONE ? "velora,state,hide" : "velora,state,show", "velora");
     const bool has_retry = state == VIEW_STATE_OFFLINE || state == VIEW_STATE_ERROR || state == VIEW_STATE_SIGNED_OUT;
     if (vd->done_btn && !vd->is_select_mode)
-        elm_object_disabled_set(vd->done_btn, has_retry || state == VIEW_STATE_LOADING);
+        elm_object_disabled_set(vd->done_btn, has_retry || state == VIEW_STATE_LOADING || !vd->folder);
     if (state == VIEW_STATE_NONE)
         return;
 
