@@ -55,7 +55,9 @@ TEST_F(Queue, RunsInOrderAndCounts)
             ASSERT_TRUE(finish_file());
             EXPECT_TRUE(wait_for([&] { return ongoing() == std::to_string(ended) + " / 3"; })) << ongoing();
         }
-        EXPECT_EQ(rows(), (Texts{"uploaded three.txt", "uploaded one(1).jpg", "queued two.txt"}));
+        EXPECT_TRUE(wait_for([] {
+            return rows() == Texts{"uploaded three.txt", "uploaded one(1).jpg", "queued two.txt"};
+        }));
         fake_cloud_hold(false);
         ASSERT_TRUE(wait_for(is_over));
         EXPECT_EQ(rows(), (Texts{"uploaded three.txt", "uploaded one(1).jpg", "uploaded two.txt"}));
