@@ -156,7 +156,8 @@ class Device:
         width = int(self.size.split("x")[0]) - 32
         with open(rules, "w", encoding="utf-8") as file:
             file.write(f"[global]\nwidth = {width}\norigin = top-center\noffset = 0x16\nfont = Sans 12\n"
-                       "frame_width = 1\ncorner_radius = 8\nmax_icon_size = 48\nmarkup = full\nformat = \"<b>%s</b>\\n%b\"\n"
+                       "frame_width = 1\ncorner_radius = 8\nmax_icon_size = 48\nshow_indicators = no\n"
+                       "markup = full\nformat = \"<b>%s</b>\\n%b\"\n"
                        "mouse_left_click = do_action, close_current\n")
             if not in_sight:
                 file.write("width = 8\nheight = 8\norigin = bottom-right\noffset = 0x0\nicon_position = off\n"
