@@ -168,40 +168,6 @@ TEST_F(Browser, SaysWhatIsWrongAndTriesAgain)
     });
 }
 
-TEST_F(Browser, ShowsAThumbnailOnceTheClientHasIt)
-{
-    const auto picture = [&](const std::string &name) {
-        const std::string path = home.path + "/" + name;
-        std::ofstream(path) << "P3 1 1 255 200 30 90\n";
-        return path;
-    };
-    const std::string one = picture("one.ppm"), other = picture("other.ppm");
-    const auto is_seen = [](const std::string &file) {
-        return driver::find(s_vd.load()->genlist, [&](Evas_Object *object) {
-            const char *shown = nullptr;
-            if (g_strcmp0(elm_object_widget_type_get(object), "Elm_Image") == 0)
-                elm_image_file_get(object, &shown, nullptr);
-            return shown && file == shown;
-        });
-    };
-    fake_cloud_add_file("/Alpha/one.jpg", "of the same name");
-    fake_cloud_refresh_now();
-    fake_cloud_add_thumbnail("/one.jpg", one);
-    fake_cloud_add_thumbnail("/Alpha/one.jpg", other);
-    run([&] {
-        share({"new.txt"});
-        draw();
-        EXPECT_TRUE(wait_for([&] { return is_seen(one); }));
-        EXPECT_FALSE(is_seen(other));
-        ASSERT_TRUE(enter("Alpha"));
-        draw();
-        EXPECT_TRUE(wait_for([&] { return is_seen(other); }));
-        press_back(); // it is there already
-        draw();
-        EXPECT_TRUE(is_seen(one));
-    });
-}
-
 TEST_F(Browser, SpeaksTheChosenLanguage)
 {
     std::set<std::string> all;

@@ -181,11 +181,13 @@ static void __gl_del(void *data, Evas_Object *)
         VELORA_LOGE("item_data is NULL");
         return;
     }
-    // No message may reach a row that is gone.
+    // No message may reach a row that is gone. Only a result's rows are not the run's, and a queue may be long.
     if (UploadViewData *vd = s_vd; vd && record->index >= 0 && record->gen_it) {
-        for (UploadItem *item : {__run_item(vd, record->index), __upload_item_find(vd, record->index)})
-            if (item && item->gen_it == record->gen_it)
-                item->gen_it = nullptr;
+        UploadItem *item = __run_item(vd, record->index);
+        if (!item || item->gen_it != record->gen_it)
+            item = __upload_item_find(vd, record->index);
+        if (item && item->gen_it == record->gen_it)
+            item->gen_it = nullptr;
     }
     __content_row_forget(record);
     if (record->folder)

@@ -100,25 +100,6 @@ TEST_F(Keys, RegistrationsComeAndGo)
     window = nullptr;
 }
 
-TEST_F(Keys, AreLeftToWhoeverUsesThemUp)
-{
-    Evas_Object *entry = elm_entry_add(window);
-    elm_naviframe_item_push(naviframe, "page", nullptr, nullptr, entry, nullptr);
-    elm_object_focus_set(entry, EINA_TRUE);
-    ASSERT_TRUE(driver::run_until([&] { return evas_focus_get(evas_object_evas_get(window)) != nullptr; }));
-    EXPECT_EQ(press("Escape"), ""); // it ends the entry's composing
-    EXPECT_EQ(press("XF86Back"), "n");
-    // held down: one press, however often it repeats
-    calls.clear();
-    Evas *evas = evas_object_evas_get(window);
-    for (int i = 0; i < 5; i++)
-        evas_event_feed_key_down(evas, "XF86Back", "XF86Back", nullptr, nullptr, 1, nullptr);
-    driver::settle();
-    EXPECT_EQ(calls, "");
-    driver::press(window, "XF86Back");
-    EXPECT_EQ(calls, "n");
-}
-
 std::string color(const char *name)
 {
     int r = 0, g = 0, b = 0, a = 0;

@@ -109,22 +109,6 @@ TEST_F(Requests, SurviveTheCommandLine)
     expect_filled(&line.request);
 }
 
-TEST_F(Requests, AreRepliesInOneLine)
-{
-    for (const auto result : {APP_CONTROL_RESULT_SUCCEEDED, APP_CONTROL_RESULT_FAILED, APP_CONTROL_RESULT_CANCELED}) {
-        const std::string line = reply_line(request, result);
-        EXPECT_EQ(line.find('\n'), std::string::npos);
-        app_control_s read;
-        read.operation = APP_CONTROL_OPERATION_VIEW; // a reply has extra data only
-        read.uri = odd_texts[3];
-        read.window = 0xfedcba98;
-        auto parsed = static_cast<app_control_result_e>(99);
-        ASSERT_TRUE(parse_reply_line(line, read, parsed));
-        EXPECT_EQ(parsed, result);
-        expect_filled(&read);
-    }
-}
-
 TEST_F(Requests, AreMadeOfFilesAndOptions)
 {
     const std::string here = std::filesystem::current_path();

@@ -87,19 +87,3 @@ TEST_F(Account, UpdateWritesOnlyWhatWasSet)
     EXPECT_EQ(account_update_to_db_by_id(account, 99), ACCOUNT_ERROR_RECORD_NOT_FOUND);
     account_destroy(account);
 }
-
-TEST_F(Account, FailedUpdateChangesNothing)
-{
-    int id = 0;
-    account_h account = record("a@b");
-    account_set_domain_name(account, "Other");
-    EXPECT_EQ(account_insert_to_db(account, &id), ACCOUNT_ERROR_NONE);
-    insert("c@d", &id);
-    // Its domain can be written, and then its user name is taken there.
-    EXPECT_EQ(account_set_user_name(account, "a@b"), ACCOUNT_ERROR_NONE);
-    EXPECT_EQ(account_set_domain_name(account, "Other"), ACCOUNT_ERROR_NONE);
-    EXPECT_EQ(account_update_to_db_by_id(account, id), ACCOUNT_ERROR_DB_FAILED);
-    account_destroy(account);
-    EXPECT_EQ(records("com.example.owner"), (Lines{"1 Other a@b - - - 2 0", "2 Cloud c@d - - - 2 0"}));
-    EXPECT_EQ(insert("c@d", &id), ACCOUNT_ERROR_DB_FAILED); // it is in its own domain still
-}

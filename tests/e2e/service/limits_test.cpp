@@ -31,26 +31,6 @@ TEST(Uploads, OnlyOneTakesAFreeName)
     EXPECT_EQ(cloud.used(), 12);
 }
 
-TEST(Uploads, ObeyLocksTakenMeanwhile)
-{
-    Cloud cloud;
-    Connection upload(cloud.port);
-    upload.put("/dav/f", 6);
-    upload.send("one");
-    ASSERT_TRUE(comes_true([&] { return cloud.temporary_files() == 1; }));
-    const std::string body = "<lockinfo xmlns='DAV:'><lockscope><exclusive/></lockscope><locktype><write/></locktype>"
-                             "</lockinfo>";
-    const Answer lock = cloud.ask("LOCK", "/dav/f", {"Depth: 0", "Timeout: Second-1"}, body);
-    EXPECT_EQ(lock.status, 201);
-    upload.send("one");
-    EXPECT_EQ(upload.status(), 423);
-    EXPECT_EQ(read_file(cloud.file("f")), "");
-    EXPECT_EQ(cloud.ask("PUT", "/dav/f", {"If: (" + lock.header("lock-token") + ")"}, "two").status, 204);
-    EXPECT_EQ(cloud.ask("LOCK", "/dav/f", {"Depth: 0"}, body).status, 423);
-    // A lock that nobody refreshes ends.
-    EXPECT_TRUE(comes_true([&] { return cloud.ask("PUT", "/dav/f", {}, "three").status == 204; }));
-}
-
 TEST(Uploads, CutOnesLeaveNothing)
 {
     Cloud cloud({"--quota", "100K"});

@@ -222,35 +222,3 @@ TEST(Service, KnowsDigests)
     EXPECT_EQ(cloud.ask("GET", "/dav/four").header("repr-digest"), "");
     EXPECT_EQ(count_of(properties("/dav/four"), ABC_HEX), 0u);
 }
-
-TEST(Service, AnswersPartsAndConditions)
-{
-    Cloud cloud;
-    std::string content;
-    for (int i = 0; content.size() < 5 << 20; i++)
-        content += std::to_string(i) + " ";
-    const std::string etag = cloud.ask("PUT", "/dav/f", {}, content).header("etag");
-    const std::string size = std::to_string(content.size());
-    ASSERT_FALSE(etag.empty());
-    const struct {
-        std::string method;
-        Headers headers;
-        int status;
-        std::string body, range;
-    } cases[] = {
-        {"GET", {"Range: bytes=0-4"}, 206, content.substr(0, 5), "bytes 0-4/" + size},
-        {"GET", {"Range: bytes=0-4", "If-Range: \"old\""}, 200, content, ""},
-        {"GET", {"If-None-Match: \"old\", " + etag}, 304, "", ""},
-        {"GET", {"If-Match: \"old\""}, 412, "", ""},
-        {"PUT", {"If-None-Match: *"}, 412, "", ""},
-        {"PUT", {"If-Match: " + etag}, 204, "", ""}, // and empties it
-        {"GET", {"Range: bytes=0-0"}, 416, "", "bytes */0"},
-    };
-    for (const auto &c : cases) {
-        SCOPED_TRACE(c.method + (c.headers.empty() ? "" : " " + c.headers.back()));
-        const Answer answer = cloud.ask(c.method, "/dav/f", c.headers);
-        EXPECT_EQ(answer.status, c.status);
-        EXPECT_TRUE(answer.body == c.body) << answer.body.size();
-        EXPECT_EQ(answer.header("content-range"), c.range);
-    }
-}

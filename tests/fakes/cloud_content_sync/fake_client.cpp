@@ -305,44 +305,14 @@ Thumbnails::Thumbnails(Client &owner) : client(owner) {}
 
 Thumbnails::~Thumbnails() = default;
 
-std::optional<std::string> Thumbnails::find(const ContentRow &row)
+// There are none.
+std::optional<std::string> Thumbnails::find(const ContentRow &)
 {
-    std::scoped_lock lock(fake().mutex);
-    const std::string path = join(row.parent, row.name);
-    return fake().fetched_thumbnails.count(path) ? std::optional(fake().thumbnails[path]) : std::nullopt;
+    return std::nullopt;
 }
 
-void Thumbnails::want(const ContentRow &row)
-{
-    std::scoped_lock lock(fake().mutex);
-    const std::string path = join(row.parent, row.name);
-    if (!fake().thumbnails.count(path) || unreachable(client))
-        return;
-    add_job(client, [this, path] {
-        if (!client.begin_callback(0, true))
-            return;
-        std::unique_lock held(fake().mutex);
-        fake().fetched_thumbnails.insert(path);
-        const auto told = cb;
-        void *const told_data = cb_data;
-        is_calling = true;
-        held.unlock();
-        if (told)
-            told(path.c_str(), told_data);
-        held.lock();
-        is_calling = false;
-        held.unlock();
-        client.end_callback();
-    });
-}
+void Thumbnails::want(const ContentRow &) {}
 
-void Thumbnails::set_cb(cloud_content_sync_thumbnail_cb new_cb, void *user_data)
-{
-    std::unique_lock lock(fake().mutex);
-    cb = new_cb;
-    cb_data = user_data;
-    if (!client.on_own_thread())
-        fake().changed.wait(lock, [&] { return !is_calling; });
-}
+void Thumbnails::set_cb(cloud_content_sync_thumbnail_cb, void *) {}
 
 } // namespace cloud

@@ -129,11 +129,6 @@ void fake_cloud_fail_content(int error)
     change([&](FakeState &state) { state.content_error = error; });
 }
 
-void fake_cloud_add_thumbnail(const std::string &path, const std::string &picture)
-{
-    change([&](FakeState &state) { state.thumbnails[path] = picture; });
-}
-
 void fake_cloud_set_delay(int milliseconds)
 {
     change([&](FakeState &state) { state.delay = milliseconds; });

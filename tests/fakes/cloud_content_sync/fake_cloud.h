@@ -33,8 +33,6 @@ void fake_cloud_fail_upload(int nth, int error);
 void fake_cloud_fail_refresh(int error);
 void fake_cloud_fail_create(int error);
 void fake_cloud_fail_content(int error);
-// The service makes this picture, a file, the thumbnail of the file at `path`: the client has it once it was asked for.
-void fake_cloud_add_thumbnail(const std::string &path, const std::string &picture);
 
 // A pause before each callback, in milliseconds.
 void fake_cloud_set_delay(int milliseconds);

@@ -10,9 +10,7 @@ struct FakeState {
     int permits = 0, delay = 0, uploads_sent = 0, refresh_error = 0, create_error = 0, content_error = 0, handles = 0;
     std::map<int, int> upload_errors; // number of the upload -> error
     std::vector<std::string> log;
-    std::map<std::string, std::string> cached;     // path -> content of the cached file
-    std::map<std::string, std::string> thumbnails; // path -> file
-    std::set<std::string> fetched_thumbnails;      // paths
+    std::map<std::string, std::string> cached; // path -> content of the cached file
     std::map<const cloud::Client *, std::deque<std::function<void()>>> jobs;
     std::map<std::pair<const cloud::Client *, int>, std::string> landed;
 
