@@ -232,6 +232,8 @@ TEST_F(Queue, AResultOpenedDuringARunLeavesTheRunAlone)
         start({"a.txt", "b.txt", "c.txt"});
         show_result({"old.txt"}, "success");
         EXPECT_EQ(rows(), Texts{"uploaded old.txt"});
+        for (const UploadItem *item : s_vd.load()->run)
+            EXPECT_EQ(item->gen_it, nullptr) << "its row is gone";
         EXPECT_EQ(s_vd.load()->ad->exit_on_pause, 0) << "the run goes on behind";
         fake_cloud_hold(false);
         ASSERT_TRUE(wait_for(is_over));

@@ -181,14 +181,11 @@ static void __gl_del(void *data, Evas_Object *)
         VELORA_LOGE("item_data is NULL");
         return;
     }
-    // No message may reach a row that is gone. Only a result's rows are not the run's, and a queue may be long.
-    if (UploadViewData *vd = s_vd; vd && record->index >= 0 && record->gen_it) {
-        UploadItem *item = __run_item(vd, record->index);
-        if (!item || item->gen_it != record->gen_it)
-            item = __upload_item_find(vd, record->index);
-        if (item && item->gen_it == record->gen_it)
-            item->gen_it = nullptr;
-    }
+    // No message of the run may reach a row that is gone. Other items go with their rows.
+    UploadViewData *vd = s_vd;
+    UploadItem *item = vd && record->index >= 0 ? __run_item(vd, record->index) : nullptr;
+    if (item && item->gen_it == record->gen_it)
+        item->gen_it = nullptr;
     __content_row_forget(record);
     if (record->folder)
         cloud_content_sync_folder_destroy(record->folder);
@@ -298,12 +295,13 @@ void __result_rows_append(UploadViewData *vd, bool is_reentry)
     const bool is_success = g_strcmp0(ad->display_type, "success") == 0;
     const bool is_failure = g_strcmp0(ad->display_type, "fail") == 0;
     __state_show(vd, is_failure && ad->result_path_count == 0 ? VIEW_STATE_FULL : VIEW_STATE_NONE);
-    for (int i = 0; i < ad->result_path_count; i++) {
-        UploadItem *item = __upload_item_find(vd, i);
-        if (!item) {
+    GList *entry = ad->upload_list;
+    for (int i = 0; i < ad->result_path_count; i++, entry = entry->next) {
+        if (!entry) {
             VELORA_LOGE("upload_item is NULL");
             return;
         }
+        auto *item = static_cast<UploadItem *>(entry->data);
         if (!is_success && !is_failure)
             continue;
         if (is_reentry && item->state == UPLOAD_STATE_CANCELED)

@@ -330,12 +330,13 @@ static bool __result_items_prepare(UploadViewData *vd)
 {
     vd->settled = vd->ad->result_path_count;
     const TakenNames taken_names(vd);
-    for (int i = 0; i < vd->ad->result_path_count; i++) {
-        UploadItem *item = __upload_item_find(vd, i);
-        if (!item) {
+    GList *entry = vd->ad->upload_list;
+    for (int i = 0; i < vd->ad->result_path_count; i++, entry = entry->next) {
+        if (!entry) {
             VELORA_LOGE("upload_item is NULL");
             return false;
         }
+        auto *item = static_cast<UploadItem *>(entry->data);
         item->index = i;
         item->size = ecore_file_size(item->path);
         g_free(item->server_path);
