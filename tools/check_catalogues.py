@@ -29,8 +29,10 @@ STRAY_MARKUP = re.compile(r"<(?!br/>)|&(?!(?:amp|lt|gt|quot|nbsp);)")
 
 
 def read_po(path):
-    """Returns (header fields, {msgid: msgstr}, the msgids that occur twice, the msgids marked fuzzy)."""
-    entries, doubles, fuzzy = {}, [], []
+    """Returns (header fields, {msgid: msgstr}, the msgids that occur twice, those marked fuzzy, those with a plural).
+
+    A plural's msgstr is its last form."""
+    entries, doubles, fuzzy, plurals = {}, [], [], set()
     for block in re.split(r"\n\s*\n", path.read_text(encoding="utf-8")):
         parts, key = {}, None
         for line in block.splitlines():
@@ -45,9 +47,12 @@ def read_po(path):
             doubles.append(parts["msgid"])
         if re.search(r"^#,.*fuzzy", block, re.M):
             fuzzy.append(parts["msgid"])
-        entries[parts["msgid"]] = parts.get("msgstr", parts.get("msgstr[0]", ""))
+        forms = [text for key, text in parts.items() if key.startswith("msgstr")]
+        entries[parts["msgid"]] = forms[-1] if forms else ""
+        if "msgid_plural" in parts:
+            plurals.add(parts["msgid"])
     fields = dict(line.split(": ", 1) for line in entries.pop("", "").split("\\n") if ": " in line)
-    return fields, entries, doubles, fuzzy
+    return fields, entries, doubles, fuzzy, plurals
 
 
 def check_languages(po, languages):
@@ -62,7 +67,7 @@ def check_languages(po, languages):
             if not path.exists():
                 faults.append(f"{domain}/{language}.po is missing")
                 continue
-            fields, entries, doubles, fuzzy = read_po(path)
+            fields, entries, doubles, fuzzy, plurals = read_po(path)
             texts[domain][language] = entries
             faults += [f"{domain}/{language}.po: no header field {name}" for name in HEADER_FIELDS if not fields.get(name)]
             if fields.get("Language", language) != language:
@@ -82,7 +87,8 @@ def check_languages(po, languages):
                     faults.append(f"{where}: {msgid} has no text")
                 elif CONVERSION.findall(text) != CONVERSION.findall(model):
                     faults.append(f"{where}: {msgid} has other conversions than \"{model}\"")
-                elif msgid.startswith("IDS_") and len(CONVERSION.findall(text)) != msgid.split("_").count("PD"):
+                elif (msgid.startswith("IDS_") and msgid not in plurals
+                      and len(CONVERSION.findall(text)) != msgid.split("_").count("PD")):
                     faults.append(f"{where}: {msgid} does not have the number that its id promises")
                 elif text.startswith("IDS_"):
                     faults.append(f"{where}: {msgid} shows an id")

@@ -11,17 +11,17 @@ class Queue : public UploadPage {
     void start(const std::vector<std::string> &names)
     {
         share(names);
-        wait_for([] { return !s_vd.load()->ad->popup; });
+        wait_for([] { return !s_vd->ad->popup; });
         fake_cloud_hold(true);
         ASSERT_TRUE(press_done());
-        ASSERT_TRUE(wait_for([] { return !fake_cloud_upload_log().empty(); }));
+        ASSERT_TRUE(wait_for([] { return the_run() && !fake_cloud_upload_log().empty(); }));
     }
     // Lets the callbacks of one file through: three percentages and the end.
     static bool finish_file()
     {
-        const int before = s_vd.load()->success + s_vd.load()->fail;
+        const int before = ended();
         fake_cloud_let_through(4);
-        return wait_for([before] { return s_vd.load()->success + s_vd.load()->fail == before + 1; });
+        return wait_for([before] { return ended() == before + 1; });
     }
     static std::string ongoing()
     {
@@ -148,7 +148,7 @@ TEST_F(Queue, CancelTakesFilesOut)
             }
             EXPECT_TRUE(wait_for([&] { return ongoing() == c.content; })) << ongoing();
             fake_cloud_hold(false);
-            ASSERT_TRUE(wait_for([] { return is_over() && !s_vd.load()->is_uploading; }));
+            ASSERT_TRUE(wait_for([] { return is_over(); }));
             EXPECT_EQ(states(), c.end);
             EXPECT_EQ(notifications(), c.result.empty() ? Texts{} : Texts{c.result});
             for (const size_t i : {0, 1, 2}) // "/a.txt", "/b.txt", "/c.txt"
@@ -162,14 +162,14 @@ TEST_F(Queue, ProgressLeavesTheCancelButtonUnderTheFinger)
     run([&] {
         start({"a.txt"});
         fake_cloud_let_through(1);
-        ASSERT_TRUE(wait_for([&] { return s_vd.load()->run[0]->state == UPLOAD_STATE_UPLOADING; }));
+        ASSERT_TRUE(wait_for([&] { return the_run()->files[0].item->state == UPLOAD_STATE_UPLOADING; }));
         draw();
-        Evas_Object *button = driver::find_widget(s_vd.load()->genlist, "elm_button");
+        Evas_Object *button = driver::find_widget(s_vd->genlist, "elm_button");
         fake_cloud_let_through(1);
-        ASSERT_TRUE(wait_for([&] { return s_vd.load()->run[0]->progress == 50; }));
+        ASSERT_TRUE(wait_for([&] { return the_run()->files[0].item->progress == 50; }));
         draw();
-        EXPECT_EQ(driver::find_widget(s_vd.load()->genlist, "elm_button"), button);
-        Evas_Object *bar = driver::find_widget(s_vd.load()->genlist, "elm_progressbar");
+        EXPECT_EQ(driver::find_widget(s_vd->genlist, "elm_button"), button);
+        Evas_Object *bar = driver::find_widget(s_vd->genlist, "elm_progressbar");
         EXPECT_DOUBLE_EQ(elm_progressbar_value_get(bar), 0.5);
     });
 }
@@ -179,7 +179,7 @@ TEST_F(Queue, ACancelThatComesTooLateIsCountedAlone)
     run([&] {
         start({"a.txt", "b.txt"});
         ASSERT_TRUE(finish_file());
-        __uploading_file_mutil_cancel(__upload_item_find(s_vd, 0), s_vd);
+        __uploading_file_mutil_cancel(the_run()->files[0].item.get(), s_vd);
         EXPECT_TRUE(log.has("Cann't cancel it"));
         EXPECT_EQ(ongoing(), "1 / 1");
         fake_cloud_hold(false);
@@ -197,13 +197,13 @@ TEST_F(Queue, AFailedFileCanBeSentAgain)
         ASSERT_TRUE(finish_file());
         ASSERT_TRUE(wait_for([] { return rows()[0] == "failed a.txt"; }));
         ASSERT_TRUE(driver::click_row(row(0)));
-        EXPECT_EQ(s_vd.load()->ad->popup, nullptr) << "not while the queue runs";
+        EXPECT_EQ(s_vd->ad->popup, nullptr) << "not while the queue runs";
         fake_cloud_hold(false);
         ASSERT_TRUE(wait_for(is_over));
 
         ASSERT_TRUE(driver::click_row(row(0)));
         ASSERT_TRUE(press_popup_button(1)); // Cancel
-        EXPECT_EQ(s_vd.load()->ad->popup, nullptr);
+        EXPECT_EQ(s_vd->ad->popup, nullptr);
         EXPECT_EQ(rows()[0], "failed a.txt");
 
         fake_cloud_hold(true);
@@ -212,7 +212,7 @@ TEST_F(Queue, AFailedFileCanBeSentAgain)
         EXPECT_EQ(rows()[0], "queued a.txt");
         EXPECT_TRUE(wait_for([] { return ongoing() == "0 / 1"; })) << ongoing();
         ASSERT_TRUE(driver::click_row(row(1)));
-        EXPECT_EQ(s_vd.load()->ad->popup, nullptr) << "one at a time";
+        EXPECT_EQ(s_vd->ad->popup, nullptr) << "one at a time";
         fake_cloud_hold(false);
         ASSERT_TRUE(wait_for([] { return is_over() && rows()[0] == "uploaded a.txt"; }));
         EXPECT_EQ(notifications(), Texts{"a.txt: Upload complete success: a.txt"});
@@ -232,9 +232,9 @@ TEST_F(Queue, AResultOpenedDuringARunLeavesTheRunAlone)
         start({"a.txt", "b.txt", "c.txt"});
         show_result({"old.txt"}, "success");
         EXPECT_EQ(rows(), Texts{"uploaded old.txt"});
-        for (const UploadItem *item : s_vd.load()->run)
-            EXPECT_EQ(item->gen_it, nullptr) << "its row is gone";
-        EXPECT_EQ(s_vd.load()->ad->exit_on_pause, 0) << "the run goes on behind";
+        for (const RunFile &file : the_run()->files)
+            EXPECT_EQ(file.item->gen_it, nullptr) << "its row is gone";
+        EXPECT_EQ(s_vd->ad->exit_on_pause, 0) << "the run goes on behind";
         fake_cloud_hold(false);
         ASSERT_TRUE(wait_for(is_over));
         EXPECT_EQ(states(), (std::vector<int>{done, done, done}));
@@ -273,10 +273,10 @@ TEST_F(Queue, ALaterShareIsNextWhenTheViewIsFree)
             if (c.has_result)
                 show_result({"old.txt", "older.txt", "oldest.txt"}, "fail");
             fake_cloud_hold(false);
-            ASSERT_TRUE(wait_for([] { return !s_vd.load()->thread; }));
+            ASSERT_TRUE(wait_for([] { return !s_vd->run; }));
             if (!c.is_running)
                 share({"late.txt"});
-            EXPECT_EQ(s_vd.load()->ad->exit_on_pause, 0);
+            EXPECT_EQ(s_vd->ad->exit_on_pause, 0);
             ASSERT_TRUE(wait_for([] { return rows() == Texts({"folder Alpha", "file a.txt", "file b.txt"}); }));
             EXPECT_TRUE(shows("Upload to"));
             ASSERT_TRUE(driver::click_row(row(0)));
@@ -304,7 +304,7 @@ TEST_F(Queue, EndsInTheMiddleOfATransfer)
             } else {
                 press_back(); // only lowers the window
             }
-            _velora_app_exit(s_vd.load()->ad);
+            _velora_app_exit(s_vd->ad);
         });
         EXPECT_TRUE(notifications().empty() || notifications()[0].find("Velora: ") == std::string::npos)
             << "no progress is left behind";
@@ -320,9 +320,10 @@ TEST_F(Queue, SurvivesManySmallFiles)
         share(names);
         const double start = ecore_time_get();
         ASSERT_TRUE(press_done());
+        ASSERT_TRUE(the_run());
         ASSERT_TRUE(wait_for(is_over));
         EXPECT_LT(ecore_time_get() - start, 15.0) << "no file waits for the worker's next look";
-        EXPECT_EQ(s_vd.load()->success, 60);
+        EXPECT_EQ(the_run()->report.success, 60);
     });
     EXPECT_EQ(fake_cloud_list("/").size(), 64u);
 }

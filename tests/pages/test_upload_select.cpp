@@ -17,7 +17,9 @@ class Selecting : public UploadPage {
     void select()
     {
         driver::press(window(), "Menu");
-        ASSERT_TRUE(s_vd.load()->more_menu);
+        ASSERT_TRUE(popup_is("more menu"));
+        driver::press(window(), "Menu"); // closes it
+        ASSERT_TRUE(wait_for([] { return !s_vd->ad->popup; }));
         __ctx_delete_cb(s_vd, nullptr, nullptr);
         driver::settle();
         draw();
@@ -28,21 +30,21 @@ class Selecting : public UploadPage {
     }
     static bool tap_all()
     {
-        return driver::click_row(elm_genlist_first_item_get(s_vd.load()->select_all_genlist));
+        return driver::click_row(__select_all_row());
     }
     static bool done()
     {
-        return driver::click(s_vd.load()->done_btn);
+        return driver::click(s_vd->done_btn);
     }
     // "N Selected" with an "all" for the check of the select-all row and a "!" when Done cannot be pressed.
     static std::string state()
     {
-        if (!s_vd.load()->is_select_mode)
+        if (!s_vd->is_select_mode)
             return "off";
-        std::string title = elm_object_item_part_text_get(s_vd.load()->nf_item, "elm.text.title");
-        Evas_Object *check = driver::find_widget(s_vd.load()->select_all_genlist, "elm_check");
+        std::string title = elm_object_item_part_text_get(s_vd->nf_item, "elm.text.title");
+        Evas_Object *check = driver::find_widget(elm_object_item_widget_get(__select_all_row()), "elm_check");
         return title + (check && elm_check_state_get(check) ? " all" : "") +
-               (elm_object_disabled_get(s_vd.load()->done_btn) ? "!" : "");
+               (elm_object_disabled_get(s_vd->done_btn) ? "!" : "");
     }
 };
 
@@ -100,7 +102,7 @@ TEST_F(Selecting, DoneTakesTheSelectedOutAndAsksForTheRunningOne)
                 ASSERT_TRUE(nth < 0 ? tap_all() : tap(nth));
             ASSERT_TRUE(done());
             EXPECT_EQ(state(), "off");
-            EXPECT_EQ(s_vd.load()->ad->popup != nullptr, c.button != 0);
+            EXPECT_EQ(s_vd->ad->popup != nullptr, c.button != 0);
             EXPECT_TRUE(c.button == 0 || press_popup_button(c.button));
             fake_cloud_hold(false);
             ASSERT_TRUE(wait_for(is_over));

@@ -8,17 +8,20 @@ namespace {
 
 class Browser : public UploadPage {
   protected:
+    static Evas_Object *bar()
+    {
+        return driver::find_widget(s_vd->layout, "elm_toolbar");
+    }
     static Texts path_bar()
     {
         Texts all;
-        for (Elm_Object_Item *item = elm_toolbar_first_item_get(s_vd.load()->toolbar); item;
-             item = elm_toolbar_item_next_get(item))
+        for (Elm_Object_Item *item = elm_toolbar_first_item_get(bar()); item; item = elm_toolbar_item_next_get(item))
             all.push_back(elm_object_item_text_get(item));
         return all;
     }
     static bool tap_path(const char *label)
     {
-        return driver::click(driver::find_text(s_vd.load()->toolbar, label));
+        return driver::click(driver::find_text(bar(), label));
     }
     static bool enter(const std::string &name)
     {
@@ -28,11 +31,11 @@ class Browser : public UploadPage {
     }
     static std::string folder()
     {
-        return s_vd.load()->folder ? s_vd.load()->ad->folder_path : "(none)";
+        return s_vd->folder ? s_vd->ad->folder_path : "(none)";
     }
     static bool jump_over()
     {
-        return wait_for([] { return !s_vd.load()->pathinfo_timer; });
+        return wait_for([] { return !__path_bar_is_jumping(); });
     }
 };
 
@@ -46,7 +49,7 @@ TEST_F(Browser, WalksDownAndBackUp)
         EXPECT_TRUE(shows("R&D <b>")) << driver::read_texts(window());
         ASSERT_TRUE(enter("R&D <b>"));
         EXPECT_EQ(folder(), "/R&D <b>");
-        EXPECT_TRUE(driver::find_text(s_vd.load()->toolbar, "R&D <b>")) << "on the path bar, as it stands";
+        EXPECT_TRUE(driver::find_text(bar(), "R&D <b>")) << "on the path bar, as it stands";
         EXPECT_TRUE(rows().empty());
         press_back();
         ASSERT_TRUE(enter("Alpha"));
@@ -72,10 +75,10 @@ TEST_F(Browser, JumpsByThePathBar)
         for (const char *name : {"Alpha", "Beta", "Gamma"})
             ASSERT_TRUE(enter(name));
         ASSERT_TRUE(tap_path("Gamma")); // where we are
-        EXPECT_EQ(s_vd.load()->pathinfo_timer, nullptr);
+        EXPECT_FALSE(__path_bar_is_jumping());
         ASSERT_TRUE(tap_path("Beta"));
         EXPECT_EQ(path_bar(), (Texts{"Velora", "Alpha", "Beta"}));
-        ASSERT_TRUE(s_vd.load()->pathinfo_timer);
+        ASSERT_TRUE(__path_bar_is_jumping());
         ASSERT_TRUE(tap_path("Velora")); // too soon
         EXPECT_EQ(path_bar(), (Texts{"Velora", "Alpha", "Beta"}));
         ASSERT_TRUE(jump_over());
@@ -96,14 +99,14 @@ TEST_F(Browser, JumpsByThePathBar)
         ASSERT_TRUE(tap_path("Beta"));
         ASSERT_TRUE(jump_over());
         EXPECT_EQ(folder(), "(none)");
-        EXPECT_TRUE(elm_object_disabled_get(s_vd.load()->done_btn));
+        EXPECT_TRUE(elm_object_disabled_get(s_vd->done_btn));
         ASSERT_TRUE(tap_path("Alpha"));
         ASSERT_TRUE(jump_over());
         EXPECT_EQ(folder(), "/Alpha");
-        EXPECT_FALSE(elm_object_disabled_get(s_vd.load()->done_btn));
+        EXPECT_FALSE(elm_object_disabled_get(s_vd->done_btn));
 
         ASSERT_TRUE(tap_path("Velora"));
-        _velora_app_exit(s_vd.load()->ad); // with the jump still to come
+        _velora_app_exit(s_vd->ad); // with the jump still to come
     });
 }
 
@@ -114,12 +117,12 @@ TEST_F(Browser, BackOnTheWaitGivesUpTheShareAndStays)
     run([&] {
         share({"new.txt"});
         press_back();
-        ASSERT_TRUE(s_vd.load());
-        EXPECT_EQ(s_vd.load()->ad->popup, nullptr);
-        EXPECT_EQ(s_vd.load()->ad->upload_list, nullptr);
+        ASSERT_TRUE(s_vd);
+        EXPECT_EQ(s_vd->ad->popup, nullptr);
+        EXPECT_EQ(__waiting_count(), 0);
         EXPECT_FALSE(driver::exit_requested());
         fake_cloud_hold(false); // the refresh still ends, and there is nothing to upload
-        ASSERT_TRUE(wait_for([] { return s_vd.load()->ad->popup != nullptr; }));
+        ASSERT_TRUE(wait_for([] { return s_vd->ad->popup != nullptr; }));
         driver::settle();
         EXPECT_TRUE(press_popup_button(1));
         EXPECT_TRUE(wait_for_exit());
@@ -144,25 +147,26 @@ TEST_F(Browser, ARefreshLeavesTheRowsAloneThatAreStillTrue)
 
 TEST_F(Browser, SaysWhatIsWrongAndTriesAgain)
 {
-    for (const auto &[error, words] : {std::pair(CLOUD_CONTENT_SYNC_ERROR_NETWORK, "You are offline"),
-                                       {CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED, "You are signed out"}}) {
+    for (const auto &[error, words] :
+         {std::pair(CLOUD_CONTENT_SYNC_ERROR_NETWORK, "Velora cannot be reached"), // with Wi-Fi on
+          {CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED, "You are signed out"}}) {
         fake_cloud_reset();
         fake_cloud_add_folder("/Fresh");
         fake_cloud_fail_refresh(error);
         run([&, text = words] {
             share({"new.txt"});
-            ASSERT_TRUE(wait_for([] { return s_vd.load()->state && !s_vd.load()->ad->popup; }));
-            EXPECT_TRUE(elm_object_disabled_get(s_vd.load()->done_btn)) << "no folder to upload into";
+            ASSERT_TRUE(wait_for([] { return __state_shown(s_vd) > VIEW_STATE_LOADING && !s_vd->ad->popup; }));
+            EXPECT_TRUE(elm_object_disabled_get(s_vd->done_btn)) << "no folder to upload into";
             EXPECT_TRUE(shows(text)) << driver::read_texts(window());
-            ASSERT_TRUE(driver::click(driver::find_widget(s_vd.load()->state, "elm_button")));
+            ASSERT_TRUE(driver::click(driver::find_text(window(), "Try again")));
             EXPECT_TRUE(wait_for([] { return rows() == Texts{"folder Fresh"}; }));
-            EXPECT_FALSE(elm_object_disabled_get(s_vd.load()->done_btn));
+            EXPECT_FALSE(elm_object_disabled_get(s_vd->done_btn));
         });
     }
     fake_cloud_fail_create(CLOUD_CONTENT_SYNC_ERROR_NO_SERVICE);
     run([&] {
         share({"new.txt"});
-        ASSERT_TRUE(s_vd.load()->ad->popup);
+        ASSERT_TRUE(s_vd->ad->popup);
         EXPECT_TRUE(press_popup_button(1));
         EXPECT_TRUE(wait_for_exit());
     });

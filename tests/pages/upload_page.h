@@ -3,7 +3,14 @@
 #include "application.h"
 #include "fake_cloud.h"
 #include "posted.h"
-#include "velora_upload_file/upload_internal.h"
+#include "velora_common/velora_current_popup.h"
+#include "velora_upload_file/upload_cancel.h"
+#include "velora_upload_file/upload_path_bar.h"
+#include "velora_upload_file/upload_row.h"
+#include "velora_upload_file/upload_select.h"
+#include "velora_upload_file/upload_state.h"
+#include "velora_upload_file/upload_waiting.h"
+#include "velora_upload_file/velora_upload_view.h"
 
 #include <algorithm>
 #include <clocale>
@@ -27,7 +34,7 @@ class UploadPage : public Application {
     void TearDown() override
     {
         fake_cloud_hold(false);
-        EXPECT_EQ(s_vd.load(), nullptr);
+        EXPECT_EQ(s_vd, nullptr);
         EXPECT_EQ(fake_cloud_open_handles(), 0);
         driver::settle();
     }
@@ -38,7 +45,8 @@ class UploadPage : public Application {
         Application::run([&script] {
             script();
             if (s_vd)
-                _velora_app_exit(s_vd.load()->ad);
+                _velora_app_exit(s_vd->ad);
+            seen_run.reset();
             driver::settle();
         });
     }
@@ -46,7 +54,7 @@ class UploadPage : public Application {
     {
         Application::request(wish);
         if (s_vd)
-            app = s_vd.load()->ad;
+            app = s_vd->ad;
         driver::settle();
     }
     // Local files of these names are shared; each holds its own name.
@@ -74,7 +82,7 @@ class UploadPage : public Application {
 
     static Evas_Object *window()
     {
-        return s_vd.load()->ad->win_main;
+        return s_vd->ad->win_main;
     }
     static bool shows(const std::string &text)
     {
@@ -91,11 +99,11 @@ class UploadPage : public Application {
             const UploadViewData *vd = s_vd;
             return vd && vd->done_btn && !vd->ad->popup && !elm_object_disabled_get(vd->done_btn);
         };
-        return wait_for(is_ready) && driver::click(s_vd.load()->done_btn);
+        return wait_for(is_ready) && driver::click(s_vd->done_btn);
     }
     static bool press_popup_button(int number)
     {
-        Evas_Object *popup = s_vd.load()->ad->popup;
+        Evas_Object *popup = s_vd->ad->popup;
         return popup && driver::click(elm_object_part_content_get(popup, ("button" + std::to_string(number)).c_str()));
     }
     // Rows get their place when they are drawn.
@@ -109,7 +117,7 @@ class UploadPage : public Application {
         draw();
         std::map<int, Evas_Object *> buttons; // by their height on the screen
         while (Evas_Object *button =
-                   driver::find_widget(s_vd.load()->genlist, "elm_button", static_cast<int>(buttons.size()))) {
+                   driver::find_widget(s_vd->genlist, "elm_button", static_cast<int>(buttons.size()))) {
             int y = 0;
             evas_object_geometry_get(button, nullptr, &y, nullptr, nullptr);
             buttons[y] = button;
@@ -118,7 +126,7 @@ class UploadPage : public Application {
     }
     static Elm_Object_Item *row(int nth)
     {
-        Elm_Object_Item *item = elm_genlist_first_item_get(s_vd.load()->genlist);
+        Elm_Object_Item *item = elm_genlist_first_item_get(s_vd->genlist);
         while (item && nth-- > 0)
             item = elm_genlist_item_next_get(item);
         return item;
@@ -129,7 +137,7 @@ class UploadPage : public Application {
         static const char *const kinds[] = {"file", "queued", "uploaded", "failed"};
         std::vector<std::string> all;
         for (int i = 0; Elm_Object_Item *item = row(i); i++) {
-            const auto *record = static_cast<const ItemData *>(elm_object_item_data_get(item));
+            const ItemData *record = __row_record(item);
             char *folder = nullptr;
             if (record->folder)
                 cloud_content_sync_folder_get_name(record->folder, &folder);
@@ -139,16 +147,31 @@ class UploadPage : public Application {
         }
         return all;
     }
+    // The run that is under way, or was when this was last called.
+    static const UploadRun *the_run()
+    {
+        if (s_vd && s_vd->run)
+            seen_run = s_vd->run;
+        return seen_run.get();
+    }
     static std::vector<int> states()
     {
         std::vector<int> all;
-        for (UploadItem *item : s_vd.load()->run)
-            all.push_back(item->state);
+        for (const RunFile &file : the_run()->files)
+            all.push_back(file.item->state);
         return all;
+    }
+    static int ended() // files of the run
+    {
+        return the_run() ? the_run()->report.success + the_run()->report.fail : 0;
     }
     static bool is_over() // the run has ended and the view knows
     {
-        return s_vd.load() && s_vd.load()->is_end_handled && !s_vd.load()->thread;
+        return s_vd && !s_vd->run && s_vd->phase != PHASE_BROWSING;
+    }
+    static bool popup_is(const char *topic)
+    {
+        return s_vd->ad->popup && std::string(s_vd->ad->popup_owner.topic) == topic;
     }
     static bool wait_for(const std::function<bool()> &condition, double seconds = 20)
     {
@@ -156,7 +179,7 @@ class UploadPage : public Application {
     }
     bool wait_for_exit()
     {
-        return wait_for([this] { return !s_vd.load() && !app->win_main; });
+        return wait_for([this] { return !s_vd && !app->win_main; });
     }
 
     static std::vector<std::string> notifications()
@@ -176,6 +199,7 @@ class UploadPage : public Application {
     }
 
     static inline AppData *app; // the one record of the process
+    static inline RunHold seen_run;
 };
 
 using Texts = std::vector<std::string>;

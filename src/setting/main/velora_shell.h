@@ -12,3 +12,15 @@ void __changeable_font_set(AppData *ad);
 
 // Sets is_landscape from the window's rotation, unless the person has locked the rotation.
 void __velora_update_landscape_mode(AppData *ad);
+
+// The LaunchMode that a request's extra data "launch_mode" stands for.
+int __velora_read_launch_mode(app_control_h request);
+
+// Makes our window transient for that of the request's sender, when it gave one and both are of X11.
+void __velora_join_caller_window(AppData *ad, app_control_h request);
+
+// Opens the page that a request is for. False when a failed network check ended it.
+bool __velora_dispatch(AppData *ad, app_control_h request, const char *operation);
+
+// Frees `*count` strings and their array, and clears both words.
+void __string_array_free(char ***values, int *count);

@@ -1,9 +1,9 @@
 #include "app/app.h"
 #include "main/velora_shell.h"
 #include "vconf/vconf.h"
+#include "velora_common/velora_indicator.h"
 #include "velora_common/velora_log.h"
 #include "velora_common/velora_paths.h"
-#include "velora_common/velora_popup.h"
 
 static void __win_delete_request_cb(void *, Evas_Object *, void *)
 {
@@ -42,6 +42,8 @@ static Evas_Object *__create_window(AppData *ad)
     elm_win_title_set(win, "velora");
     evas_object_smart_callback_add(win, "delete,request", __win_delete_request_cb, ad);
     elm_win_indicator_mode_set(win, ELM_WIN_INDICATOR_SHOW);
+    // With the window, for a popup that scrolls is emptied by an extension that comes while it is open.
+    elm_theme_extension_add(nullptr, _velora_common_app_file("res/edje/velora_genlist.edj").c_str());
     __set_first_size(win);
     evas_object_show(win);
     ad->win_main = win;

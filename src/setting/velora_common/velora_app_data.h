@@ -7,6 +7,8 @@
 #include <Elementary.h>
 #include <atomic>
 #include <glib.h>
+#include <memory>
+#include <type_traits>
 
 #define VELORA_PACKAGE "com.orvant.velora"
 #define VELORA_SHARE_PACKAGE "com.orvant.velora-share"
@@ -28,50 +30,62 @@ enum LaunchMode {
 
 using CloudSyncHandle = cloud_content_sync_h;
 
+struct CloudClientDestroy {
+    void operator()(CloudSyncHandle handle) const
+    {
+        cloud_content_sync_destroy(handle);
+    }
+};
+// A hold on the cloud client: it is destroyed with the last one. See velora_client.h.
+using ClientHold = std::shared_ptr<std::remove_pointer_t<CloudSyncHandle>>;
+
+// Whose popup one is: the page (or whatever else shows it) by its address, and what it is about.
+struct PopupOwner {
+    const void *page = nullptr;
+    const char *topic = ""; // a literal
+};
+
 // One instance for the life of the process, zero-filled by main. Strings, lists, pipes and handles are its own; the
-// exit routine releases them. Main loop only, but for the atomic word.
+// exit routine releases them. Main loop only, but for the atomic words, which workers and the cloud client's threads
+// read.
 struct AppData {
-    app_control_h app_control = nullptr; // clone of the last request; the reply is sent against it
+    app_control_h app_control = nullptr; // the last request, which velora_requests.h owns
     Evas_Object *naviframe = nullptr;    // null until the main window is built
     Evas_Object *win_main = nullptr;
     Evas_Object *conformant = nullptr;
     Evas_Object *layout_main = nullptr;
     Evas_Object *bg = nullptr;
-    Evas_Object *popup = nullptr; // the one popup of whatever page is showing
-    int launch_mode = LAUNCH_MODE_NONE;
+    Evas_Object *popup = nullptr;       // the one popup on screen; changed by velora_current_popup.h alone
+    int launch_mode = LAUNCH_MODE_NONE; // of the last request; a page copies what it needs of it
     bool is_landscape = false;
     char *email = nullptr;
-    CloudSyncHandle sync_handle = nullptr;
-    GList *upload_list = nullptr; // of UploadItem
-    char *folder_path = nullptr;  // the open cloud folder: where uploads go
+    std::atomic<CloudSyncHandle> sync_handle = nullptr; // what `client` holds
+    GList *upload_list = nullptr;                       // of UploadItem: what was shared and no page has taken yet
+    char *folder_path = nullptr;                        // the open cloud folder: where uploads go
     std::atomic<bool> is_meta_refreshed = false;
-    Ecore_Pipe *pipe = nullptr;
-    char *reply_result = nullptr; // extra data "result" of the reply; null: no extra data
+    std::atomic<Ecore_Pipe *> pipe = nullptr;
+    char *reply_result = nullptr; // extra data "result" of the last request's reply; null: no extra data
     Ecore_X_Window caller_xwin = 0;
     Ecore_X_Window xwin = 0;
     int cellular_state = 0;
     bool is_welcome_shown = false; // while false, cancelling a network popup ends the application
-    bool is_share = false;         // a share is always replied to
+    bool is_share = false;         // the last request was a share
     ea_theme_color_table_h color_table = nullptr;
     ea_theme_font_table_h font_table = nullptr;
-    Ecore_Pipe *signout_pipe = nullptr;
+    std::atomic<Ecore_Pipe *> signout_pipe = nullptr;
     Evas_Object *signout_popup = nullptr;
     int exit_on_pause = 0;
     int noti_priv_id = 0; // upload notification that terminate deletes; -1: none
     char **result_paths = nullptr;
     int result_path_count = 0;
     char *display_type = nullptr;
-    GList *earlier_shares = nullptr; // clones of shares that a later request came after; answered at exit
+
+    ClientHold client;                            // AppData's own hold
+    PopupOwner popup_owner;                       // of `popup`
+    void (*popup_replaced)(void *data) = nullptr; // tells that owner when somebody else's takes its place
+    void *popup_replaced_data = nullptr;
 };
 
-// Leaves the application: replies to the launch request when its sender expects an answer, deletes popup, pipe, cloud
-// client and window, and ends the main loop. The one way out for every page; main loop only. Defined by the shell.
+// Leaves the application: answers everyone who waits for an answer, ends every page, deletes popup, pipe, cloud client
+// and window, and ends the main loop. The one way out; main loop only. Defined by the shell.
 void _velora_app_exit(AppData *ad);
-
-// Deletes the current popup, if any. Main loop only.
-inline void _velora_app_popup_delete(AppData *ad)
-{
-    if (ad->popup)
-        evas_object_del(ad->popup);
-    ad->popup = nullptr;
-}

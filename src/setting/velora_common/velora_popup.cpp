@@ -1,10 +1,6 @@
 #include "velora_common/velora_popup.h"
 #include "velora_common/velora_log.h"
 #include "velora_common/velora_paths.h"
-#include <clocale>
-#include <cstring>
-#include <libintl.h>
-#include <vector>
 
 static void __popup_mouse_up_cb(void *data, Evas *, Evas_Object *, void *event_info)
 {
@@ -118,23 +114,16 @@ static void __popup_del_cb(void *, Evas_Object *obj, void *)
     evas_object_del(obj);
 }
 
-static void __popup_del_by_timeout(void *data, Evas_Object *, void *)
+static void __popup_del_by_timeout(void *data, Evas_Object *obj, void *)
 {
     auto *ad = static_cast<AppData *>(data);
     if (!ad) {
         VELORA_LOGE("ad is NULL");
         return;
     }
-    _velora_app_popup_delete(ad);
+    evas_object_del(obj); // whatever else is on screen by now is not ours
     if (ad->layout_main)
         elm_object_focus_set(ad->layout_main, EINA_TRUE);
-}
-
-static void __timed_popup_deleted_cb(void *data, Evas *, Evas_Object *obj, void *)
-{
-    auto *ad = static_cast<AppData *>(data);
-    if (ad->popup == obj)
-        ad->popup = nullptr;
 }
 
 Evas_Object *_velora_common_create_one_text_popup_with_timer(Evas_Object *parent, AppData *ad)
@@ -145,9 +134,6 @@ Evas_Object *_velora_common_create_one_text_popup_with_timer(Evas_Object *parent
     }
     Evas_Object *popup = elm_popup_add(parent);
     ea_object_event_callback_add(popup, EA_CALLBACK_BACK, __popup_del_cb, nullptr);
-    // The back key deletes the popup itself; AppData must not be left with a dead one.
-    if (ad)
-        evas_object_event_callback_add(popup, EVAS_CALLBACK_DEL, __timed_popup_deleted_cb, ad);
     __expand(popup);
     elm_object_domain_translatable_text_set(
         popup, VELORA_DOMAIN, "IDS_CLOUD_BODY_WI_FI_CONNECTION_REQUIRED_CONNECT_TO_WI_FI_NETWORK_AND_TRY_AGAIN");
@@ -219,69 +205,4 @@ Evas_Object *_velora_common_progressbar_layout_create(Evas_Object *parent, const
     __expand(popup);
     evas_object_show(popup);
     return popup;
-}
-
-void _velora_common_set_indicator_mode(Evas_Object *conformant, int mode)
-{
-    static const struct {
-        const char *signal, *style;
-    } modes[] = {
-        {"elm,state,indicator,overlap", "indicator/transparent"},
-        {"elm,state,indicator,nooverlap", "indicator/headerbg"},
-        {"elm,state,indicator,overlap", "indicator/translucent"},
-    };
-    if (mode < INDICATOR_MODE_TRANSPARENT || mode > INDICATOR_MODE_TRANSLUCENT)
-        return;
-    elm_object_signal_emit(conformant, modes[mode].signal, "elm");
-    if (Evas_Object *bg = elm_object_part_content_get(conformant, "elm.swallow.indicator_bg"))
-        elm_object_style_set(bg, modes[mode].style);
-}
-
-Evas_Object *_velora_common_create_bottom_buttons(Evas_Object *parent, void *data, const char *text1_id,
-                                                  Evas_Smart_Cb cb1, const char *text2_id, Evas_Smart_Cb cb2)
-{
-    Evas_Object *layout = __layout_add(parent, "emergency_unlock_bottom_button");
-    __expand(layout);
-    evas_object_show(layout);
-    const struct {
-        const char *part, *text_id;
-        Evas_Smart_Cb cb;
-    } buttons[] = {{"emergency_btn", text1_id, cb1}, {"unlock_btn", text2_id, cb2}};
-    for (const auto &wanted : buttons) {
-        Evas_Object *button = elm_button_add(layout);
-        elm_object_style_set(button, "bottom");
-        elm_object_text_set(button, dcgettext(VELORA_DOMAIN, wanted.text_id, LC_MESSAGES));
-        evas_object_smart_callback_add(button, "clicked", wanted.cb, data);
-        elm_object_part_content_set(layout, wanted.part, button);
-        __expand(button);
-        __fill(button);
-        evas_object_show(button);
-    }
-    return layout;
-}
-
-int _velora_common_get_landscape_mode(Evas_Object *win)
-{
-    if (!win) {
-        VELORA_LOGE("parent is NULL");
-        return 0;
-    }
-    const int rotation = elm_win_rotation_get(win);
-    return rotation != 0 && rotation != 180;
-}
-
-void remove_genlist_item(Evas_Object *genlist)
-{
-    if (!genlist) {
-        VELORA_LOGE("list is NULL");
-        return;
-    }
-    // A list that has the keys' focus hands it on to the next of its rows with each one deleted.
-    if (elm_object_focus_get(genlist))
-        elm_object_focus_set(genlist, EINA_FALSE);
-    std::vector<Elm_Object_Item *> items; // collected first: deletion must not walk a list that changes
-    for (Elm_Object_Item *item = elm_genlist_first_item_get(genlist); item; item = elm_genlist_item_next_get(item))
-        items.push_back(item);
-    for (Elm_Object_Item *item : items)
-        elm_object_item_del(item);
 }

@@ -1,16 +1,10 @@
 #pragma once
 // The popups and progress widgets that every page shows, and how they are dismissed.
 //
-// Every builder returns the new, shown object, which belongs to its caller (most keep it in AppData's popup and delete
-// the earlier one first), and null after logging when the parent is null where it says so. Text ids are translated and
-// follow a change of language; "plain" texts are shown as they come, and are Edje markup. Main loop only.
+// Every builder returns the new, shown object, which belongs to its caller, who hands it to _velora_popup_show; null,
+// after logging, when the parent is null. Text ids are translated and follow a change of language; "plain" texts are
+// shown as they come, and are Edje markup. Main loop only.
 #include "velora_common/velora_app_data.h"
-
-enum IndicatorMode {
-    INDICATOR_MODE_TRANSPARENT = 0,
-    INDICATOR_MODE_HEADER = 1,
-    INDICATOR_MODE_TRANSLUCENT = 2,
-};
 
 // The back key, and a third mouse button's release, call cb(data, null, null) while the popup lives. With a null cb
 // the back key is ignored and the mouse button deletes the popup.
@@ -25,8 +19,8 @@ Evas_Object *_velora_common_with_title_btn_popup(Evas_Object *parent, const char
                                                  Evas_Smart_Cb cb1, Evas_Smart_Cb cb2, const char *btn1_text,
                                                  const char *btn2_text, void *data);
 
-// Says that a Wi-Fi connection is needed and goes away after 3 seconds, or when a screen reader has read it. It expects
-// to be ad->popup by then.
+// Says that a Wi-Fi connection is needed and goes away after 3 seconds, or when a screen reader has read it; the focus
+// is the main layout's then.
 Evas_Object *_velora_common_create_one_text_popup_with_timer(Evas_Object *parent, AppData *ad);
 
 // A wait without words; back calls back_cb.
@@ -39,16 +33,3 @@ Evas_Object *_velora_common_create_processing_popup_with_cancel(Evas_Object *par
 
 // A wait with a text (id of domain "velora") beside a small wheel; the caller adds title and back key.
 Evas_Object *_velora_common_progressbar_layout_create(Evas_Object *parent, const char *text_id);
-
-// How the indicator lies over the page; a mode not of IndicatorMode changes nothing.
-void _velora_common_set_indicator_mode(Evas_Object *conformant, int mode);
-
-// The two buttons at the bottom of a page (ids of domain "velora", translated once).
-Evas_Object *_velora_common_create_bottom_buttons(Evas_Object *parent, void *data, const char *text1_id,
-                                                  Evas_Smart_Cb cb1, const char *text2_id, Evas_Smart_Cb cb2);
-
-// 1 when the window is rotated by 90 or 270 degrees, else 0.
-int _velora_common_get_landscape_mode(Evas_Object *win);
-
-// Deletes every item of a genlist, in order.
-void remove_genlist_item(Evas_Object *genlist);

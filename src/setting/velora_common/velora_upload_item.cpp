@@ -1,10 +1,14 @@
 #include "velora_common/velora_upload_item.h"
 
-GList *_velora_upload_item_append(GList *list, const char *path)
+GList *_velora_upload_items_append(GList *list, char *const *paths, int count)
 {
-    auto *item = new UploadItem;
-    item->path = g_strdup(path);
-    return g_list_append(list, item);
+    GList *added = nullptr; // from its end: a list is walked to its end by each append
+    for (int i = count; i-- > 0;) {
+        auto *item = new UploadItem;
+        item->path = g_strdup(paths[i]);
+        added = g_list_prepend(added, item);
+    }
+    return g_list_concat(list, added);
 }
 
 UploadItem *_velora_upload_item_ref(UploadItem *item)

@@ -1,6 +1,8 @@
-// Up and Down in the list of uploads. The toolkit takes the keys to rows that can be selected; most uploads cannot, and
-// what can be done with them is on their cancel button.
-#include "velora_upload_file/upload_internal.h"
+// The toolkit takes the keys to rows that can be selected; most uploads cannot, and what can be done with them is on
+// their cancel button.
+#include "velora_upload_file/upload_keys.h"
+#include "velora_upload_file/upload_row.h"
+#include "velora_upload_file/upload_select.h"
 #include <cstring>
 
 static Evas_Object *__cancel_button_of(Elm_Object_Item *row)
@@ -14,7 +16,7 @@ static Evas_Object *__cancel_button_of(Elm_Object_Item *row)
 // Whether there is anything for the keys in a row. A row that is out of sight has no button yet.
 static bool __is_stop(UploadViewData *vd, Elm_Object_Item *row)
 {
-    const auto *record = static_cast<const ItemData *>(elm_object_item_data_get(row));
+    const auto *record = __row_record(row);
     return elm_genlist_item_select_mode_get(row) == ELM_OBJECT_SELECT_MODE_DEFAULT ||
            (record && record->type == ITEM_TYPE_UPLOADING && !vd->is_select_mode);
 }
@@ -48,7 +50,7 @@ static void __row_focus(UploadViewData *vd, Elm_Object_Item *row)
 static Eina_Bool __list_key_cb(void *, Evas_Object *, Evas_Object *, Evas_Callback_Type type, void *event_info)
 {
     UploadViewData *vd = s_vd;
-    if (!vd || !vd->is_upload_started || type != EVAS_CALLBACK_KEY_DOWN)
+    if (!vd || vd->phase == PHASE_BROWSING || type != EVAS_CALLBACK_KEY_DOWN)
         return EINA_FALSE;
     auto *event = static_cast<Evas_Event_Key_Down *>(event_info);
     const bool is_down = std::strcmp(event->key, "Down") == 0 || std::strcmp(event->key, "KP_Down") == 0;
@@ -66,28 +68,14 @@ static Eina_Bool __list_key_cb(void *, Evas_Object *, Evas_Object *, Evas_Callba
     // Past the ends: on to what stands above or below the list.
     if (row)
         __row_focus(vd, row);
-    else if (is_up && vd->select_all_item)
-        elm_object_item_focus_set(vd->select_all_item, EINA_TRUE);
+    else if (is_up && __select_all_row())
+        elm_object_item_focus_set(__select_all_row(), EINA_TRUE);
     else if (is_up)
         elm_object_focus_set(elm_object_item_part_content_get(vd->nf_item, "prev_btn"), EINA_TRUE);
     else if (vd->more_btn)
         elm_object_focus_set(vd->more_btn, EINA_TRUE);
     event->event_flags = static_cast<Evas_Event_Flags>(event->event_flags | EVAS_EVENT_FLAG_ON_HOLD);
     return EINA_TRUE;
-}
-
-void __row_tappable_set(Elm_Object_Item *row, bool is_tappable)
-{
-    Evas_Object *genlist = elm_object_item_widget_get(row);
-    const bool had_focus = !is_tappable && elm_object_focused_item_get(genlist) == row;
-    if (had_focus)
-        elm_object_item_focus_set(row, EINA_FALSE);
-    elm_genlist_item_select_mode_set(row, is_tappable ? ELM_OBJECT_SELECT_MODE_DEFAULT
-                                                      : ELM_OBJECT_SELECT_MODE_DISPLAY_ONLY);
-    if (had_focus) {
-        elm_object_focus_set(genlist, EINA_FALSE);
-        elm_object_focus_set(genlist, EINA_TRUE);
-    }
 }
 
 void __list_keys_add(Evas_Object *genlist)

@@ -1,39 +1,16 @@
-// How the rows of the view's list look.
-#include "velora_common/velora_paths.h"
-#include "velora_common/velora_popup.h"
-#include "velora_upload_file/upload_internal.h"
+#include "velora_upload_file/upload_list.h"
+#include "velora_common/velora_log.h"
+#include "velora_upload_file/upload_cancel.h"
+#include "velora_upload_file/upload_icon.h"
+#include "velora_upload_file/upload_keys.h"
+#include "velora_upload_file/upload_page.h"
+#include "velora_upload_file/upload_text.h"
 #include <cstdlib>
-#include <cstring>
-
-static bool __is_part(const char *part, const char *name)
-{
-    return std::strcmp(part, name) == 0;
-}
-
-static bool __is_icon_part(const char *part)
-{
-    return __is_part(part, "elm.icon") || __is_part(part, "elm.icon.1");
-}
-
-char *__one_line_markup(const char *text)
-{
-    char *valid = g_utf8_make_valid(text, -1);
-    std::string shown;
-    for (const char *c = valid; *c; c++) {
-        const auto byte = static_cast<unsigned char>(*c);
-        if (byte < 0x20)
-            shown += {'\xe2', '\x90', static_cast<char>(0x80 + byte)};
-        else
-            shown += *c;
-    }
-    g_free(valid);
-    return elm_entry_utf8_to_markup(shown.c_str());
-}
 
 // A name as a row shows it: passed through the translation.
 static char *__name_markup(const char *name)
 {
-    return name ? __one_line_markup(__text(name)) : nullptr;
+    return __one_line_markup(__text(name));
 }
 
 static char *__ud_genlist_dir_text_get(void *data, Evas_Object *, const char *part)
@@ -47,7 +24,7 @@ static char *__ud_genlist_dir_text_get(void *data, Evas_Object *, const char *pa
         return nullptr;
     char *name = nullptr;
     cloud_content_sync_folder_get_name(record->folder, &name);
-    char *markup = __name_markup(name);
+    char *markup = name ? __name_markup(name) : nullptr;
     std::free(name);
     return markup;
 }
@@ -60,15 +37,15 @@ static char *__ud_genlist_file_text_get(void *data, Evas_Object *, const char *p
         return nullptr;
     }
     if (__is_part(part, "elm.text.main.left") || __is_part(part, "elm.text.main.left.top"))
-        return __name_markup(record->name);
+        return __name_markup(record->name.c_str());
     if (!__is_part(part, "elm.text.sub.left.bottom"))
         return nullptr;
     std::string text = __text("IDS_CLOUD_POP_UPLOAD_FAILED");
-    UploadViewData *vd = s_vd;
-    const UploadItem *item = vd ? __upload_item_find(vd, record->index) : nullptr;
-    const char *why = item && item->error != 0 ? __failure_text(item->error) : nullptr;
+    const int error = record->item ? record->item->error.load() : 0;
+    const char *why = error != 0 ? __failure_text(error) : nullptr;
     if (why && text != why) // the words for a failure of no known kind say no more
         text = text + " · " + why;
+    text = text + " · " + __text("IDS_VELORA_BODY_TAP_TO_RETRY");
     return elm_entry_utf8_to_markup(text.c_str());
 }
 
@@ -79,46 +56,31 @@ static char *__ud_genlist_uploading_text_get(void *data, Evas_Object *, const ch
         VELORA_LOGE("item is NULL");
         return nullptr;
     }
-    return __is_part(part, "elm.text.main.left.top") ? __name_markup(record->name) : nullptr;
-}
-
-static Evas_Object *__list_layout_create(Evas_Object *parent, const char *style, Evas_Object **content,
-                                         Evas_Object *(*add)(Evas_Object *))
-{
-    Evas_Object *layout = elm_layout_add(parent);
-    elm_layout_theme_set(layout, "layout", style, "default");
-    *content = add(layout);
-    elm_object_part_content_set(layout, "elm.swallow.content", *content);
-    return layout;
+    return __is_part(part, "elm.text.main.left.top") ? __name_markup(record->name.c_str()) : nullptr;
 }
 
 static Evas_Object *__dir_content_get(void *, Evas_Object *obj, const char *part)
 {
-    if (!__is_icon_part(part))
-        return nullptr;
-    Evas_Object *image = nullptr;
-    Evas_Object *layout = __list_layout_create(obj, "list/B/type.2", &image, elm_image_add);
-    evas_object_repeat_events_set(layout, EINA_TRUE);
-    evas_object_size_hint_aspect_set(layout, EVAS_ASPECT_CONTROL_BOTH, 1, 1);
-    elm_image_file_set(image, _velora_common_app_file("res/edje/velora_edc_images.edj").c_str(),
-                       "docshelf_icon_folder.png");
-    evas_object_size_hint_align_set(image, EVAS_HINT_FILL, EVAS_HINT_FILL);
-    evas_object_size_hint_weight_set(image, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
-    return layout;
+    return __is_icon_part(part) ? __row_sign_create(obj, "list/B/type.2", "docshelf_icon_folder.png") : nullptr;
 }
 
 static Evas_Object *__ud_genlist_file_content_get(void *data, Evas_Object *obj, const char *part)
 {
     auto *record = static_cast<ItemData *>(data);
-    if (!record || !__is_icon_part(part))
+    if (!record)
         return nullptr;
-    return __file_icon_create(obj, record, record->type == ITEM_TYPE_CONTENT ? nullptr : record->path);
+    if (__is_icon_part(part))
+        return __file_icon_create(obj, record, record->item ? record->item->path : nullptr);
+    if (!__is_part(part, "elm.icon.2") || record->type == ITEM_TYPE_CONTENT)
+        return nullptr;
+    return __row_sign_create(obj, "list/C/type.1",
+                             record->type == ITEM_TYPE_UPLOADED ? "velora_icon_done" : "velora_icon_retry");
 }
 
 static Evas_Object *__cancel_button_create(Evas_Object *parent, ItemData *record)
 {
     Evas_Object *button = nullptr;
-    Evas_Object *layout = __list_layout_create(parent, "list/C/type.3", &button, elm_button_add);
+    Evas_Object *layout = __row_layout_create(parent, "list/C/type.3", &button, elm_button_add);
     elm_object_style_set(button, "editfield_clear");
     elm_object_domain_translatable_text_set(button, VELORA_SHARE_DOMAIN, "IDS_CLOUD_SK2_CANCEL");
     // Heard, not seen: there is one such button in every row.
@@ -132,17 +94,17 @@ static Evas_Object *__cancel_button_create(Evas_Object *parent, ItemData *record
 static Evas_Object *__selection_check_create(Evas_Object *parent, const ItemData *record)
 {
     Evas_Object *check = nullptr;
-    Evas_Object *layout = __check_create(parent, __selection_get(record->index), &check);
-    ea_screen_reader_name_set(check, record->name);
-    evas_object_pass_events_set(check, EINA_TRUE); // a tap on it selects the row
-    evas_object_repeat_events_set(layout, EINA_TRUE);
+    const bool is_selected = s_vd->run && s_vd->run->is_selected(record->item->index);
+    Evas_Object *layout = __row_check_create(parent, is_selected, &check);
+    ea_screen_reader_name_set(check, record->name.c_str());
     return layout;
 }
 
-static Evas_Object *__progress_create(Evas_Object *parent, const ItemData *record, const UploadItem *item)
+static Evas_Object *__progress_create(Evas_Object *parent, const ItemData *record)
 {
+    const UploadItem *item = record->item.get();
     Evas_Object *bar = elm_progressbar_add(parent);
-    ea_screen_reader_name_set(bar, record->name);
+    ea_screen_reader_name_set(bar, record->name.c_str());
     elm_object_style_set(bar, item->state == UPLOAD_STATE_UPLOADING ? "list_progress" : "pending_custom");
     elm_progressbar_horizontal_set(bar, EINA_TRUE);
     elm_progressbar_value_set(bar, item->progress / 100.0);
@@ -156,7 +118,7 @@ static Evas_Object *__ud_genlist_uploading_content_get(void *data, Evas_Object *
 {
     auto *record = static_cast<ItemData *>(data);
     UploadViewData *vd = s_vd;
-    const UploadItem *item = record && vd ? __upload_item_find(vd, record->index) : nullptr;
+    const UploadItem *item = record && vd ? record->item.get() : nullptr;
     if (!item) {
         VELORA_LOGE("upload_item is NULL");
         return nullptr;
@@ -171,44 +133,7 @@ static Evas_Object *__ud_genlist_uploading_content_get(void *data, Evas_Object *
         }
         return vd->is_select_mode ? __selection_check_create(obj, record) : __cancel_button_create(obj, record);
     }
-    return __is_part(part, "elm.swallow.progressbar") ? __progress_create(obj, record, item) : nullptr;
-}
-
-static void __gl_del(void *data, Evas_Object *)
-{
-    auto *record = static_cast<ItemData *>(data);
-    if (!record) {
-        VELORA_LOGE("item_data is NULL");
-        return;
-    }
-    // No message of the run may reach a row that is gone. Other items go with their rows.
-    UploadViewData *vd = s_vd;
-    UploadItem *item = vd && record->index >= 0 ? __run_item(vd, record->index) : nullptr;
-    if (item && item->gen_it == record->gen_it)
-        item->gen_it = nullptr;
-    __content_row_forget(record);
-    if (record->folder)
-        cloud_content_sync_folder_destroy(record->folder);
-    if (record->content)
-        cloud_content_sync_content_destroy(record->content);
-    g_free(record->name);
-    g_free(record->local_path);
-    g_free(record->stream_url);
-    g_free(record->file_name);
-    g_free(record->path);
-    delete record;
-}
-
-Elm_Genlist_Item_Class *__item_class_create(const char *style, Elm_Gen_Item_Text_Get_Cb text_get,
-                                            Elm_Gen_Item_Content_Get_Cb content_get)
-{
-    Elm_Genlist_Item_Class *itc = elm_genlist_item_class_new();
-    itc->item_style = style;
-    itc->func.text_get = text_get;
-    itc->func.content_get = content_get;
-    itc->func.state_get = nullptr;
-    itc->func.del = __gl_del;
-    return itc;
+    return __is_part(part, "elm.swallow.progressbar") ? __progress_create(obj, record) : nullptr;
 }
 
 void __item_classes_create(UploadViewData *vd)
@@ -247,72 +172,41 @@ Evas_Object *__genlist_create(UploadViewData *vd)
     return genlist;
 }
 
-Elm_Object_Item *__row_append(UploadViewData *vd, Elm_Genlist_Item_Class *itc, ItemData *record, Evas_Smart_Cb cb)
+void __upload_row_append(UploadViewData *vd, UploadItem *item, const char *name, int type, Evas_Smart_Cb tapped)
 {
-    record->gen_it = elm_genlist_item_append(vd->genlist, itc, record, nullptr, ELM_GENLIST_ITEM_NONE, cb, record);
-    return record->gen_it;
+    auto *record = new ItemData;
+    record->name = name;
+    record->type = type;
+    record->item.reset(_velora_upload_item_ref(item));
+    Elm_Genlist_Item_Class *const classes[] = {nullptr, vd->itc_uploading, vd->itc_file, vd->itc_fail};
+    __row_append(vd, classes[type], record, tapped);
+    __row_tappable_set(record->gen_it, type == ITEM_TYPE_FAILED || vd->is_select_mode);
 }
 
-void __velora_uploading_item_selected(void *data, Evas_Object *, void *event_info)
+void __upload_row_restyle(UploadViewData *vd, Elm_Object_Item *row, int type)
 {
-    auto *record = static_cast<ItemData *>(data);
-    UploadViewData *vd = s_vd;
-    if (!record || !vd) {
-        VELORA_LOGE("data is NULL");
-        return;
-    }
-    VELORA_LOGI("select item style is [%d]", record->type);
-    auto *row = static_cast<Elm_Object_Item *>(event_info);
-    if (record->type == ITEM_TYPE_UPLOADING && vd->is_select_mode)
-        __selection_row_tapped(vd, record, row);
-    if (record->type != ITEM_TYPE_FAILED)
-        return;
-    if (row) {
-        elm_genlist_item_selected_set(row, EINA_FALSE);
-        record->gen_it = row;
-    }
-    if (!vd->is_uploading)
-        __retry_popup_show(record);
+    ItemData *record = __row_record(row);
+    record->type = type;
+    Elm_Genlist_Item_Class *const classes[] = {nullptr, vd->itc_uploading, vd->itc_file, vd->itc_fail};
+    elm_genlist_item_item_class_update(row, classes[type]);
+    __row_tappable_set(row, type == ITEM_TYPE_FAILED || (vd->is_select_mode && type == ITEM_TYPE_UPLOADING));
+    elm_genlist_item_update(row);
 }
 
-void __upload_row_append(UploadViewData *vd, UploadItem *item, int index)
+// What is on screen stays there when it can: a cancel button that is replaced while a finger is on it is never clicked.
+void __upload_row_progress(const UploadItem *item)
 {
-    auto *record = new ItemData{
-        .vd = vd, .name = g_strdup(__last_segment(item->server_path)), .index = index, .type = ITEM_TYPE_UPLOADING};
-    if (item->state == UPLOAD_STATE_FAILED) {
-        record->type = ITEM_TYPE_FAILED;
-        record->path = g_strdup(item->path);
-        item->gen_it = __row_append(vd, vd->itc_fail, record, __velora_uploading_item_selected);
+    if (!item->gen_it) {
+        VELORA_LOGI("upload_item->gen_it is NULL");
         return;
     }
-    item->gen_it = __row_append(vd, vd->itc_uploading, record, __velora_uploading_item_selected);
-    __row_tappable_set(item->gen_it, vd->is_select_mode);
-}
-
-void __result_rows_append(UploadViewData *vd, bool is_reentry)
-{
-    AppData *ad = vd->ad;
-    const bool is_success = g_strcmp0(ad->display_type, "success") == 0;
-    const bool is_failure = g_strcmp0(ad->display_type, "fail") == 0;
-    __state_show(vd, is_failure && ad->result_path_count == 0 ? VIEW_STATE_FULL : VIEW_STATE_NONE);
-    GList *entry = ad->upload_list;
-    for (int i = 0; i < ad->result_path_count; i++, entry = entry->next) {
-        if (!entry) {
-            VELORA_LOGE("upload_item is NULL");
-            return;
-        }
-        auto *item = static_cast<UploadItem *>(entry->data);
-        if (!is_success && !is_failure)
-            continue;
-        if (is_reentry && item->state == UPLOAD_STATE_CANCELED)
-            continue;
-        auto *record = new ItemData{.vd = vd,
-                                    .name = g_strdup(__last_segment(ad->result_paths[i])),
-                                    .index = i,
-                                    .type = is_success ? ITEM_TYPE_UPLOADED : ITEM_TYPE_FAILED,
-                                    .path = g_strdup(ad->result_paths[i])};
-        item->gen_it = __row_append(vd, is_success ? vd->itc_file : vd->itc_fail, record,
-                                    is_success ? nullptr : __velora_uploading_item_selected);
-        __row_tappable_set(item->gen_it, !is_success);
+    const int state = item->state;
+    Evas_Object *bar = elm_object_item_part_content_get(item->gen_it, "elm.swallow.progressbar");
+    if (bar && state == UPLOAD_STATE_UPLOADING && g_strcmp0(elm_object_style_get(bar), "list_progress") == 0) {
+        elm_progressbar_value_set(bar, item->progress / 100.0);
+        return;
     }
+    elm_genlist_item_fields_update(item->gen_it, "elm.swallow.progressbar", ELM_GENLIST_ITEM_FIELD_CONTENT);
+    if (state != UPLOAD_STATE_WAITING && state != UPLOAD_STATE_UPLOADING)
+        elm_genlist_item_fields_update(item->gen_it, "elm.icon.2", ELM_GENLIST_ITEM_FIELD_CONTENT);
 }

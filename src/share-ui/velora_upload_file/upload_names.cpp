@@ -1,9 +1,8 @@
-// Names of files, and the destination that takes no name which the folder already has.
-#include "velora_upload_file/upload_internal.h"
+#include "velora_upload_file/upload_names.h"
+#include "velora_common/velora_log.h"
 #include <Ecore_File.h>
 #include <cstdlib>
 #include <cstring>
-#include <string>
 
 // The last dot of the name's last component, or null.
 static const char *__find_last_dot(const char *name)
@@ -91,36 +90,31 @@ static bool __check_same_file_cb(cloud_content_sync_content_h content, int error
     return true;
 }
 
-TakenNames::TakenNames(UploadViewData *view) : vd(view)
+TakenNames::TakenNames(cloud_content_sync_folder_h folder)
 {
-    vd->taken_names.emplace();
-    if (vd->folder)
-        cloud_content_sync_folder_foreach_content_from_db(nullptr, vd->folder, __check_same_file_cb, &*vd->taken_names);
+    if (folder)
+        cloud_content_sync_folder_foreach_content_from_db(nullptr, folder, __check_same_file_cb, &names);
 }
 
-TakenNames::~TakenNames()
+char *__get_server_path(const TakenNames &taken, const char *folder_path, const char *local_path)
 {
-    vd->taken_names.reset();
+    char *name = g_strdup(ecore_file_file_get(local_path));
+    while (taken.contains(name)) {
+        char *base = __get_file_base_name(name);
+        char *ext = __get_file_ext_name(name);
+        char *next = __check_file_name_postfix(base ? base : name, base ? ext : nullptr);
+        g_free(base);
+        g_free(ext);
+        g_free(name);
+        name = next;
+    }
+    const char *folder = folder_path ? folder_path : "/";
+    char *destination = g_strdup_printf(std::strcmp(folder, "/") == 0 ? "%s%s" : "%s/%s", folder, name);
+    g_free(name);
+    return destination;
 }
 
 char *__get_upload_server_path(UploadViewData *vd, const char *local_path)
 {
-    std::optional<TakenNames> once;
-    if (!vd->taken_names)
-        once.emplace(vd);
-    vd->new_name = g_strdup(ecore_file_file_get(local_path));
-    while (vd->taken_names->contains(vd->new_name)) {
-        char *base = __get_file_base_name(vd->new_name);
-        char *ext = __get_file_ext_name(vd->new_name);
-        char *next = __check_file_name_postfix(base ? base : vd->new_name, base ? ext : nullptr);
-        g_free(base);
-        g_free(ext);
-        g_free(vd->new_name);
-        vd->new_name = next;
-    }
-    const char *folder = vd->ad->folder_path ? vd->ad->folder_path : "/";
-    char *destination = g_strdup_printf(std::strcmp(folder, "/") == 0 ? "%s%s" : "%s/%s", folder, vd->new_name);
-    g_free(vd->new_name);
-    vd->new_name = nullptr;
-    return destination;
+    return __get_server_path(TakenNames(vd->folder), vd->ad->folder_path, local_path);
 }

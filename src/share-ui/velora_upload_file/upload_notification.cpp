@@ -1,11 +1,15 @@
 // The ongoing notification of a running queue, and the result that stays behind. No state of its own: any thread.
+#include "velora_upload_file/upload_notification.h"
 #include "app/app_control.h"
 #include "notification/notification.h"
 #include "runtime_info/runtime_info.h"
+#include "velora_common/velora_app_data.h"
+#include "velora_common/velora_log.h"
 #include "velora_common/velora_paths.h"
-#include "velora_upload_file/upload_internal.h"
+#include <cstdio>
 #include <ctime>
 #include <memory>
+#include <vector>
 
 struct NotificationFree {
     void operator()(notification_h noti) const
@@ -159,6 +163,13 @@ int __progress_noti_set_content(int noti_id, const char *text)
     return 0;
 }
 
+int __progress_noti_set_count(int noti_id, int finished, int remaining)
+{
+    char text[32];
+    std::snprintf(text, sizeof text, "%d / %d", finished, remaining);
+    return __progress_noti_set_content(noti_id, text);
+}
+
 int __progress_noti_set_progress(int noti_id, double progress)
 {
     const Notification noti = __noti_load(noti_id);
@@ -196,7 +207,8 @@ char *__get_format_time()
     return g_strdup(text);
 }
 
-int __box_noti_new(const char *title, const char *text, const char *display_type, char **paths, int count)
+int __box_noti_new(const char *title, const char *text, const char *display_type, char **paths, int count,
+                   const char *folder)
 {
     notification_delete_all_by_type(VELORA_SHARE_PACKAGE, NOTIFICATION_TYPE_NOTI);
     const Notification noti = __noti_create({}, title, text);
@@ -210,10 +222,8 @@ int __box_noti_new(const char *title, const char *text, const char *display_type
     const AppControl request = __request_create(APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD_RESULT);
     if (!request)
         return -1;
-    // The folder stays as it is while a worker, whose result this is, runs.
-    UploadViewData *vd = s_vd;
-    if (vd && vd->ad->folder_path)
-        app_control_add_extra_data(request.get(), RESULT_FOLDER_KEY, vd->ad->folder_path);
+    if (folder)
+        app_control_add_extra_data(request.get(), RESULT_FOLDER_KEY, folder);
     std::vector<const char *> existing; // a full storage counts files that have no path in the list
     for (int i = 0; paths && i < count && paths[i]; i++)
         existing.push_back(paths[i]);

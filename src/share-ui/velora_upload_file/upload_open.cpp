@@ -1,18 +1,22 @@
-// Opening a file of the open cloud folder: pictures from the client's cache, video and sound by a streaming address,
-// everything else through the scratch folder in whichever application views it.
+#include "velora_upload_file/upload_open.h"
 #include "mime_type/mime_type.h"
 #include "notification/notification.h"
+#include "velora_common/velora_current_popup.h"
+#include "velora_common/velora_handles.h"
 #include "velora_common/velora_local_data.h"
+#include "velora_common/velora_log.h"
 #include "velora_common/velora_network.h"
 #include "velora_common/velora_paths.h"
+#include "velora_common/velora_pipe.h"
 #include "velora_common/velora_popup.h"
-#include "velora_common/velora_thread.h"
-#include "velora_upload_file/upload_internal.h"
+#include "velora_upload_file/upload_text.h"
+#include "velora_upload_file/upload_types.h"
 #include <Ecore_File.h>
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
 
+static const char s_topic[] = "opening";
 static const char s_video_player[] = "com.orvant.video-player-lite";
 static const char s_sound_player[] = "com.orvant.sound-player-lite";
 
@@ -23,12 +27,12 @@ static std::string __scratch_folder()
 
 // A name that came from the service as a file of the scratch folder: empty when it could mean any other place, or
 // cannot be written at all.
-static std::string __scratch_path(const char *name)
+static std::string __scratch_path(const std::string &name)
 {
-    if (!name || !*name || std::strlen(name) > 255 || std::strcmp(name, ".") == 0 || std::strcmp(name, "..") == 0)
+    if (name.empty() || name.size() > 255 || name == "." || name == "..")
         return {};
-    for (const char *c = name; *c; c++)
-        if (*c == '/' || static_cast<unsigned char>(*c) < 0x20 || *c == 0x7f)
+    for (const char c : name)
+        if (c == '/' || static_cast<unsigned char>(c) < 0x20 || c == 0x7f)
             return {};
     return __scratch_folder() + "/" + name;
 }
@@ -41,7 +45,11 @@ static void __velora_popup_indicator_popup(const char *text)
 
 static void result_cb(app_control_h, app_control_h, app_control_result_e result, void *)
 {
-    VELORA_LOGE("===================== result is [%d]", result);
+    // A viewer's usual answer is no error.
+    if (result == APP_CONTROL_RESULT_SUCCEEDED)
+        VELORA_LOGI("===================== result is [%d]", result);
+    else
+        VELORA_LOGE("===================== result is [%d]", result);
 }
 
 static void __launch_player(app_control_h request, const char *player)
@@ -72,19 +80,19 @@ static int __launch_apps_for_velora(ItemData *record)
     }
     int outcome = 0;
     if (record->file_type == FILE_TYPE_VIDEO) {
-        app_control_set_uri(request, record->stream_url);
+        app_control_set_uri(request, record->stream_url.c_str());
         __launch_player(request, s_video_player);
     } else if (record->file_type == FILE_TYPE_SOUND) {
         app_control_add_extra_data(request, "request_type", "files");
-        app_control_add_extra_data(request, "files", record->stream_url);
+        app_control_add_extra_data(request, "files", record->stream_url.c_str());
         app_control_add_extra_data(request, "filecount", "1");
         __launch_player(request, s_sound_player);
     } else {
-        VELORA_LOGE("uri is [%s]", record->local_path);
-        if (!record->local_path || !ecore_file_exists(record->local_path)) {
+        VELORA_LOGE("uri is [%s]", record->local_path.c_str());
+        if (record->local_path.empty() || !ecore_file_exists(record->local_path.c_str())) {
             outcome = 2;
         } else {
-            app_control_set_uri(request, record->local_path);
+            app_control_set_uri(request, record->local_path.c_str());
             app_control_set_operation(request, APP_CONTROL_OPERATION_VIEW);
             if (app_control_send_launch_request(request, result_cb, nullptr) != 0)
                 __velora_popup_indicator_popup(__text("No application can perform this action!"));
@@ -132,17 +140,17 @@ static void __cloud_content_sync_launching_download_result_cb(int state, const c
     __content_result_send(CONTENT_RESULT_DOWNLOAD, state, path, third, error, row);
 }
 
-static void __take_string(char **field, const char *text)
-{
-    g_free(*field);
-    *field = g_strdup(text);
-}
-
-// A request that came to nothing: the person is told why, and ends the wait with Cancel.
-static void __content_failed(int error)
+static void __say_failed(int error)
 {
     __velora_popup_indicator_popup(error == CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE ? __text("IDS_VELORA_BODY_NOT_SAVED")
                                                                                 : __failure_text(error));
+}
+
+// The row's request has ended, or does not matter any more: no wait for it is left.
+static void __request_over(UploadViewData *vd, ItemData *record)
+{
+    record->request_id = 0;
+    _velora_popup_take_away(vd->ad, {record, s_topic});
 }
 
 void __content_result_handle(UploadViewData *vd, const ContentResultMessage &message)
@@ -153,32 +161,34 @@ void __content_result_handle(UploadViewData *vd, const ContentResultMessage &mes
     // A row that is gone, or whose request was cancelled, has nothing to be opened.
     if (record && record->request_id != 0) {
         if (message.state == CLOUD_CONTENT_SYNC_STATE_DONE && message.error == 0) {
-            record->request_id = 0;
-            _velora_app_popup_delete(vd->ad);
+            __request_over(vd, record);
             if (message.kind == CONTENT_RESULT_STREAMING_URL)
-                __take_string(&record->stream_url, url);
+                record->stream_url = url ? url : "";
             else if (message.kind == CONTENT_RESULT_CACHED_FILE)
-                __take_string(&record->local_path, path);
+                record->local_path = path ? path : "";
             else
-                __take_string(&record->local_path, __scratch_path(record->file_name).c_str());
+                record->local_path = __scratch_path(record->file_name);
             __launch_apps_for_velora(record);
         } else if (message.state == CLOUD_CONTENT_SYNC_STATE_FAILED) {
-            __content_failed(message.error);
+            __request_over(vd, record); // a wait for nothing would say less than the words that follow
+            __say_failed(message.error);
         }
     }
     std::free(path);
     std::free(url);
 }
 
-void __content_row_forget(ItemData *record)
+static void __request_cancel(UploadViewData *vd, ItemData *record)
 {
-    if (!record->handle)
-        return;
-    UploadViewData *vd = s_vd;
-    if (record->request_id && vd && vd->ad->sync_handle) {
-        cloud_content_sync_cancel(vd->ad->sync_handle, record->request_id);
-        _velora_app_popup_delete(vd->ad);
-    }
+    if (record->request_id && vd->client)
+        cloud_content_sync_cancel(vd->client.get(), record->request_id);
+    __request_over(vd, record);
+}
+
+static void __content_row_forget(ItemData *record)
+{
+    if (s_vd)
+        __request_cancel(s_vd, record);
     _velora_common_handle_remove(record->handle);
     record->handle = 0;
 }
@@ -186,21 +196,25 @@ void __content_row_forget(ItemData *record)
 static void __content_sync_popup_cb(void *data, Evas_Object *, void *)
 {
     auto *record = static_cast<ItemData *>(data);
-    UploadViewData *vd = s_vd;
-    if (!record || !vd) {
+    if (!record || !s_vd) {
         VELORA_LOGE("data is NULL");
         return;
     }
-    cloud_content_sync_cancel(vd->ad->sync_handle, record->request_id);
-    record->request_id = 0;
-    _velora_app_popup_delete(vd->ad);
+    __request_cancel(s_vd, record);
+}
+
+// Another popup stands where the wait stood: what comes would come as a surprise.
+static void __wait_replaced_cb(void *data)
+{
+    __content_sync_popup_cb(data, nullptr, nullptr);
 }
 
 static void __processing_popup_show(UploadViewData *vd, ItemData *record)
 {
-    _velora_app_popup_delete(vd->ad);
-    vd->ad->popup = _velora_common_create_processing_popup_with_cancel(
-        vd->ad->win_main, "IDS_CLOUD_BODY_PROCESSING_ING", __content_sync_popup_cb, record);
+    _velora_popup_show(vd->ad, {record, s_topic},
+                       _velora_common_create_processing_popup_with_cancel(
+                           vd->ad->win_main, "IDS_CLOUD_BODY_PROCESSING_ING", __content_sync_popup_cb, record),
+                       __wait_replaced_cb, record);
 }
 
 static bool __is_online(UploadViewData *vd)
@@ -208,30 +222,30 @@ static bool __is_online(UploadViewData *vd)
     if (_velora_common_check_network_without_popup(vd->ad))
         return true;
     VELORA_LOGE("network error");
-    _velora_app_popup_delete(vd->ad);
-    vd->ad->popup = _velora_common_create_one_text_popup_with_timer(vd->ad->win_main, vd->ad);
+    _velora_popup_show(vd->ad, {vd, s_topic},
+                       _velora_common_create_one_text_popup_with_timer(vd->ad->win_main, vd->ad));
     return false;
 }
 
 static void *__row_handle(ItemData *record)
 {
+    __row_forget_cb_set(__content_row_forget);
     if (!record->handle)
         record->handle = _velora_common_handle_add(record);
     return reinterpret_cast<void *>(static_cast<uintptr_t>(record->handle));
 }
 
-static void __request_refused(ItemData *record, int err)
+static void __request_refused(UploadViewData *vd, ItemData *record, int err)
 {
     VELORA_LOGE("err is [%d]", err);
-    record->request_id = 0;
-    __content_failed(err);
+    __request_over(vd, record);
+    __say_failed(err);
 }
 
 // What is here already is opened at once; what is not is asked for behind a wait.
 static void __open_or_request(UploadViewData *vd, ItemData *record, bool is_here, int (*request)(ItemData *))
 {
     if (is_here) {
-        _velora_app_popup_delete(vd->ad);
         __launch_apps_for_velora(record);
         return;
     }
@@ -239,7 +253,7 @@ static void __open_or_request(UploadViewData *vd, ItemData *record, bool is_here
         return;
     __processing_popup_show(vd, record);
     if (const int err = request(record); err != 0)
-        __request_refused(record, err);
+        __request_refused(vd, record, err);
 }
 
 static int __picture_request(ItemData *record)
@@ -280,14 +294,14 @@ static bool __has_viewer(const char *mime)
 }
 
 // False when no installed application views files of this name's MIME type.
-static bool __launch_get_match(const char *name)
+static bool __launch_get_match(const std::string &name)
 {
-    if (!name) {
+    if (name.empty()) {
         VELORA_LOGE("name is NULL");
         return false;
     }
     char *ext = nullptr;
-    if (_velora_common_file_attr_get_file_ext(name, &ext) != 0)
+    if (_velora_common_file_attr_get_file_ext(name.c_str(), &ext) != 0)
         return false;
     char *mime = nullptr;
     const bool is_viewable = mime_type_get_mime_type(ext, &mime) == 0 && mime && __has_viewer(mime);
@@ -316,7 +330,7 @@ static void __open_document(UploadViewData *vd, ItemData *record)
         return;
     }
     if (ecore_file_is_dir(__scratch_folder().c_str()) && __is_copy_of(copy, record)) {
-        __take_string(&record->local_path, copy.c_str());
+        record->local_path = copy;
         __launch_apps_for_velora(record);
         return;
     }
@@ -325,10 +339,8 @@ static void __open_document(UploadViewData *vd, ItemData *record)
     if (const int err = cloud_content_sync_content_download(record->content, copy.c_str(), &record->request_id,
                                                             __cloud_content_sync_launching_download_result_cb,
                                                             __row_handle(record));
-        err != 0) {
-        _velora_app_popup_delete(vd->ad);
-        __request_refused(record, err);
-    }
+        err != 0)
+        __request_refused(vd, record, err);
 }
 
 void __select_item_to_launch_app(void *data, Evas_Object *, void *event_info)
@@ -345,11 +357,11 @@ void __select_item_to_launch_app(void *data, Evas_Object *, void *event_info)
         return;
     switch (record->file_type) {
     case FILE_TYPE_IMAGE: // the cache may have let it go
-        __open_or_request(vd, record, record->local_path && ecore_file_exists(record->local_path), __picture_request);
+        __open_or_request(vd, record, ecore_file_exists(record->local_path.c_str()), __picture_request);
         break;
     case FILE_TYPE_VIDEO:
     case FILE_TYPE_SOUND:
-        __open_or_request(vd, record, record->stream_url, __stream_request);
+        __open_or_request(vd, record, !record->stream_url.empty(), __stream_request);
         break;
     default:
         __open_document(vd, record);

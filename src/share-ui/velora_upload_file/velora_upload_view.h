@@ -6,15 +6,11 @@
 // there.
 void _velora_upload_view_create(AppData *ad);
 
-// Fills the list again, from the queue and the open folder.
+// Fills the list again, from the queue or the open folder.
 void _velora_upload_view_update();
 
-// Call before AppData's list is replaced by a result's: the files in it that no folder was chosen for yet wait in the
-// view, which offers them again when it is free.
+// The first refresh of the folder tree has ended.
+void _velora_upload_view_meta_done();
+
+// Call before AppData's list is replaced by a result's: the files in it wait for their folder, whatever comes first.
 void _velora_upload_view_keep_waiting(AppData *ad);
-
-// Takes the view down, if there is one, and stops its uploads. The widgets must still be there.
-void _velora_upload_view_end();
-
-// Stops the uploads of a view whose widgets may be gone already, when the process ends.
-void _velora_upload_view_abandon();

@@ -1,7 +1,7 @@
 // Pipes between threads and the main loop.
 #include "driver.h"
 #include "temp_home.h"
-#include "velora_common/velora_thread.h"
+#include "velora_common/velora_pipe.h"
 #include <gtest/gtest.h>
 
 #include <atomic>

@@ -1,0 +1,23 @@
+#pragma once
+// The ongoing notification of a running queue, and the result that stays behind. No state of its own: any thread. 0, or
+// -1 on failure (logged).
+
+// Posts the ongoing notification in the place of the last result; *noti_id is its id, and as it was on failure.
+int __progress_noti_new(const char *text, int *noti_id);
+int __progress_noti_set_content(int noti_id, const char *text);
+// "finished / remaining" as the content.
+int __progress_noti_set_count(int noti_id, int finished, int remaining);
+// progress: 0.0 to 1.0.
+int __progress_noti_set_progress(int noti_id, double progress);
+// 0 also when it is gone already; -1 for an id that is none.
+int __progress_noti_delete(int noti_id);
+
+// Posts a result. display_type: "success" or "fail"; paths: local ones, up to `count` and up to the first null (a full
+// storage counts files that are not listed); folder: their destination, for another try, or null.
+int __box_noti_new(const char *title, const char *text, const char *display_type, char **paths, int count,
+                   const char *folder = nullptr);
+// Extra data of a result's launch request, beside those that it must have: the path of the destination folder.
+inline constexpr char RESULT_FOLDER_KEY[] = "folder_path";
+
+// The local time by the device's clock setting; the caller's, g_free.
+char *__get_format_time();

@@ -1,0 +1,76 @@
+#include "velora_upload_file/upload_progress.h"
+#include "velora_upload_file/upload_page.h"
+#include "velora_upload_file/upload_row.h"
+#include "velora_upload_file/upload_text.h"
+#include "velora_upload_file/upload_waiting.h"
+#include <algorithm>
+#include <cstdio>
+#include <cstdlib>
+
+// The words, markup; of a single file its name, which a number could not tell.
+static std::string __waiting_words()
+{
+    const int count = __waiting_count();
+    if (count == 0)
+        return {};
+    char text[64];
+    std::snprintf(text, sizeof text, __text_of("%d files", count), count);
+    std::string words = text;
+    if (count == 1) {
+        char *name = __one_line_markup(__last_segment(__waiting_first()));
+        words = name;
+        std::free(name);
+    }
+    return words + " · " + __short_size(__waiting_bytes());
+}
+
+static void __show_run(UploadViewData *vd)
+{
+    const UploadRun &run = *vd->run;
+    const RunReport &report = run.report;
+    gint64 sent = report.bytes_ended;
+    const int current = report.current;
+    if (current < run.total())
+        if (const RunFile &file = run.files[static_cast<size_t>(current)]; file.item->state == UPLOAD_STATE_UPLOADING)
+            sent += file.size / 100 * file.item->progress;
+    const gint64 all = std::max<gint64>(run.bytes - report.bytes_canceled, 0);
+    sent = std::clamp<gint64>(sent, 0, all);
+    const int remaining = std::max(run.remaining(), 0);
+    const int ended = std::min(report.success + report.fail, remaining);
+    char words[128];
+    std::snprintf(words, sizeof words, __text("%d of %d · %s of %s"), ended, remaining, __short_size(sent).c_str(),
+                  __short_size(all).c_str());
+    const double done = all > 0 ? static_cast<double>(sent) / static_cast<double>(all) : 0;
+    __info_set(vd, words, done);
+}
+
+static void __show_end(UploadViewData *vd)
+{
+    int uploaded = 0, failed = 0;
+    for (Elm_Object_Item *row = elm_genlist_first_item_get(vd->genlist); row; row = elm_genlist_item_next_get(row)) {
+        uploaded += __row_record(row)->type == ITEM_TYPE_UPLOADED;
+        failed += __row_record(row)->type == ITEM_TYPE_FAILED;
+    }
+    char words[160] = "";
+    if (failed > 0)
+        std::snprintf(words, sizeof words, __text_of("%d files not uploaded · Tap one to try again", failed), failed);
+    else if (uploaded > 0)
+        std::snprintf(words, sizeof words, __text_of("%d files uploaded", uploaded), uploaded);
+    __info_set(vd, words);
+}
+
+void __progress_line_update(UploadViewData *vd)
+{
+    switch (vd->phase) {
+    case PHASE_BROWSING:
+        __info_set(vd, __waiting_words().c_str());
+        break;
+    case PHASE_UPLOADING:
+        if (vd->run)
+            __show_run(vd);
+        break;
+    case PHASE_ENDED:
+    case PHASE_RESULT:
+        __show_end(vd);
+    }
+}

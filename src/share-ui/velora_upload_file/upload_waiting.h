@@ -1,0 +1,15 @@
+#pragma once
+// Files that were shared and wait until a folder is chosen for them, whatever the view shows meanwhile. Main loop only.
+#include "velora_common/velora_app_data.h"
+#include "velora_common/velora_upload_item.h"
+#include <vector>
+
+// Takes what AppData's list holds; the result is how many files came.
+int __waiting_take(AppData *ad);
+int __waiting_count();
+// Their size, as far as they can be read; bytes.
+gint64 __waiting_bytes();
+// The first one's local path, or null.
+const char *__waiting_first();
+// Hands all of them out: they wait no longer.
+std::vector<UploadItemHold> __waiting_give();
