@@ -196,7 +196,8 @@ class Device:
         self.tool("platform/account/device-account", "add", "--package", APP, "--domain", "Velora", "--user", EMAIL)
 
     def token_set(self, token):
-        self.tool("platform/cloud_content_sync/cloud-account", "set", "Velora", input=token.encode() + b"\n")
+        self.tool("platform/cloud_content_sync/cloud-account", "set", "Velora", "--email", EMAIL,
+                  input=token.encode() + b"\n")
 
     def setting(self, key, value):
         self.tool("platform/vconf/settings-store", "set", key, value)

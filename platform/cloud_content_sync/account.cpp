@@ -1,6 +1,6 @@
 #include "cloud_content_sync/account.h"
+#include "cloud_content_sync/cache.h"
 #include "cloud_content_sync/names.h"
-#include "cloud_content_sync/service.h"
 #include <sys/stat.h>
 #include <unordered_set>
 
@@ -18,13 +18,55 @@ CREATE INDEX IF NOT EXISTS content_order ON content(parent, sort, name);
 static constexpr char INSERT_CONTENT[] =
     "INSERT OR REPLACE INTO content(parent, name, sort, size, mtime, etag) VALUES(?, ?, ?, ?, ?, ?)";
 
-Account::Account(std::string service_name) : service(std::move(service_name)) {}
+Account::Account(Service description) : service(std::move(description)) {}
 
 bool Account::open()
 {
-    const std::string path = cloud_data_dir() + "/" + service + ".db";
+    const std::string path = cloud_data_dir() + "/" + service.name + ".db";
     std::scoped_lock lock(reading, writing);
     return writer.open(path, SCHEMA) && chmod(path.c_str(), 0600) == 0 && reader.open(path, nullptr);
+}
+
+std::string Account::identity() const
+{
+    const auto credentials = credentials_load(service.name);
+    return credentials ? account_identity(service, *credentials) : "";
+}
+
+bool Account::change(const std::function<bool()> &work)
+{
+    std::scoped_lock lock(writing);
+    if (!writer.run("BEGIN IMMEDIATE"))
+        return false;
+    if (work() && writer.run("COMMIT"))
+        return true;
+    writer.run("ROLLBACK");
+    return false;
+}
+
+// Credentials change under the database's lock alone, so whoever holds it knows whose rows it writes, whatever other
+// processes do.
+bool Account::while_signed_in(const std::string &who, const std::function<bool()> &work)
+{
+    return change([&] { return identity() == who && work(); });
+}
+
+bool Account::sign_in(const Credentials *credentials)
+{
+    const std::string next = credentials ? account_identity(service, *credentials) : "";
+    const std::string whose = complete_for();
+    const bool is_same = credentials && identity() == next && (whose.empty() || whose == next);
+    // Once before, so that a crash in the middle leaves no rows to somebody else.
+    if (!is_same && !change([&] { return clear(); }))
+        return false;
+    return change([&] {
+        if (!is_same) {
+            if (!clear())
+                return false;
+            cache_clear(service.name);
+        }
+        return credentials_store(service.name, credentials);
+    });
 }
 
 bool Account::folder_exists(const std::string &path)
@@ -94,22 +136,17 @@ static bool write_tree(Db &db, const std::vector<FolderRow> &folders, const std:
 }
 
 bool Account::replace(const std::vector<FolderRow> &folders, const std::vector<ContentRow> &contents,
-                      const std::vector<ContentRow> &later, const std::string &identity)
+                      const std::vector<ContentRow> &later, const std::string &who)
 {
-    std::scoped_lock lock(writing);
-    if (!writer.run("BEGIN IMMEDIATE"))
-        return false;
-    if (write_tree(writer, folders, contents, later, identity) && writer.run("COMMIT"))
-        return true;
-    writer.run("ROLLBACK");
-    return false;
+    return while_signed_in(who, [&] { return write_tree(writer, folders, contents, later, who); });
 }
 
-bool Account::insert(const ContentRow &content)
+bool Account::insert(const ContentRow &content, const std::string &who)
 {
-    std::scoped_lock lock(writing);
-    Stmt stmt(writer, INSERT_CONTENT);
-    return insert_content(stmt, content);
+    return while_signed_in(who, [&] {
+        Stmt stmt(writer, INSERT_CONTENT);
+        return insert_content(stmt, content);
+    });
 }
 
 std::optional<ContentRow> Account::content_at(const std::string &parent, const std::string &name)
@@ -121,12 +158,13 @@ std::optional<ContentRow> Account::content_at(const std::string &parent, const s
     return ContentRow{parent, name, stmt.integer(0), stmt.integer(1), stmt.text(2)};
 }
 
-bool Account::update(const ContentRow &row)
+bool Account::update(const ContentRow &row, const std::string &who)
 {
-    std::scoped_lock lock(writing);
-    Stmt stmt(writer, "UPDATE content SET size = ?, mtime = ?, etag = ? WHERE parent = ? AND name = ?");
-    stmt.bind(1, row.size).bind(2, row.mtime).bind(3, row.etag).bind(4, row.parent).bind(5, row.name);
-    return stmt.done();
+    return while_signed_in(who, [&] {
+        Stmt stmt(writer, "UPDATE content SET size = ?, mtime = ?, etag = ? WHERE parent = ? AND name = ?");
+        stmt.bind(1, row.size).bind(2, row.mtime).bind(3, row.etag).bind(4, row.parent).bind(5, row.name);
+        return stmt.done();
+    });
 }
 
 std::string Account::complete_for()
@@ -136,11 +174,10 @@ std::string Account::complete_for()
     return stmt.row() ? stmt.text(0) : "";
 }
 
+// Within change().
 bool Account::clear()
 {
-    std::scoped_lock lock(writing);
-    return writer.run("BEGIN IMMEDIATE; DELETE FROM folder; DELETE FROM content;"
-                      "DELETE FROM setting WHERE key = 'complete_for'; COMMIT");
+    return writer.run("DELETE FROM folder; DELETE FROM content; DELETE FROM setting WHERE key = 'complete_for'");
 }
 
 bool Account::setting(const std::string &key, bool fallback)

@@ -1,6 +1,8 @@
 #pragma once
 // The metadata database of one service: the account's folder tree as the last refresh and later uploads left it.
 #include "base/base.h"
+#include "cloud_content_sync/service.h"
+#include <functional>
 #include <mutex>
 #include <optional>
 #include <string>
@@ -24,11 +26,20 @@ struct ContentRow {
 // Two connections: readers are not held up while a refresh is written. Every function may be called from any thread.
 class Account {
   public:
-    explicit Account(std::string service_name);
+    explicit Account(Service service);
     // Opens, and creates when it is missing, platform_data_dir()/cloud/SERVICE.db.
     bool open();
 
-    const std::string service;
+    const Service service;
+
+    // account_identity() of who is signed in; empty when nobody is.
+    std::string identity() const;
+    // Stores the credentials; null: nobody is signed in any more. What is kept of another account goes, but for its
+    // settings. False when they cannot be stored.
+    bool sign_in(const Credentials *credentials);
+    // Does `work` while nobody can sign in or out, in a transaction of the database that its result ends. False, and
+    // nothing done, when `who`, an identity, is not signed in.
+    bool while_signed_in(const std::string &who, const std::function<bool()> &work);
 
     bool folder_exists(const std::string &path);
     // In the order of sort_key().
@@ -36,23 +47,26 @@ class Account {
     std::vector<ContentRow> contents_of(const std::string &parent);
 
     // Puts what a refresh found in the place of everything that is there, in one transaction. `later` are files stored
-    // since the refresh began; those whose folder is gone are left out. The root is not a row of `folders`.
+    // since the refresh began; those whose folder is gone are left out. The root is not a row of `folders`. This and
+    // the other changes are for the account `who` and answer false when it is not signed in (any more).
     bool replace(const std::vector<FolderRow> &folders, const std::vector<ContentRow> &contents,
-                 const std::vector<ContentRow> &later, const std::string &identity);
-    bool insert(const ContentRow &content);
+                 const std::vector<ContentRow> &later, const std::string &who);
+    bool insert(const ContentRow &content, const std::string &who);
     std::optional<ContentRow> content_at(const std::string &parent, const std::string &name);
     // Changes the row of that parent and name; nothing when there is none.
-    bool update(const ContentRow &content);
+    bool update(const ContentRow &content, const std::string &who);
 
     // The account (account_identity()) whose whole tree the database holds; empty when there is none.
     std::string complete_for();
-    bool clear();
 
     // Stored for the service; `fallback` when nothing is stored.
     bool setting(const std::string &key, bool fallback);
     bool set_setting(const std::string &key, bool value);
 
   private:
+    bool change(const std::function<bool()> &work);
+    bool clear();
+
     std::mutex reading, writing;
     Db reader, writer;
 };

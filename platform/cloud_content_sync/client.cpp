@@ -141,12 +141,13 @@ void Client::report_progress(const UploadRequest &request, int percent)
     end_callback();
 }
 
-bool Client::report_done(const UploadRequest &request, const ContentRow &stored)
+bool Client::report_done(const UploadRequest &request, const ContentRow &stored, const std::string &who)
 {
     if (!begin_callback(request.id, true))
         return false;
-    account->insert(stored); // a failure costs nothing but the row until the next refresh
-    stored_meanwhile.push_back(stored);
+    // A failure costs nothing but the row until the next refresh.
+    if (account->insert(stored, who))
+        stored_meanwhile.push_back(stored);
     {
         std::scoped_lock lock(mutex);
         landed[request.id] = join(stored.parent, stored.name);

@@ -73,8 +73,9 @@ class Client : public std::enable_shared_from_this<Client> {
     bool begin_callback(int id, bool is_last);
     void end_callback();
     void report_progress(const UploadRequest &request, int percent);
-    // The request's last callback. False, and nothing done, when the request is not wanted any more.
-    bool report_done(const UploadRequest &request, const ContentRow &stored);
+    // The request's last callback; the file is of the account `who`. False, and nothing done, when the request is not
+    // wanted any more.
+    bool report_done(const UploadRequest &request, const ContentRow &stored, const std::string &who);
     void report_failed(const UploadRequest &request, int error);
     void report_refreshed(const RefreshRequest &request, int error);
     // What uploads have stored since the running refresh began.

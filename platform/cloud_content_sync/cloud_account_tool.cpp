@@ -10,10 +10,11 @@
 #include <vector>
 
 static constexpr char USAGE[] =
-    "usage: cloud-account set SERVICE [--user USER] | refresh SERVICE | list SERVICE PATH\n";
+    "usage: cloud-account set SERVICE [--email ADDRESS] [--user USER] | refresh SERVICE | list SERVICE PATH\n";
 static constexpr char HELP[] =
     "  set       store the credentials of SERVICE; the secret is one line on standard input:\n"
-    "            the password of --user USER, or without --user a bearer token\n"
+    "            the password of --user USER, or without --user a bearer token;\n"
+    "            what is kept on this device stays when the ADDRESS is the same\n"
     "  refresh   fetch the account's folder tree into the local database\n"
     "  list      print what the local database holds of the folder PATH; folders end in \"/\"\n"
     "A service is described by SERVICE.conf in $CLOUD_SERVICES_DIR, or else in\n"
@@ -82,14 +83,21 @@ static std::string escaped(const std::string &name)
     return shown;
 }
 
-static int set(const char *service, const char *user)
+// The options are pairs of a name and a value.
+static int set(const char *service, const std::vector<std::string> &options)
 {
+    const char *email = nullptr, *user = nullptr;
+    for (size_t i = 0; i + 1 < options.size(); i += 2) {
+        if (options[i] != "--email" && options[i] != "--user")
+            return bad_arguments();
+        (options[i] == "--email" ? email : user) = options[i + 1].c_str();
+    }
     std::string secret;
     if (!std::getline(std::cin, secret) || secret.empty()) {
         std::fputs("cloud-account: no secret on standard input\n", stderr);
         return 2;
     }
-    const int error = cloud_content_sync_credentials_set(service, user, secret.c_str());
+    const int error = cloud_content_sync_credentials_set(service, email, user, secret.c_str());
     return error ? failed(error) : 0;
 }
 
@@ -149,10 +157,8 @@ int main(int argc, char **argv)
         return bad_arguments();
     const std::string &command = args[0];
     const char *service = args[1].c_str();
-    if (command == "set" && args.size() == 2)
-        return set(service, nullptr);
-    if (command == "set" && args.size() == 4 && args[2] == "--user")
-        return set(service, args[3].c_str());
+    if (command == "set" && args.size() % 2 == 0)
+        return set(service, {args.begin() + 2, args.end()});
     if (!(command == "refresh" && args.size() == 2) && !(command == "list" && args.size() == 3))
         return bad_arguments();
     cloud_content_sync_h handle = nullptr;

@@ -46,7 +46,7 @@ int cloud_content_sync_create(const char *service_name, cloud_content_sync_h *ha
     auto service = cloud::service_find(service_name);
     if (!service)
         return CLOUD_CONTENT_SYNC_ERROR_NO_SERVICE;
-    auto account = std::make_shared<Account>(service_name);
+    auto account = std::make_shared<Account>(*service);
     if (!account->open())
         return CLOUD_CONTENT_SYNC_ERROR_DB_FAILED;
     auto client = std::make_shared<cloud::Client>(std::move(*service), std::move(account));
@@ -105,9 +105,8 @@ int cloud_content_sync_get_is_meta_complete(cloud_content_sync_h handle, bool *c
 {
     if (!handle || !complete)
         return INVALID;
-    const auto credentials = cloud::credentials_load(handle->client->service.name);
-    *complete = credentials && handle->client->account->complete_for() ==
-                                   cloud::account_identity(handle->client->service, *credentials);
+    const std::string who = handle->client->account->identity();
+    *complete = !who.empty() && handle->client->account->complete_for() == who;
     return DONE;
 }
 
@@ -115,7 +114,7 @@ static cloud_content_sync_folder_h folder_at(const std::shared_ptr<Account> &acc
                                              const std::weak_ptr<cloud::Client> &client, const std::string &path)
 {
     return new cloud_content_sync_folder_s{account, client, path,
-                                           path == "/" ? account->service : cloud::name_of(path)};
+                                           path == "/" ? account->service.name : cloud::name_of(path)};
 }
 
 int cloud_content_sync_folder_get_root(cloud_content_sync_h handle, cloud_content_sync_folder_h *folder)
@@ -345,27 +344,21 @@ static bool has_control_characters(const std::string &text)
     return std::any_of(text.begin(), text.end(), [](unsigned char c) { return c < 0x20 || c == 0x7F; });
 }
 
-int cloud_content_sync_credentials_set(const char *service_name, const char *user, const char *secret)
+int cloud_content_sync_credentials_set(const char *service_name, const char *email, const char *user,
+                                       const char *secret)
 {
     if (!service_name || !cloud::service_name_is_valid(service_name))
         return INVALID;
     const auto service = cloud::service_find(service_name);
     if (!service)
         return CLOUD_CONTENT_SYNC_ERROR_NO_SERVICE;
-    const cloud::Credentials credentials{user ? user : "", secret ? secret : ""};
+    const cloud::Credentials credentials{user ? user : "", secret ? secret : "", email ? email : ""};
     // A colon would end the user's name early (RFC 7617, 2).
     const bool bad_user = user && (!*user || has_control_characters(credentials.user) || std::strchr(user, ':'));
-    if (bad_user || (secret && !*secret) || has_control_characters(credentials.secret))
+    const bool bad_email = email && (!*email || has_control_characters(credentials.email));
+    if (bad_user || bad_email || (secret && !*secret) || has_control_characters(credentials.secret))
         return INVALID;
-    Account account(service_name);
-    if (!account.open())
-        return CLOUD_CONTENT_SYNC_ERROR_DB_FAILED;
-    // What was known of another account goes before the new credentials come.
-    const bool same_account = secret && account.complete_for() == cloud::account_identity(*service, credentials);
-    if (!same_account && !account.clear())
-        return CLOUD_CONTENT_SYNC_ERROR_DB_FAILED;
-    if (!same_account)
-        cloud::cache_clear(service_name);
-    return cloud::credentials_store(service_name, secret ? &credentials : nullptr) ? DONE
-                                                                                   : CLOUD_CONTENT_SYNC_ERROR_DB_FAILED;
+    Account account(*service);
+    return account.open() && account.sign_in(secret ? &credentials : nullptr) ? DONE
+                                                                              : CLOUD_CONTENT_SYNC_ERROR_DB_FAILED;
 }

@@ -151,9 +151,16 @@ int cloud_content_sync_cancel(cloud_content_sync_h handle, int req_id);
 // The credentials by which the device's user is known to a service, as a sign-in or a set-up tool leaves them.
 // user null: bearer token in secret (RFC 6750); otherwise HTTP Basic (RFC 7617). secret null: nobody is signed in any
 // more. They are kept in a file that its owner alone can read, and sent to the service's storage alone. Requests that
-// begin later use them. What the database holds of another account is removed. INVALID_PARAMETER for an empty user or
-// secret, for control characters, and for a user with a colon; NO_SERVICE; DB_FAILED when they cannot be stored.
-int cloud_content_sync_credentials_set(const char *service_name, const char *user, const char *secret);
+// begin later use them.
+//
+// email: the account's address, as the service gives it. The account is known by it, so a new token, or another way to
+// sign in, with the same address keeps the database and the caches; those of another account are removed. Null where it
+// is not known: the account is then known by the user, or else by the token, so every new token is another account.
+//
+// INVALID_PARAMETER for an empty email, user or secret, for control characters, and for a user with a colon;
+// NO_SERVICE; DB_FAILED when they cannot be stored.
+int cloud_content_sync_credentials_set(const char *service_name, const char *email, const char *user,
+                                       const char *secret);
 
 // The last, and only, callback of a request about one file. state: DONE, or FAILED with an error that is not 0. text:
 // the path or address that was asked for when it is DONE, else null; valid until the callback returns. status: the HTTP

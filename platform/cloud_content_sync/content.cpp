@@ -112,21 +112,21 @@ void ContentTask::look_into_cache()
 void ContentTask::keep_in_cache()
 {
     const std::string identity = account_identity(client.service, credentials);
-    // Somebody else may have signed in meanwhile, and what was kept of this account was removed.
-    const auto now = credentials_load(client.service.name);
-    if (!now || account_identity(client.service, *now) != identity)
-        return finish(CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED, "", fetch->status);
     // The file may have changed since the last refresh; the database learns of it, so that the next request finds the
     // new version in the cache.
     const bool has_changed = opaque_tag(fetch->etag) != opaque_tag(row.etag) || fetch->size != row.size;
     row.size = fetch->size;
     if (has_changed) {
         row.etag = fetch->etag;
-        client.account->update(row);
+        client.account->update(row, identity);
     }
     const std::string file = cache_file(Kept::CONTENT, client.service.name, identity, row);
-    if (!fetch->store(file))
-        return finish(CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE, "", fetch->status);
+    if (!client.account->while_signed_in(identity, [&] { return fetch->store(file); })) {
+        // Somebody else may have signed in meanwhile, and what was kept of this account was removed.
+        const bool is_same = client.account->identity() == identity;
+        return finish(is_same ? CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE : CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED, "",
+                      fetch->status);
+    }
     cache_trim(cache_folder(Kept::CONTENT, client.service.name), CACHE_BYTES, file);
     finish(0, file, fetch->status);
 }

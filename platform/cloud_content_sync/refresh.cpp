@@ -37,12 +37,11 @@ void Refresh::list_next()
     if (!running.empty())
         return;
     const std::string identity = account_identity(client.service, credentials);
+    if (client.account->replace(folders, contents, client.stored_meanwhile, identity))
+        return finish(CLOUD_CONTENT_SYNC_ERROR_NONE);
     // Somebody else may have signed in meanwhile: what was found is not theirs.
-    const auto now = credentials_load(client.service.name);
-    if (!now || account_identity(client.service, *now) != identity)
-        return finish(CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED);
-    const bool written = client.account->replace(folders, contents, client.stored_meanwhile, identity);
-    finish(written ? CLOUD_CONTENT_SYNC_ERROR_NONE : CLOUD_CONTENT_SYNC_ERROR_DB_FAILED);
+    finish(client.account->identity() == identity ? CLOUD_CONTENT_SYNC_ERROR_DB_FAILED
+                                                  : CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED);
 }
 
 void Refresh::list(const std::string &folder)

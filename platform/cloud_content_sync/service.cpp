@@ -86,7 +86,8 @@ std::optional<Credentials> credentials_load(const std::string &service_name)
     g_autoptr(GKeyFile) file = g_key_file_new();
     if (!g_key_file_load_from_file(file, credentials_file(service_name).c_str(), G_KEY_FILE_NONE, nullptr))
         return {};
-    Credentials credentials{string_of(file, "Credentials", "User"), string_of(file, "Credentials", "Secret")};
+    Credentials credentials{string_of(file, "Credentials", "User"), string_of(file, "Credentials", "Secret"),
+                            string_of(file, "Credentials", "Email")};
     if (credentials.secret.empty())
         return {};
     return credentials;
@@ -101,6 +102,8 @@ bool credentials_store(const std::string &service_name, const Credentials *crede
     if (!credentials->user.empty())
         g_key_file_set_string(file, "Credentials", "User", credentials->user.c_str());
     g_key_file_set_string(file, "Credentials", "Secret", credentials->secret.c_str());
+    if (!credentials->email.empty())
+        g_key_file_set_string(file, "Credentials", "Email", credentials->email.c_str());
     gsize size = 0;
     g_autofree char *data = g_key_file_to_data(file, &size, nullptr);
     // The mode is that of a new file; an existing one is replaced by a new one.
@@ -112,8 +115,10 @@ bool credentials_store(const std::string &service_name, const Credentials *crede
 
 std::string account_identity(const Service &service, const Credentials &credentials)
 {
-    // A bearer token says nothing about its user, so another token counts as another account.
-    const std::string who = credentials.user.empty() ? "bearer\n" + credentials.secret : "user\n" + credentials.user;
+    // A bearer token says nothing about its user: where it is all that is known, another token is another account.
+    const std::string who = !credentials.email.empty()  ? "email\n" + credentials.email
+                            : !credentials.user.empty() ? "user\n" + credentials.user
+                                                        : "bearer\n" + credentials.secret;
     const std::string text = service.storage + "\n" + who;
     g_autofree char *digest =
         g_compute_checksum_for_string(G_CHECKSUM_SHA256, text.data(), static_cast<gssize>(text.size()));

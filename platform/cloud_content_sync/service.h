@@ -17,6 +17,7 @@ struct Service {
 struct Credentials {
     std::string user; // empty: bearer token
     std::string secret;
+    std::string email; // the account's address; empty: not known
 };
 
 // Usable as a part of a file name.
@@ -30,7 +31,8 @@ std::string cloud_data_dir();
 std::optional<Credentials> credentials_load(const std::string &service_name);
 // Replaces the file of the service as a whole; it is readable by its owner alone. Null removes it.
 bool credentials_store(const std::string &service_name, const Credentials *credentials);
-// A digest that tells accounts apart: the same user of the same storage has the same one.
+// A digest that tells accounts of a storage apart: by the e-mail address, or by the user where none is known, or by the
+// token where neither is.
 std::string account_identity(const Service &service, const Credentials &credentials);
 
 } // namespace cloud

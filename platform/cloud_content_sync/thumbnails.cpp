@@ -29,10 +29,8 @@ Thumbnails::~Thumbnails() = default;
 // Empty when nobody is signed in.
 std::string Thumbnails::file_of(const ContentRow &row) const
 {
-    const auto credentials = credentials_load(client.service.name);
-    return credentials
-               ? cache_file(Kept::THUMBNAIL, client.service.name, account_identity(client.service, *credentials), row)
-               : "";
+    const std::string who = client.account->identity();
+    return who.empty() ? "" : cache_file(Kept::THUMBNAIL, client.service.name, who, row);
 }
 
 std::optional<std::string> Thumbnails::find(const ContentRow &row)

@@ -217,7 +217,7 @@ void Upload::verified(const Look &result)
     if (local_changed())
         return remove_stored(CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED);
     const ContentRow row{parent_of(target), name_of(target), local.st_size, time(nullptr), stored_etag};
-    if (!client.report_done(wanted, row))
+    if (!client.report_done(wanted, row, account_identity(client.service, credentials)))
         return remove_stored(0); // cancelled in the last moment
     ended = true;
 }

@@ -67,7 +67,7 @@ TEST_P(Files, files_come_whole_and_the_cache_needs_no_service)
     if (!backend->is_real)
         return;
     // Nobody else may have them.
-    ASSERT_EQ(cloud_content_sync_credentials_set("Test", "other@example.org", "x"), 0);
+    ASSERT_EQ(cloud_content_sync_credentials_set("Test", nullptr, "other@example.org", "x"), 0);
     EXPECT_EQ(names_in(data("cache/Test")), Names{});
 }
 
@@ -101,6 +101,48 @@ TEST_P(Files, what_changed_or_is_damaged_is_fetched_again)
         ASSERT_EQ(fetch(handle, Kind::CACHED, "b.jpg", grown), 0);
         EXPECT_EQ(read_file(grown.text), "larger than before");
         EXPECT_EQ(grown.status, i == 0 ? 200 : 0) << "asked again for what is known";
+    }
+}
+
+// What the client keeps belongs to an e-mail address, or to the user or the token where none is known.
+TEST_P(Files, a_new_token_of_the_same_address_keeps_everything)
+{
+    constexpr const char *NO = nullptr, *OTHER = "other@example.org";
+    const struct {
+        const char *email, *user; // of who is signed in
+        struct Next {
+            const char *email, *user, *secret;
+            bool is_same;
+        } next[2];
+    } rows[] = {
+        {USER, USER, {{USER, NO, "new token", true}, {USER, USER, "new password", true}}},
+        {USER, USER, {{USER, NO, "new token", true}, {OTHER, NO, "new token", false}}},
+        {USER, USER, {{OTHER, USER, PASSWORD, false}, {USER, USER, PASSWORD, false}}},
+        {NO, USER, {{NO, USER, "new password", true}, {NO, OTHER, "new password", false}}},
+        {NO, USER, {{USER, USER, PASSWORD, false}, {NO, USER, PASSWORD, false}}},
+        {USER, USER, {{NO, NO, "token", false}, {NO, NO, "new token", false}}},
+        {USER, USER, {{NO, NO, NO, false}, {USER, USER, PASSWORD, false}}},
+    };
+    backend->store("/kept.jpg", "kept");
+    for (const auto &row : rows) {
+        ASSERT_EQ(cloud_content_sync_credentials_set("Test", row.email, row.user, PASSWORD), 0);
+        ASSERT_EQ(refresh(handle), 0);
+        Watch cached;
+        ASSERT_EQ(fetch(handle, Kind::CACHED, "kept.jpg", cached), 0);
+        for (const auto &next : row.next) {
+            SCOPED_TRACE(testing::Message() << &row - rows << " " << &next - row.next);
+            ASSERT_EQ(cloud_content_sync_credentials_set("Test", next.email, next.user, next.secret), 0);
+            bool complete = !next.is_same;
+            cloud_content_sync_get_is_meta_complete(handle, &complete);
+            EXPECT_EQ(complete, next.is_same);
+            EXPECT_EQ(listing(handle, "/"), next.is_same ? Names{"kept.jpg:4"} : Names{});
+            EXPECT_EQ(fs::exists(cached.text), next.is_same);
+            Watch again;
+            if (next.is_same) {
+                EXPECT_EQ(fetch(handle, Kind::CACHED, "kept.jpg", again), 0);
+                EXPECT_EQ(again.text, cached.text);
+            }
+        }
     }
 }
 

@@ -263,18 +263,21 @@ TEST_P(Transfers, credentials_decide)
     const std::string local = scratch.file("local", "x");
     ASSERT_EQ(refresh(handle), 0);
     for (const char *user : {static_cast<const char *>("nobody@example.org"), static_cast<const char *>(nullptr)}) {
-        ASSERT_EQ(cloud_content_sync_credentials_set("Test", user, "wrong"), 0);
+        ASSERT_EQ(cloud_content_sync_credentials_set("Test", nullptr, user, "wrong"), 0);
         bool complete = true;
         cloud_content_sync_get_is_meta_complete(handle, &complete);
         EXPECT_FALSE(complete) << "another account's tree";
         EXPECT_EQ(upload(handle, local, "/x"), CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED);
         EXPECT_EQ(refresh(handle), CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED);
     }
-    ASSERT_EQ(cloud_content_sync_credentials_set("Test", nullptr, nullptr), 0);
+    ASSERT_EQ(cloud_content_sync_credentials_set("Test", nullptr, nullptr, nullptr), 0);
     EXPECT_EQ(upload(handle, local, "/x"), CLOUD_CONTENT_SYNC_ERROR_NO_ACCOUNT);
     EXPECT_EQ(refresh(handle), CLOUD_CONTENT_SYNC_ERROR_NO_ACCOUNT);
-    for (const auto &[user, secret] : {std::pair("a:b", "s"), std::pair("u", "s\nHeader: x"), std::pair("", "s")})
-        EXPECT_EQ(cloud_content_sync_credentials_set("Test", user, secret), CLOUD_CONTENT_SYNC_ERROR_INVALID_PARAMETER);
+    const char *const malformed[][3] = {
+        {nullptr, "a:b", "s"}, {nullptr, "u", "s\nHeader: x"}, {nullptr, "", "s"}, {"", "u", "s"}, {"a\nb", "u", "s"}};
+    for (const auto &[email, user, secret] : malformed)
+        EXPECT_EQ(cloud_content_sync_credentials_set("Test", email, user, secret),
+                  CLOUD_CONTENT_SYNC_ERROR_INVALID_PARAMETER);
     cloud_content_sync_h none = nullptr;
     EXPECT_EQ(cloud_content_sync_create("../Test", &none), CLOUD_CONTENT_SYNC_ERROR_INVALID_PARAMETER);
 }

@@ -141,7 +141,7 @@ class Scripted : public testing::Test {
         home.file("Test.conf", "[Service]\nStorage=" + server->url + "/r%20t/\nApi=" + server->url +
                                    "/api/\nStallTimeout=" + std::to_string(stall_seconds) + "\n");
         setenv("CLOUD_SERVICES_DIR", home.path.c_str(), 1);
-        ASSERT_EQ(cloud_content_sync_credentials_set("Test", nullptr, "token"), 0);
+        ASSERT_EQ(cloud_content_sync_credentials_set("Test", nullptr, nullptr, "token"), 0);
         ASSERT_EQ(cloud_content_sync_create("Test", &handle), 0);
     }
     void TearDown() override

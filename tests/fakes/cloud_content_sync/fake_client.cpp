@@ -200,7 +200,8 @@ static void run_upload(Client &client, const UploadRequest &request)
     std::string path = request.server_path;
     while (fake().files.count(path) || fake().folders.count(path))
         path = join(parent_of(path), next_free_name(name_of(path)));
-    client.account->insert({parent_of(path), name_of(path), static_cast<long long>(content->size()), 0, ""});
+    client.account->insert({parent_of(path), name_of(path), static_cast<long long>(content->size()), 0, ""},
+                           client.account->identity());
     fake().files[path] = *content;
     fake().landed[{&client, request.id}] = path;
     lock.unlock();

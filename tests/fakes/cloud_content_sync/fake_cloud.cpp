@@ -23,9 +23,7 @@ void FakeState::refresh(Account &account) const
             folder_rows.push_back({path, name_of(path)});
     for (const auto &[path, content] : files)
         content_rows.push_back({parent_of(path), name_of(path), static_cast<long long>(content.size()), 0, ""});
-    const auto credentials = credentials_load(account.service);
-    account.replace(folder_rows, content_rows, {},
-                    account_identity(*service_find(account.service), credentials.value_or(Credentials())));
+    account.replace(folder_rows, content_rows, {}, account.identity());
 }
 
 template <class Change> static void change(Change apply)
@@ -48,7 +46,7 @@ void fake_cloud_reset()
     const std::string descriptions = cloud_data_dir() + "/services";
     std::filesystem::create_directory(descriptions);
     setenv("CLOUD_SERVICES_DIR", descriptions.c_str(), 1);
-    const Credentials credentials = {"someone@example.org", "secret"};
+    const Credentials credentials = {"someone@example.org", "secret", "someone@example.org"};
     for (const std::string name : {"Velora", "Test"}) {
         std::ofstream(descriptions + "/" + name + ".conf") << "[Service]\nStorage=http://127.0.0.1:1/\n";
         credentials_store(name, &credentials);
@@ -57,7 +55,7 @@ void fake_cloud_reset()
 
 void fake_cloud_refresh_now()
 {
-    Account account("Velora");
+    Account account(*service_find("Velora"));
     if (!account.open())
         std::abort();
     change([&](FakeState &state) { state.refresh(account); });
