@@ -279,15 +279,29 @@ template <size_t N> Elm_Object_Item *list_page(Evas_Object *win, const char *tit
     return page;
 }
 
+// The line between the bar and the list; a progress below 0 shows no bar.
+void info_add(Evas_Object *win, const char *text, double progress)
+{
+    auto *layout = static_cast<Evas_Object *>(evas_object_data_get(win, "layout"));
+    if (!elm_layout_text_set(layout, "velora.text.info", text))
+        missing("part ", "velora.text.info");
+    if (progress >= 0 &&
+        !elm_layout_content_set(layout, "velora.swallow.progress", progress_add(layout, "overall", progress)))
+        missing("part ", "velora.swallow.progress");
+    elm_layout_signal_emit(layout, "velora,info,show", "velora");
+}
+
 void browse(Evas_Object *win)
 {
     Elm_Object_Item *page = list_page(win, "Hochladen nach", browse_rows, true);
+    info_add(win, "36 Dateien, 80.12 MB", -1);
     words_add(static_cast<Evas_Object *>(evas_object_data_get(win, "frame")), page, false);
 }
 
 void uploads(Evas_Object *win)
 {
     list_page(win, "Velora-Uploads in den gemeinsamen Ordner", upload_rows, false);
+    info_add(win, "3 von 36 · 12.00 MB von 80.12 MB", 0.15);
 }
 
 void names(Evas_Object *win)
