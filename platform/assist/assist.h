@@ -13,9 +13,10 @@ typedef struct ea_theme_font_table_s *ea_theme_font_table_h;
 // Calls `func` when the key is released over `obj`: of the visible objects of a window that are registered for the key
 // the topmost gets it, and nobody else; its callbacks run in the order of their registration. A popup in front that is
 // not registered for the key keeps it from what it covers. A key that the focused object has used up (a text entry, a
-// web page) goes to no one. The callback runs from the main loop shortly after, when it may delete `obj` or the window.
-// One object may have several callbacks. They go away with `obj`; `data` stays the caller's. Null `obj` or `func`: no
-// effect.
+// web page) goes to no one. A widget that is registered for a key has no binding of its own for it any more (a
+// naviframe goes back at Escape). The callback runs from the main loop shortly after, when it may delete `obj` or the
+// window. One object may have several callbacks. They go away with `obj`; `data` stays the caller's. Null `obj` or
+// `func`: no effect.
 void ea_object_event_callback_add(Evas_Object *obj, ea_callback_type_e type, ea_event_cb func, void *data);
 // Takes back the last registration of this object, key and function. The result is its `data`, null when there is none.
 void *ea_object_event_callback_del(Evas_Object *obj, ea_callback_type_e type, ea_event_cb func);

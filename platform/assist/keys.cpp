@@ -1,5 +1,9 @@
+// The toolkit does not call stable yet how a widget is told of a key.
+#define EFL_BETA_API_SUPPORT
+#define EFL_UI_WIDGET_PROTECTED
 #include "assist/assist.h"
 #include <Ecore_Evas.h>
+#include <Efl_Ui.h>
 #include <Elementary.h>
 #include <algorithm>
 #include <climits>
@@ -87,6 +91,34 @@ bool is_popup(const Evas_Object *obj)
 {
     const char *type = elm_object_widget_check(obj) ? elm_object_widget_type_get(obj) : nullptr;
     return type && strcasestr(type, "popup");
+}
+
+bool is_registered(const Evas_Object *obj, const char *key)
+{
+    const Canvas *canvas = key ? find_canvas(evas_object_evas_get(obj)) : nullptr;
+    return canvas && std::ranges::any_of(keys, [&](const auto &known) {
+               return std::strcmp(key, known.key) == 0 &&
+                      std::ranges::any_of(canvas->registrations,
+                                          [&](const auto &one) { return one->obj == obj && one->type == known.type; });
+           });
+}
+
+// Keys that the widget in focus does not use go up to those around it, and the toolkit's naviframe then goes back when
+// Escape goes down: once more than the registration says.
+Eina_Bool input_event(Eo *obj, void *, const Efl_Event *event, Efl_Canvas_Object *source)
+{
+    if ((event->desc == EFL_EVENT_KEY_DOWN || event->desc == EFL_EVENT_KEY_UP) &&
+        is_registered(obj, efl_input_key_sym_get(static_cast<const Eo *>(event->info))))
+        return EINA_FALSE;
+    return efl_ui_widget_input_event_handler(efl_super(obj, EFL_OBJECT_OVERRIDE_CLASS), event, source);
+}
+
+void own_key_bindings_end(Evas_Object *obj)
+{
+    if (!elm_object_widget_check(obj))
+        return;
+    EFL_OPS_DEFINE(ops, EFL_OBJECT_OP_FUNC(efl_ui_widget_input_event_handler, input_event));
+    efl_object_override(obj, &ops);
 }
 
 // Null when nobody gets it.
@@ -210,8 +242,10 @@ void ea_object_event_callback_add(Evas_Object *obj, ea_callback_type_e type, ea_
     if (!obj || !func)
         return;
     Canvas *canvas = get_canvas(evas_object_evas_get(obj));
-    if (std::ranges::none_of(canvas->registrations, [obj](const auto &one) { return one->obj == obj; }))
+    if (std::ranges::none_of(canvas->registrations, [obj](const auto &one) { return one->obj == obj; })) {
         evas_object_event_callback_add(obj, EVAS_CALLBACK_DEL, object_deleted, nullptr);
+        own_key_bindings_end(obj);
+    }
     canvas->registrations.push_back(std::make_shared<Registration>(Registration{obj, type, func, data}));
 }
 

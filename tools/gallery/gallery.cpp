@@ -1,15 +1,19 @@
 // Shows every widget and layout of the themes in typical and in hard cases and saves a picture of each, light and dark.
 //
-//   gallery OUTDIR [WIDTH HEIGHT [TEXT_PERCENT]]
+//   gallery OUTDIR [WIDTH HEIGHT [TEXT_PERCENT [SCENE...]]]
 //
-// ELM_SCALE sets the density. It needs no display. It fails when a theme lacks what a scene asks for.
+// Without the name of a scene it shows all of them. ELM_SCALE sets the density. It needs no display. It fails when a
+// theme lacks what a scene asks for.
 #include "assist/assist.h"
 #include "scenes.h"
 #include "theme/theme.h"
 #include <Ecore_Evas.h>
+#include <Efreet.h>
 #include <Elementary.h>
+#include <algorithm>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <filesystem>
 #include <string>
 
@@ -52,7 +56,7 @@ bool save(Evas_Object *win, const fs::path &file)
 int main(int argc, char **argv)
 {
     if (argc < 2) {
-        fprintf(stderr, "usage: gallery OUTDIR [WIDTH HEIGHT [TEXT_PERCENT]]\n");
+        fprintf(stderr, "usage: gallery OUTDIR [WIDTH HEIGHT [TEXT_PERCENT [SCENE...]]]\n");
         return 2;
     }
     const fs::path out = argv[1];
@@ -63,6 +67,9 @@ int main(int argc, char **argv)
     setenv("ELM_ENGINE", "buffer", 1);
     setenv("ELM_PROFILE", "mobile", 0);
     setenv("ELM_SCALE", "1.8", 0);
+    setenv("EINA_LOG_LEVELS", "eldbus:0,eina_safety:0,ecore_system_upower:0,ecore_system_systemd:0", 0);
+    setenv("EINA_LOG_BACKTRACE", "-1", 0);
+    efreet_cache_disable();
     elm_init(argc, argv);
     elm_app_base_scale_set(1.8);
 
@@ -86,6 +93,9 @@ int main(int argc, char **argv)
         setenv("ORVANT_THEME", dark ? "dark" : "light", 1);
         ea_theme_colors_set(colors, 0);
         for (const Scene &scene : gallery_scenes()) {
+            if (argc > 5 && std::none_of(argv + 5, argv + argc,
+                                         [&scene](const char *name) { return std::strcmp(scene.name, name) == 0; }))
+                continue;
             Evas_Object *win = elm_win_add(nullptr, "gallery", ELM_WIN_BASIC);
             evas_object_resize(win, width, height);
             evas_object_show(win);

@@ -7,7 +7,7 @@ int gallery_missing = 0;
 
 namespace {
 
-enum class Row { folder, file, running, waiting, failed, select_all, checked };
+enum class Row { folder, file, running, waiting, failed, uploaded, select_all, checked };
 
 struct RowData {
     Row kind;
@@ -36,8 +36,20 @@ constexpr RowData upload_rows[] = {
     {Row::waiting, "Präsentation <Entwurf> & Notizen.pptx", "ppt", 0},
     {Row::waiting, "song.mp3", "music", 0},
     {Row::failed, "Vertrag_unterschrieben_und_eingescannt_2014-11-22.pdf", "pdf", 0},
-    {Row::file, "Brief.docx", "word", 0},
-    {Row::folder, "Bilder", "folder", 0},
+    {Row::uploaded, "Brief.docx", "word", 0},
+    {Row::uploaded, "IMG_20141122_214613_Panorama_Donau_Ufer (2).jpg", "images", 0},
+    {Row::failed, "song.mp3", "music", 0},
+};
+// Names that are hard to shorten, in both kinds of rows.
+constexpr RowData name_rows[] = {
+    {Row::uploaded, "🎉 party 👍.jpg", "images", 0},
+    {Row::failed, "Flags 🇩🇪🇰🇷 and hands 👋🏽👩‍👩‍👧 of all that were there.jpg", "images",
+     0},
+    {Row::uploaded, "العقد النهائي الموقع بين الطرفين بتاريخ 2014-11-22.pdf", "pdf", 0},
+    {Row::running, "חוזה שכירות חתום ע״י שני הצדדים (עותק 2).pdf", "pdf", 0.7},
+    {Row::uploaded, "プロジェクト計画書二〇一四年度最終版修正済み(二).docx", "word", 0},
+    {Row::folder, "<b>Rechnungen</b> & Steuerunterlagen &amp; Belege <2014>", "folder", 0},
+    {Row::folder, "회의록 보관함 그리고 지난 몇 년 동안의 모든 회의 자료 2014", "folder", 0},
 };
 constexpr RowData select_rows[] = {
     {Row::checked, "IMG_20141122_214612_Panorama_Donau_Ufer.jpg", "images", 0.42},
@@ -140,6 +152,8 @@ Evas_Object *row_content(void *data, Evas_Object *list, const char *part_name)
         elm_object_part_content_set(holder, "elm.swallow.content", button_add(list, "editfield_clear", "Abbrechen"));
         return holder;
     }
+    if (part == "elm.icon.2" && (row->kind == Row::uploaded || row->kind == Row::failed))
+        return picture_add(list, row->kind == Row::failed ? "velora_icon_retry" : "velora_icon_done");
     if (part == "elm.icon.2" && (row->kind == Row::select_all || row->kind == Row::checked)) {
         Evas_Object *holder = theme_layout_add(list, "list/C/type.1");
         Evas_Object *check = elm_check_add(list);
@@ -150,6 +164,11 @@ Evas_Object *row_content(void *data, Evas_Object *list, const char *part_name)
     if (part == "elm.swallow.progressbar")
         return progress_add(list, row->kind == Row::running ? "list_progress" : "pending_custom", row->progress);
     return nullptr;
+}
+
+Eina_Bool row_state(void *data, Evas_Object *, const char *state)
+{
+    return std::string_view(state) == "failed" && static_cast<const RowData *>(data)->kind == Row::failed;
 }
 
 Evas_Object *list_add(Evas_Object *parent)
@@ -173,6 +192,7 @@ void row_append(Evas_Object *list, const RowData &row)
     itc->item_style = style;
     itc->func.text_get = row_text;
     itc->func.content_get = row_content;
+    itc->func.state_get = row_state;
     elm_genlist_item_append(list, itc, &row, nullptr, ELM_GENLIST_ITEM_NONE, nullptr, nullptr);
     elm_genlist_item_class_free(itc);
 }
@@ -259,15 +279,34 @@ template <size_t N> Elm_Object_Item *list_page(Evas_Object *win, const char *tit
     return page;
 }
 
+// The line between the bar and the list; a progress below 0 shows no bar.
+void info_add(Evas_Object *win, const char *text, double progress)
+{
+    auto *layout = static_cast<Evas_Object *>(evas_object_data_get(win, "layout"));
+    if (!elm_layout_text_set(layout, "velora.text.info", text))
+        missing("part ", "velora.text.info");
+    if (progress >= 0 &&
+        !elm_layout_content_set(layout, "velora.swallow.progress", progress_add(layout, "overall", progress)))
+        missing("part ", "velora.swallow.progress");
+    elm_layout_signal_emit(layout, "velora,info,show", "velora");
+}
+
 void browse(Evas_Object *win)
 {
     Elm_Object_Item *page = list_page(win, "Hochladen nach", browse_rows, true);
+    info_add(win, "36 Dateien, 80.12 MB", -1);
     words_add(static_cast<Evas_Object *>(evas_object_data_get(win, "frame")), page, false);
 }
 
 void uploads(Evas_Object *win)
 {
     list_page(win, "Velora-Uploads in den gemeinsamen Ordner", upload_rows, false);
+    info_add(win, "3 von 36 · 12.00 MB von 80.12 MB", 0.15);
+}
+
+void names(Evas_Object *win)
+{
+    list_page(win, "Namen", name_rows, false);
 }
 
 void selecting(Evas_Object *win)
@@ -520,6 +559,7 @@ const std::vector<Scene> &gallery_scenes()
     static const std::vector<Scene> scenes = {
         {"browse", browse},
         {"uploads", uploads},
+        {"names", names},
         {"select", selecting},
         {"popup-1", popup_1},
         {"popup-2-fill", popup_2},

@@ -82,6 +82,63 @@ TEST_F(Keys, GoToTheTopmostAndNobodyElse)
     EXPECT_EQ(press("Escape"), "");
 }
 
+Eina_Bool record_pop(void *, Elm_Object_Item *)
+{
+    calls += "p";
+    return EINA_FALSE;
+}
+
+// A page that refuses to go counts how often it is asked, by a key that the window's parts hand up to the naviframe as
+// well as by the registration.
+TEST_F(Keys, OnePressIsOneBackWhateverHasTheFocus)
+{
+    ea_object_event_callback_del(naviframe, EA_CALLBACK_BACK, record);
+    ea_object_event_callback_add(
+        naviframe, EA_CALLBACK_BACK, [](void *, Evas_Object *obj, void *) { elm_naviframe_item_pop(obj); }, nullptr);
+    Evas_Object *page = elm_box_add(naviframe), *list = elm_genlist_add(naviframe), *button = elm_button_add(naviframe);
+    Evas_Object *bar = elm_toolbar_add(naviframe);
+    for (Evas_Object *obj : {list, button, bar}) {
+        evas_object_size_hint_weight_set(obj, 1, 1);
+        evas_object_size_hint_align_set(obj, -1, -1);
+        elm_box_pack_end(page, obj);
+        evas_object_show(obj);
+    }
+    Elm_Genlist_Item_Class *rows = elm_genlist_item_class_new();
+    rows->item_style = "1line";
+    Elm_Object_Item *row =
+        elm_genlist_item_append(list, rows, nullptr, nullptr, ELM_GENLIST_ITEM_NONE, nullptr, nullptr);
+    elm_genlist_item_append(list, rows, nullptr, nullptr, ELM_GENLIST_ITEM_NONE, nullptr, nullptr);
+    elm_genlist_item_class_free(rows);
+    elm_toolbar_item_append(bar, nullptr, "path", nullptr, nullptr);
+    elm_naviframe_item_push(naviframe, "below", nullptr, nullptr, elm_box_add(naviframe), nullptr);
+    bool arrived = false;
+    evas_object_smart_callback_add(
+        naviframe, "transition,finished", [](void *data, Evas_Object *, void *) { *static_cast<bool *>(data) = true; },
+        &arrived);
+    Elm_Object_Item *top = elm_naviframe_item_push(naviframe, "top", nullptr, nullptr, page, nullptr);
+    elm_naviframe_item_pop_cb_set(top, record_pop, nullptr);
+    ASSERT_TRUE(driver::run_until([&arrived] { return arrived; }));
+    for (const char *key : {"Escape", "XF86Back"}) {
+        EXPECT_EQ(press(key), "p") << key << " with the focus on nothing";
+        for (Evas_Object *obj : {list, button, bar, naviframe}) {
+            elm_object_focus_set(obj, EINA_TRUE);
+            driver::settle();
+            EXPECT_EQ(press(key), "p") << key << " with the focus on " << elm_object_widget_type_get(obj);
+        }
+        elm_object_item_focus_set(row, EINA_TRUE);
+        driver::settle();
+        EXPECT_EQ(press(key), "p") << key << " with the focus on a row";
+        elm_genlist_item_selected_set(row, EINA_TRUE);
+        driver::settle();
+        EXPECT_EQ(press(key), "p") << key << " with a selected row";
+        elm_genlist_item_selected_set(row, EINA_FALSE);
+        popup("q");
+        EXPECT_EQ(press(key), "q") << key << " with a popup";
+        EXPECT_EQ(press(key), "p") << key << " when the popup has gone";
+        elm_object_focus_set(list, EINA_FALSE);
+    }
+}
+
 TEST_F(Keys, RegistrationsComeAndGo)
 {
     char x[] = "x", y[] = "y";
