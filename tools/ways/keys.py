@@ -4,7 +4,7 @@ import re
 import subprocess
 import time
 
-from ways.steps import SLOW, Failure, check, wait_for
+from ways.steps import SLOW, Failure, check, stays, wait_for
 
 
 def keys(tour):
@@ -99,6 +99,50 @@ def keys(tour):
     tour.step("the end of the queue, and Escape", left)
 
 
+# one press of a back key is one step back
+
+def escape(tour):
+    person = tour.person
+    path = ("Alpha", "Beta", "Gamma")
+    for depth in range(len(path) + 1):
+        person.make_folder("/" + "/".join((*path[:depth], f"side {depth}")))  # tells where one is
+    request = []
+
+    def see():
+        person.share(person.file("one.txt"))
+        person.sees("Alpha", "side 0")
+        request.append(person.request)
+
+    def here(depth):
+        return [text for text in person.texts() if text.startswith("side ")] == [f"side {depth}"]
+
+    def down(depth, way):
+        """To a folder; then nothing has the focus, or the list has it."""
+        for level in range(depth):
+            person.click(path[level])
+            wait_for(f"the folder {path[level]}", lambda: here(level + 1))  # pylint: disable=cell-var-from-loop
+        for key in way:
+            person.key(key)
+        return f"the focus is on {person.focused()!r}"
+
+    def up(key, depth):
+        person.key(key)
+        wait_for(f"the folder of depth {depth}", lambda: here(depth), 5)
+        stays(f"the folder of depth {depth}", lambda: here(depth), 0.5)
+        check(person.application.poll() is None and request[0].poll() is None, "the application has left")
+
+    tour.step("the folders are there", see)
+    for key in ("XF86Back", "Escape"):
+        for way in ((), ("Tab",), ("Tab", "Down")):
+            where = f"{key} after {' and '.join(way) or 'a click'}"
+            tour.step(f"{where}: in the first folder", down, 1, way)
+            tour.step(f"{where}: to the root and not out", up, key, 0)
+            tour.step(f"{where}: three folders down", down, 3, way)
+            for depth in (2, 1, 0):
+                tour.step(f"{where}: up to depth {depth}", up, key, depth)
+    tour.step("and out", person.leave)
+
+
 def reader(tour):
     person = tour.person
     file = person.file("large.bin", size=28_000_000)
@@ -166,4 +210,5 @@ def reader(tour):
     tour.step("a popup", popup)
 
 
-WAYS = {"keys": (keys, {"service": SLOW}), "reader": (reader, {"service": SLOW})}
+WAYS = {"keys": (keys, {"service": SLOW}), "escape": (escape, {}),
+        "reader": (reader, {"service": SLOW})}

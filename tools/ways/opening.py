@@ -1,11 +1,12 @@
 """What is in the cloud is opened."""
 
 import os
+import signal
 import time
 import urllib.parse
 import urllib.request
 
-from ways.steps import check, digest, wait_for
+from ways.steps import check, digest, stays, wait_for
 
 NO_APPLICATION = "No application can perform this action!"
 
@@ -116,4 +117,78 @@ def opens(tour):
     tour.step("a document without a network asks for Wi-Fi", refused)
 
 
-WAYS = {"opens": (opens, {})}
+def processing(tour):
+    """A file of the folder is asked for while the service hangs; the other end of both ways below."""
+    person = tour.person
+    person.env["ORVANT_APPS_DIR"] = os.path.join(person.home, "players")
+    apps = {"tour-pictures": "image/png;", "tour-documents": "application/pdf;", "com.orvant.video-player-lite": ""}
+    opened = {id_: install(person, id_, mime) for id_, mime in apps.items()}
+    person.put("/Photos/paper.pdf", os.urandom(70_000))
+    person.put("/Photos/clip.mp4", os.urandom(70_000))
+    with open(tour.image("picture.png"), "rb") as file:
+        person.put("/Photos/picture.png", file.read())
+
+    def browse():
+        person.share(person.file("one.txt"))
+        person.click("Photos")
+        person.sees("paper.pdf", "clip.mp4", "picture.png")
+        stays("the list", lambda: person.find("paper.pdf"), 1)  # the refresh and the thumbnails are over
+
+    def asks(name):
+        person.service.send_signal(signal.SIGSTOP)
+        person.click(name)
+        person.sees("Processing…")
+
+    def all_opened():
+        return sum((read() for read in opened.values()), [])
+
+    tour.step("the folder's files are there", browse)
+    return asks, all_opened
+
+
+def opening(tour):
+    person = tour.person
+    posts = tour.posts()
+    asks, all_opened = processing(tour)
+
+    def dies(name):
+        before = posts().count("member=Notify")
+        asks(name)
+        person.service.kill()
+        person.service.wait()
+        wait_for("the popup to go", lambda: not person.find("Processing…"), 10)
+        wait_for("a status message", lambda: posts().count("member=Notify") > before, 5)
+        person.sees("paper.pdf", "Upload to")
+        check(not all_opened(), f"it was opened: {all_opened()!r}")
+        person.start_service()
+
+    for name in ("paper.pdf", "clip.mp4", "picture.png"):
+        tour.step(f"the service dies under {name}: the wait goes, a message says why", dies, name)
+
+
+def opening_canceled(tour):
+    person = tour.person
+    asks, all_opened = processing(tour)
+
+    def cancel(name):
+        asks(name)
+        title = person.find("Upload to")
+        waits = wait_for("the wait's Cancel", lambda: [entry for entry in person.visible() if entry[:2] == (
+            "Elm_Button", "Cancel") and entry[3] > title[3] + title[5]])
+        _, _, x, y, width, height = waits[-1]
+        person.run("xdotool", "mousemove", str(x + width // 2), str(y + height // 2), "click", "1")
+        wait_for("the popup to go", lambda: not person.find("Processing…"), 5)
+        person.service.send_signal(signal.SIGCONT)
+        stays("nothing opened", lambda: not all_opened(), 2)
+        check(not person.find("Processing…"), "the wait is there again")
+
+    def again(name):
+        person.click(name)
+        wait_for("the file to open", all_opened)
+
+    for name in ("paper.pdf", "clip.mp4", "picture.png"):
+        tour.step(f"Cancel on {name}: nothing is opened", cancel, name)
+    tour.step("a second tap opens it", again, "paper.pdf")
+
+
+WAYS = {"opens": (opens, {}), "opening": (opening, {}), "opening-canceled": (opening_canceled, {})}
