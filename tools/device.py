@@ -37,8 +37,8 @@ def wait_for(what, condition, seconds=20.0, pause=0.05):
 
 class Device:
     def __init__(self, build, data=None, size="480x800", language=None, scale=None, dark=False,
-                 keep_display=False):
-        self.build, self.size = build, size
+                 keep_display=False, maximized=True):
+        self.build, self.size, self.maximized = build, size, maximized
         self.home = tempfile.mkdtemp(prefix="velora-")
         self.data = data or os.path.join(self.home, "cloud")
         self.processes = []
@@ -121,12 +121,13 @@ class Device:
         return bool(self.env.get("WAYLAND_DISPLAY")) and os.path.exists(socket)
 
     def start_display(self):
-        # No frames and no menus: the window is the screen, as on a phone.
+        # No frames and no menus, and unless told otherwise the window is the screen, as on a phone.
+        looks = "<decor>no</decor>" + "<maximized>yes</maximized>" * self.maximized
         rules = os.path.join(self.home, "openbox.xml")
         with open(rules, "w", encoding="utf-8") as file:
             file.write('<openbox_config xmlns="http://openbox.org/3.4/rc"><applications>'
-                       '<application class="*" type="normal"><decor>no</decor><maximized>yes</maximized></application>'
-                       '<application class="*" type="dialog"><decor>no</decor><maximized>yes</maximized></application>'
+                       f'<application class="*" type="normal">{looks}</application>'
+                       f'<application class="*" type="dialog">{looks}</application>'
                        '</applications><keyboard><keybind key="A-F4"><action name="Close"/></keybind></keyboard>'
                        "</openbox_config>")
         for attempt in range(3):

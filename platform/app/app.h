@@ -43,7 +43,7 @@ typedef struct {
 // may leave out APP_CONTROL_OPERATION_PREFIX, and files alone are a multi_share. With a session bus one process runs
 // per application id (see app_set_id): a further start hands its request to it and ends. --print-reply waits for the
 // reply and prints it on standard output as "reply: RESULT [KEY=VALUE]..."; --service starts without a request, to wait
-// for one from the bus.
+// for one from the bus: when none has come after a minute (or after $ORVANT_SERVICE_WAIT seconds) the program ends.
 //
 // Set when the environment does not: ELM_PROFILE=mobile, ELM_SCALE=1.8, and the language as language.h says. The
 // platform theme (theme/platform.edj) is laid over the default theme.

@@ -16,8 +16,6 @@
 #include <unistd.h>
 
 namespace {
-constexpr double service_wait = 60.0; // seconds without a request until a program started for one gives up
-
 struct Application {
     const app_event_callback_s *callbacks = nullptr;
     void *user_data = nullptr;
@@ -112,6 +110,14 @@ void queue_request(app_control_h request)
 {
     app.queue.emplace_back(request);
     ecore_job_add(handle_request, nullptr);
+}
+
+// Seconds without a request until a program started for one gives up.
+double service_wait()
+{
+    const char *text = std::getenv("ORVANT_SERVICE_WAIT");
+    const double seconds = text ? g_ascii_strtod(text, nullptr) : 0.0;
+    return seconds > 0.0 ? seconds : 60.0;
 }
 
 Eina_Bool no_request_came(void *)
@@ -224,7 +230,7 @@ int run(const CommandLine &line, int argc, char **argv)
         status = 1;
     } else {
         if (line.service)
-            app.service_timer = ecore_timer_add(service_wait, no_request_came, nullptr);
+            app.service_timer = ecore_timer_add(service_wait(), no_request_came, nullptr);
         else
             queue_request(first_request(line));
         elm_run();

@@ -55,6 +55,18 @@ void add_markup(const Walk &walk, const char *kind, const char *markup, const Ei
     std::free(text);
 }
 
+void add_widget(const Walk &walk, const Evas_Object *obj, const Eina_Rectangle &place)
+{
+    const char *type = elm_object_widget_type_get(obj);
+    if (std::strcmp(type, "Elm_Button") == 0) {
+        add_markup(walk, elm_object_disabled_get(obj) ? "disabled" : type, elm_object_text_get(obj), place);
+    } else if (std::strcmp(type, "Elm_Progressbar") == 0 && !elm_progressbar_pulse_get(obj)) {
+        char text[16];
+        g_snprintf(text, sizeof text, "%.0f %%", elm_progressbar_value_get(obj) * 100);
+        add(walk, type, text, place);
+    }
+}
+
 void visit(Walk &walk, Evas_Object *obj)
 {
     Eina_Rectangle place = {};
@@ -69,8 +81,8 @@ void visit(Walk &walk, Evas_Object *obj)
         add(walk, "text", evas_object_text_text_get(obj), place);
     else if (is_seen && std::strcmp(type, "textblock") == 0)
         add_markup(walk, "text", evas_object_textblock_text_markup_get(obj), place);
-    else if (is_seen && elm_object_widget_check(obj) && std::strcmp(elm_object_widget_type_get(obj), "Elm_Button") == 0)
-        add_markup(walk, "Elm_Button", elm_object_text_get(obj), place);
+    else if (is_seen && elm_object_widget_check(obj))
+        add_widget(walk, obj, place);
     for (const char *leaf : {"rectangle", "image", "text", "textblock", "line", "polygon", "vectors", "textgrid"})
         if (std::strcmp(type, leaf) == 0)
             return;

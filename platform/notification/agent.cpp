@@ -1,6 +1,7 @@
 // notification-agent: shows the notifications of the store at the session's notification daemon and acts on taps, also
 // when the program that posted one has left. It ends when nothing is left to show, or with the bus.
 #include "app/target.h"
+#include "base/base.h"
 #include "notification/courier.h"
 #include "notification/tap.h"
 #include <algorithm>
@@ -13,7 +14,9 @@
 namespace {
 
 constexpr gint64 PACE = 100 * 1000;       // microseconds between two updates of one notification
-constexpr guint STORE_LOOK = 5;           // seconds; a program that died may not have told us
+constexpr guint ORPHAN_LOOK = 1000;       // milliseconds; nobody tells that the poster of an ongoing one has died
+constexpr guint STORE_LOOK = 5000;        // the same with none of those, where the store's file cannot be watched
+constexpr int WATCH_MILLISECONDS = 200;   // between two looks at a file that changes all the time
 constexpr guint QUIT_MILLISECONDS = 1000; // with nothing to show
 constexpr int CALL_MILLISECONDS = 5000;
 
@@ -38,7 +41,7 @@ struct Agent {
     bool daemon = false, markup = false, actions = false;
     std::map<int, Shown> shown; // by private id
     long long version = -1;
-    guint sync_timer = 0, quit_timer = 0;
+    guint sync_timer = 0, quit_timer = 0, look_timer = 0, look_pace = 0;
     std::vector<DaemonSignal> early; // about ids that an answer under way will name
 };
 
@@ -177,6 +180,36 @@ gboolean nothing_left(gpointer)
     return G_SOURCE_REMOVE;
 }
 
+gboolean look(gpointer)
+{
+    if (store_forget_orphans() || store_version() != agent.version)
+        sync_store();
+    return G_SOURCE_CONTINUE;
+}
+
+void look_every(guint milliseconds)
+{
+    if (agent.look_pace == milliseconds)
+        return;
+    if (agent.look_timer)
+        g_source_remove(agent.look_timer);
+    agent.look_pace = milliseconds;
+    agent.look_timer = g_timeout_add(milliseconds, look, nullptr);
+}
+
+// A program may change the store and die before it tells us. Every change goes through the log of SQLite's WAL mode.
+GFileMonitor *watch_store()
+{
+    GFile *log = g_file_new_for_path((platform_data_dir() + "/notifications.db-wal").c_str());
+    GFileMonitor *monitor = g_file_monitor_file(log, G_FILE_MONITOR_NONE, nullptr, nullptr);
+    g_object_unref(log);
+    if (!monitor)
+        return nullptr;
+    g_file_monitor_set_rate_limit(monitor, WATCH_MILLISECONDS);
+    g_signal_connect_swapped(monitor, "changed", G_CALLBACK(look), nullptr);
+    return monitor;
+}
+
 bool is_for_daemon(const notification_s &noti)
 {
     return !noti.closed && (noti.places & NOTIFICATION_DISPLAY_APP_NOTIFICATION_TRAY);
@@ -188,11 +221,12 @@ void sync_store()
     agent.version = store_version();
     for (auto &[id, shown] : agent.shown)
         shown.wanted = false;
-    bool any = false;
+    bool any = false, ongoing = false;
     for (const notification_s &noti : store_list(nullptr)) {
         if (!is_for_daemon(noti))
             continue;
         any = true;
+        ongoing = ongoing || noti.type == NOTIFICATION_TYPE_ONGOING;
         if (agent.daemon)
             show(noti);
     }
@@ -207,6 +241,7 @@ void sync_store()
             call_daemon("CloseNotification", g_variant_new("(u)", shown.daemon_id), nullptr, nullptr);
         it = agent.shown.erase(it);
     }
+    look_every(ongoing ? ORPHAN_LOOK : STORE_LOOK);
     if (any && agent.quit_timer) {
         g_source_remove(agent.quit_timer);
         agent.quit_timer = 0;
@@ -367,21 +402,15 @@ int main()
                                        nullptr, nullptr);
     g_bus_watch_name_on_connection(agent.bus, NOTIFICATION_DAEMON, G_BUS_NAME_WATCHER_FLAGS_AUTO_START, daemon_appeared,
                                    daemon_vanished, nullptr, nullptr);
-    g_timeout_add_seconds(
-        STORE_LOOK,
-        [](gpointer) -> gboolean {
-            if (store_forget_orphans() || store_version() != agent.version)
-                sync_store();
-            return G_SOURCE_CONTINUE;
-        },
-        nullptr);
     sync_store();
+    GFileMonitor *store = watch_store();
     // A program that found us on the bus wrote its notification before we gave the name back.
     do {
         g_main_loop_run(agent.loop);
         if (!g_dbus_connection_is_closed(agent.bus))
             bus_number("ReleaseName", g_variant_new("(s)", NOTIFICATION_AGENT));
     } while (!g_dbus_connection_is_closed(agent.bus) && anything_left() && take_name() && (sync_store(), true));
+    g_clear_object(&store);
     tap_finish();
     return 0;
 }

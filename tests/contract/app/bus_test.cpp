@@ -215,6 +215,25 @@ TEST_F(Bus, TakesTheDesktopsCalls)
     EXPECT_EQ(exchange("echo")["count"], "5");
 }
 
+TEST_F(Bus, AServiceWithoutARequestEndsItself)
+{
+    const auto start = [] {
+        char program[] = TOY, service[] = "--service";
+        char *words[] = {program, service, nullptr};
+        char **environment = g_environ_setenv(g_get_environ(), "ORVANT_SERVICE_WAIT", "1", TRUE);
+        EXPECT_TRUE(g_spawn_async(nullptr, words, environment, G_SPAWN_DEFAULT, nullptr, nullptr, nullptr, nullptr));
+        g_strfreev(environment);
+        EXPECT_TRUE(run_until([] { return bus_name_owned("com.example.toy"); }));
+    };
+    start();
+    EXPECT_TRUE(run_until([] { return !bus_name_owned("com.example.toy"); }, 5));
+    start();
+    const Outcome first = exchange("echo");
+    const gint64 begun = g_get_monotonic_time();
+    run_until([begun] { return g_get_monotonic_time() - begun > 2 * G_USEC_PER_SEC; }); // well after its time
+    EXPECT_EQ(exchange("echo")["pid"], first["pid"]);
+}
+
 TEST_F(Bus, ProgramsTellWhatBecameOfARequest)
 {
     const std::string file = dir->file("a file", "x"), quoted = dir->path + "/a\\040file";

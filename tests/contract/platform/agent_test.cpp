@@ -4,6 +4,7 @@
 #include "support.h"
 #include <algorithm>
 #include <csignal>
+#include <functional>
 #include <map>
 #include <sys/wait.h>
 
@@ -234,6 +235,47 @@ TEST_F(Agent, ClosedByTheUser)
     notification_free(noti);
     EXPECT_TRUE(run_until([this] { return !agent_runs(); }));
     EXPECT_TRUE(screen.empty());
+}
+
+// Whoever deletes it, and however: a bubble that tells of what is over is soon gone.
+TEST_F(Agent, DeletedGoesWithinTwoSeconds)
+{
+    const struct {
+        const char *how;
+        notification_type_e type;
+        std::function<void(int id)> remove;
+    } cases[] = {
+        {"by its program", NOTIFICATION_TYPE_NOTI,
+         [](int id) {
+             notification_h noti = notification_load(PACKAGE, id);
+             EXPECT_EQ(notification_delete(noti), 0);
+             notification_free(noti);
+         }},
+        {"by type", NOTIFICATION_TYPE_NOTI,
+         [](int) { EXPECT_EQ(notification_delete_all_by_type(PACKAGE, NOTIFICATION_TYPE_NOTI), 0); }},
+        {"by a program that did not live to tell the bus", NOTIFICATION_TYPE_NOTI,
+         [](int id) {
+             Db db;
+             EXPECT_TRUE(db.open(platform_data_dir() + "/notifications.db", nullptr) &&
+                         db.run(("DELETE FROM notification WHERE id = " + std::to_string(id)).c_str()));
+         }},
+        {"by the death of its poster", NOTIFICATION_TYPE_ONGOING,
+         [](int) {
+             kill(ongoing_posters.back(), SIGKILL);
+             waitpid(ongoing_posters.back(), nullptr, 0);
+             ongoing_posters.pop_back();
+         }},
+    };
+    for (const auto &one : cases) {
+        const int id = post(one.type, "title", "content", 0);
+        ASSERT_TRUE(run_until([this] { return screen.size() == 1; })) << one.how;
+        const auto shown = std::chrono::steady_clock::now();
+        run_until([shown] { return milliseconds_since(shown) > 500; }); // the agent looks once more at the answer
+        one.remove(id);
+        EXPECT_TRUE(run_until([this] { return screen.empty(); }, 2)) << one.how;
+        // The next one meets an agent that has just begun to look.
+        ASSERT_TRUE(run_until([this] { return !agent_runs(); })) << one.how;
+    }
 }
 
 TEST_F(Agent, StatusMessage)

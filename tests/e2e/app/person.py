@@ -31,12 +31,14 @@ def digest(data):
 
 
 class Person(Device):
-    def __init__(self, build, account=True, service=()):
-        super().__init__(build)
+    def __init__(self, build, account=True, service=(), **options):
+        super().__init__(build, **options)
         self.folder = os.path.join(self.home, "files")
         os.mkdir(self.folder)
         self.application = None
         self.request = None
+        self.requests = []  # of all who shared
+        self.replies = {}
         try:
             self.start_service(*service)
             self.make_folder(FOLDER)
@@ -66,6 +68,16 @@ class Person(Device):
             self.application = self.start_application()
         arguments = ["--array", "http://orvant.com/appcontrol/data/path", *files] if files else []
         self.request = self.launch("multi_share", *arguments)
+        self.requests.append(self.request)
+
+    def tap_icon(self):
+        """Starts the application as its icon does, without an operation, or tells the one that runs."""
+        tap = self.start([self.program("src/setting/main/velora")])
+        if self.application and self.application.poll() is None:
+            wait_for("the running application to be told", lambda: tap.poll() is not None)
+        else:
+            self.application = tap
+            wait_for("the application on the bus", lambda: self.is_on_bus("com.orvant.velora") or tap.poll() is not None)
 
     def choose(self, folder="Photos"):
         """Opens the folder and presses Done."""
@@ -139,11 +151,22 @@ class Person(Device):
         except subprocess.TimeoutExpired:
             raise Failure(f"the application does not end; it shows {self.texts()!r}") from None
         check(ended == status, f"the application ended with {ended}")
-        try:
-            self.request.wait(10)
-        except subprocess.TimeoutExpired:
-            raise Failure("the request is not answered") from None
-        return self.request.stdout.read().decode(errors="replace").strip()
+        return self.reply(self.request)
+
+    def reply(self, request):
+        """What the sender of a request was told; it must have been told by now."""
+        if request not in self.replies:
+            try:
+                request.wait(10)
+            except subprocess.TimeoutExpired:
+                raise Failure("a request is not answered") from None
+            self.replies[request] = request.stdout.read().decode(errors="replace").strip()
+        return self.replies[request]
+
+    def all_succeeded(self):
+        """Everyone who shared was told so."""
+        replies = [self.reply(request) for request in self.requests]
+        check(all("SUCCEEDED" in reply for reply in replies), f"the replies are {replies!r}")
 
     def has_stored(self, expected):
         """The service has these files and nothing else: {cloud path: local path or content}."""
