@@ -126,41 +126,57 @@ BusAnswer ask(const char *address, int milliseconds)
     return answer;
 }
 
+constexpr int QUESTIONS_AT_ONCE = 4;
+
 struct Question {
-    std::mutex lock;
-    std::condition_variable answered;
-    bool done = false;
+    bool is_answered = false;
+    bool is_given_up = false; // nobody waits for it any more
     BusAnswer answer;
 };
 
+// It is never freed: a thread that was left behind may come back when the process ends.
+struct Questions {
+    std::mutex lock; // guards everything here, and what is asked
+    std::condition_variable changed;
+    int asked = 0; // threads that have not answered yet
+    int given_up = 0;
+};
+
+Questions &questions()
+{
+    static auto *const all = new Questions;
+    return *all;
+}
+
 } // namespace
 
+// Everyone asks for themselves: what somebody else asked may have been answered before the network changed.
 BusAnswer connection_ask_bus(int milliseconds)
 {
     const Owned<char> address(g_dbus_address_get_for_bus_sync(G_BUS_TYPE_SYSTEM, nullptr, nullptr));
     if (!address)
         return {};
+    const auto end = std::chrono::steady_clock::now() + std::chrono::milliseconds(milliseconds);
+    Questions &all = questions();
+    std::unique_lock hold(all.lock);
     // Connecting to a bus that hangs cannot be bounded, so a thread does it and may be left behind; it owns nothing but
     // its question. While one is stuck no other is started.
-    static std::mutex lock;
-    static std::weak_ptr<Question> last;
-    std::shared_ptr<Question> question;
-    {
-        const std::lock_guard hold(lock);
-        question = last.lock();
-        if (!question) {
-            question = std::make_shared<Question>();
-            last = question;
-            std::thread([question, bus = std::string(address.get()), milliseconds] {
-                const BusAnswer answer = ask(bus.c_str(), milliseconds);
-                const std::lock_guard set(question->lock);
-                question->answer = answer;
-                question->done = true;
-                question->answered.notify_all();
-            }).detach();
-        }
+    if (!all.changed.wait_until(hold, end, [&] { return all.asked < QUESTIONS_AT_ONCE && all.given_up == 0; }))
+        return {};
+    const auto question = std::make_shared<Question>();
+    all.asked++;
+    std::thread([question, &all, bus = std::string(address.get()), milliseconds] {
+        const BusAnswer answer = ask(bus.c_str(), milliseconds);
+        const std::lock_guard set(all.lock);
+        question->answer = answer;
+        question->is_answered = true;
+        all.asked--;
+        all.given_up -= question->is_given_up;
+        all.changed.notify_all();
+    }).detach();
+    if (!all.changed.wait_until(hold, end, [&] { return question->is_answered; })) {
+        question->is_given_up = true;
+        all.given_up++;
     }
-    std::unique_lock wait(question->lock);
-    question->answered.wait_for(wait, std::chrono::milliseconds(milliseconds), [&] { return question->done; });
     return question->answer;
 }

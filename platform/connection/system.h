@@ -14,5 +14,6 @@ struct BusAnswer {
     std::optional<bool> radios_off;
     connection_cellular_state_e modem = CONNECTION_CELLULAR_STATE_OUT_OF_SERVICE;
 };
-// What the system bus says, within `milliseconds`; empty answers when it is absent or silent. Any thread.
+// What the system bus says, within `milliseconds`; empty answers when it is absent or silent. Nothing of the answer is
+// older than the call. Any thread.
 BusAnswer connection_ask_bus(int milliseconds);

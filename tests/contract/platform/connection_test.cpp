@@ -38,6 +38,34 @@ class Connection : public PlatformTest {
 
 constexpr const char *HEADING = "Iface\tDestination\tGateway \tFlags\tRefCnt\tUse\tMetric\tMask\n";
 
+// What NetworkManager and ModemManager say, on a bus of their own.
+struct Managers {
+    std::string network, modem;
+    std::function<void()> on_modem = [] {}; // runs before it answers
+
+    const PrivateBus bus{"DBUS_SYSTEM_BUS_ADDRESS"};
+    const Program network_manager{
+        bus, "org.freedesktop.NetworkManager", "/org/freedesktop/NetworkManager",
+        "<node><interface name='org.freedesktop.DBus.Properties'><method name='GetAll'><arg type='s' direction='in'/>"
+        "<arg type='a{sv}' direction='out'/></method></interface></node>",
+        [this](const std::string &, GVariant *) { return "(" + network + ",)"; }};
+    const Program modem_manager{
+        bus, "org.freedesktop.ModemManager1", "/org/freedesktop/ModemManager1",
+        "<node><interface name='org.freedesktop.DBus.ObjectManager'><method name='GetManagedObjects'>"
+        "<arg type='a{oa{sa{sv}}}' direction='out'/></method></interface></node>",
+        [this](const std::string &, GVariant *) {
+            on_modem();
+            return "({objectpath '/m': {'org.freedesktop.ModemManager1.Modem': " + modem + "}},)";
+        }};
+
+    void set(const std::string &type, const std::string &radios, const std::string &modem_state)
+    {
+        network = "{'State': <uint32 70>, 'PrimaryConnectionType': <'" + type + "'>, 'WirelessEnabled': <" + radios +
+                  ">, 'WwanEnabled': <" + radios + ">}";
+        modem = "{'State': <" + modem_state + ">}";
+    }
+};
+
 } // namespace
 
 TEST_F(Connection, StateSetByHandIsSeenAtOnce)
@@ -83,20 +111,7 @@ TEST_F(Connection, CountsByRoutesWithoutNetworkManager)
 
 TEST_F(Connection, AsksNetworkAndModemManagers)
 {
-    const PrivateBus bus("DBUS_SYSTEM_BUS_ADDRESS");
-    std::string network, modem;
-    const Program network_manager(
-        bus, "org.freedesktop.NetworkManager", "/org/freedesktop/NetworkManager",
-        "<node><interface name='org.freedesktop.DBus.Properties'><method name='GetAll'><arg type='s' direction='in'/>"
-        "<arg type='a{sv}' direction='out'/></method></interface></node>",
-        [&network](const std::string &, GVariant *) { return "(" + network + ",)"; });
-    const Program modem_manager(
-        bus, "org.freedesktop.ModemManager1", "/org/freedesktop/ModemManager1",
-        "<node><interface name='org.freedesktop.DBus.ObjectManager'><method name='GetManagedObjects'>"
-        "<arg type='a{oa{sa{sv}}}' direction='out'/></method></interface></node>",
-        [&modem](const std::string &, GVariant *) {
-            return "({objectpath '/m': {'org.freedesktop.ModemManager1.Modem': " + modem + "}},)";
-        });
+    Managers managers;
     const std::string gpp = "}, 'org.freedesktop.ModemManager1.Modem.Modem3gpp': {'RegistrationState': ";
     const struct {
         std::string type, radios, modem, state;
@@ -108,9 +123,7 @@ TEST_F(Connection, AsksNetworkAndModemManagers)
         {"802-11-wireless", "true", "7>" + gpp + "<uint32 6", "1 3"},
     };
     for (const auto &c : cases) {
-        network = "{'State': <uint32 70>, 'PrimaryConnectionType': <'" + c.type + "'>, 'WirelessEnabled': <" +
-                  c.radios + ">, 'WwanEnabled': <" + c.radios + ">}";
-        modem = "{'State': <" + c.modem + ">}";
+        managers.set(c.type, c.radios, c.modem);
         std::string state;
         std::atomic<bool> done = false;
         std::thread reader([&] {
@@ -119,7 +132,7 @@ TEST_F(Connection, AsksNetworkAndModemManagers)
         });
         run_until([&done] { return done.load(); }); // the managers answer here
         reader.join();
-        EXPECT_EQ(state, c.state) << network << modem;
+        EXPECT_EQ(state, c.state) << managers.network << managers.modem;
     }
 }
 
@@ -132,10 +145,69 @@ TEST_F(Connection, BusThatNeverAnswersDoesNotHoldUsUp)
     path.copy(address.sun_path, sizeof address.sun_path - 1);
     ASSERT_EQ(bind(listener, reinterpret_cast<sockaddr *>(&address), sizeof address), 0);
     ASSERT_EQ(listen(listener, 5), 0);
-    for (int i = 0; i < 2; i++) {
+    const auto threads = [] { return std::distance(std::filesystem::directory_iterator("/proc/self/task"), {}); };
+    long after_first = 0;
+    for (int i = 0; i < 3; i++) {
         const auto start = std::chrono::steady_clock::now();
         EXPECT_EQ(read()[0] - '0', connection_type_by_routes(""));
         EXPECT_LT(milliseconds_since(start), 1000); // of two calls
+        after_first = i ? after_first : threads();
+        EXPECT_EQ(threads(), after_first) << "left behind";
     }
     close(listener);
+    // What was stuck is over, and the next one is asked.
+    Managers managers;
+    managers.set("bluetooth", "true", "8");
+    std::atomic<bool> done = false;
+    BusAnswer answer;
+    std::thread reader([&] {
+        answer = connection_ask_bus(10'000);
+        done = true;
+    });
+    run_until([&done] { return done.load(); }, 20);
+    reader.join();
+    EXPECT_EQ(answer.type, CONNECTION_TYPE_BT);
+}
+
+TEST_F(Connection, NobodyGetsAnAnswerOlderThanTheQuestion)
+{
+    Managers managers;
+    std::atomic<bool> first_done = false, second_done = false;
+    BusAnswer first, second;
+    std::thread late;
+    bool has_changed = false;
+    // The network changes when the first question has been answered in part, and then somebody else asks.
+    managers.on_modem = [&] {
+        if (std::exchange(has_changed, true))
+            return;
+        managers.set("gsm", "true", "8");
+        late = std::thread([&] {
+            second = connection_ask_bus(10'000);
+            second_done = true;
+        });
+        run_until([&second_done] { return second_done.load(); }, 2);
+    };
+    managers.set("802-11-wireless", "true", "8");
+    std::thread early([&] {
+        first = connection_ask_bus(10'000);
+        first_done = true;
+    });
+    run_until([&] { return first_done && second_done; }, 20);
+    early.join();
+    late.join();
+    EXPECT_EQ(first.type, CONNECTION_TYPE_WIFI);
+    EXPECT_EQ(second.type, CONNECTION_TYPE_CELLULAR);
+    // One after the other, as fast as they go.
+    for (int i = 0; i < 50; i++) {
+        const bool is_wifi = i % 2;
+        managers.set(is_wifi ? "802-11-wireless" : "gsm", "true", "8");
+        std::atomic<bool> done = false;
+        std::thread reader([&] {
+            first = connection_ask_bus(10'000);
+            done = true;
+        });
+        run_until([&done] { return done.load(); });
+        reader.join();
+        EXPECT_EQ(first.type, is_wifi ? CONNECTION_TYPE_WIFI : CONNECTION_TYPE_CELLULAR) << i;
+    }
 }
