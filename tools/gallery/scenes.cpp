@@ -338,9 +338,12 @@ Evas_Object *popup_add(Evas_Object *win, const char *title, const char *text, bo
     return popup;
 }
 
-void popup_button(Evas_Object *popup, const char *part, const char *text)
+void popup_button(Evas_Object *popup, const char *part, const char *text, const char *signal = nullptr)
 {
-    elm_object_part_content_set(popup, part, button_add(popup, "popup", text));
+    Evas_Object *button = button_add(popup, "popup", text);
+    elm_object_part_content_set(popup, part, button);
+    if (signal)
+        elm_layout_signal_emit(button, signal, "platform");
 }
 
 void popup_1(Evas_Object *win)
@@ -354,7 +357,7 @@ void popup_2(Evas_Object *win)
     Evas_Object *popup = popup_add(win, "Hochladen anhalten",
                                    "Das Hochladen wird angehalten, aber die Datei wird nicht gelöscht.", true);
     popup_button(popup, "button1", "Abbrechen");
-    popup_button(popup, "button2", "Anhalten");
+    popup_button(popup, "button2", "Anhalten", "platform,button,primary");
 }
 
 void popup_2_plain(Evas_Object *win)
@@ -362,7 +365,7 @@ void popup_2_plain(Evas_Object *win)
     Evas_Object *popup =
         popup_add(win, "Konto entfernen", "Alle Daten dieses Kontos werden von diesem Gerät entfernt.");
     popup_button(popup, "button1", "Abbrechen");
-    popup_button(popup, "button2", "Konto entfernen");
+    popup_button(popup, "button2", "Konto entfernen", "platform,button,destructive");
 }
 
 void popup_3_with(Evas_Object *win, bool fill, bool scroll)
@@ -389,6 +392,11 @@ void popup_3_fill(Evas_Object *win)
 void popup_3_scroll(Evas_Object *win)
 {
     popup_3_with(win, false, true);
+}
+
+void popup_3_fill_scroll(Evas_Object *win)
+{
+    popup_3_with(win, true, true);
 }
 
 void processing(Evas_Object *win)
@@ -567,6 +575,7 @@ const std::vector<Scene> &gallery_scenes()
         {"popup-3", popup_3},
         {"popup-3-fill", popup_3_fill},
         {"popup-3-scroll", popup_3_scroll},
+        {"popup-3-fill-scroll", popup_3_fill_scroll},
         {"processing", processing},
         {"processing-cancel", processing_cancel},
         {"processing-text", processing_text},

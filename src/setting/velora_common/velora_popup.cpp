@@ -102,8 +102,11 @@ Evas_Object *_velora_common_with_title_btn_popup(Evas_Object *parent, const char
     elm_object_text_set(popup, text);
     elm_object_part_text_set(popup, "title,text", title);
     elm_object_text_set(__button_add(popup, "button1", cb1, data), btn1_text);
-    if (btn2_text)
-        elm_object_text_set(__button_add(popup, "button2", cb2, data), btn2_text);
+    if (btn2_text) {
+        Evas_Object *button = __button_add(popup, "button2", cb2, data);
+        elm_object_text_set(button, btn2_text);
+        elm_layout_signal_emit(button, "platform,button,primary", "platform"); // of the two the one that acts
+    }
     _velora_common_register_event_for_popup(popup, cb1, data);
     evas_object_show(popup);
     return popup;
