@@ -1,8 +1,9 @@
 """The notifications, also when the application has left."""
 
+import re
 import subprocess
 
-from ways.steps import wait_for
+from ways.steps import Failure, check, wait_for
 
 
 def click_bubble(tour):
@@ -82,4 +83,111 @@ def again(tour):
     tour.step("Upload tries again, into the folder of the first try", try_again)
 
 
-WAYS = {"bubble": (bubble, {}), "again": (again, {"service": ("--fail", "1:503")})}
+def no_page(tour):
+    person = tour.person
+
+    def tap():
+        """What a tap on an ongoing notification sends, when its application is gone."""
+        person.application = person.start([person.program("src/setting/main/velora"), "--operation", "notification/upload"])
+        try:
+            status = person.application.wait(10)
+        except subprocess.TimeoutExpired:
+            raise Failure(f"it stays, with a window that shows {person.texts()!r}") from None
+        check(status == 0, f"it ended with {status}")
+
+    tour.step("a tap on the notification of uploads that are gone: it leaves again", tap)
+
+
+# progress within one file
+
+def values(posts, start):
+    """The values that the desktop was told of from a place of the log on."""
+    return [int(value) for value in re.findall(r'string "value"\s+variant\s+int32 (\d+)', posts()[start:])]
+
+
+def moves(told, where):
+    between = {value for value in told if 0 < value < 100}
+    check(told and told[0] < 50, f"{where} begins at {told[:1]!r}")
+    check(told == sorted(told), f"{where} goes back: {told!r}")
+    check(len(between) >= 4, f"{where} does not move within the file: {told!r}")
+
+
+def follow(tour, posts):
+    """Looks at the row and the notification from the begin of an upload to its end."""
+    person, start, row = tour.person, len(posts()), []
+
+    def over():
+        bars = [int(text.split()[0]) for kind, text, *_ in person.visible() if kind == "Elm_Progressbar"]
+        row.extend(bars[:1])
+        return any("\tnormal\t" in line and "Upload complete" in line for line in person.notifications())
+
+    def both():
+        wait_for("the end of the upload", over, 60)
+        told = values(posts, start)
+        moves(told, "the notification")
+        moves(row, "the row")
+        return f"the notification has {len(set(told))} values, the row {len(set(row))}"
+    return both
+
+
+def progress(tour):
+    person = tour.person
+    posts = tour.posts()
+    path = person.file("one.bin", size=24_000_000)  # a connection on the machine itself swallows megabytes at once
+
+    def fails():
+        person.upload(path)
+        person.finished("one.bin", "Upload failed")
+
+    def upload():
+        person.share(path)
+        person.click("Photos")
+        person.sees("Done", "Photos", "Velora")
+        both = follow(tour, posts)
+        person.click("Done", "Elm_Button")
+        told = both()
+        person.leave()
+        return told
+
+    def try_again():
+        both = follow(tour, posts)
+        person.retry("one.bin")
+        told = both()
+        person.leave()
+        return told
+
+    def open_result():
+        person.share(path)
+        person.choose()
+        person.finished("one.bin", "Upload failed")
+        person.leave()
+        daemon_in_sight(person)
+        click_bubble(tour)
+        person.sees("Velora uploads", "one.bin", "Upload failed")
+        daemon = [process for process in person.processes if process.args[0] == "dunst"][-1]
+        daemon.terminate()  # it lies over the buttons
+        daemon.wait()
+        person.start_notification_daemon(in_sight=False)
+
+    def again_in_result():
+        both = follow(tour, posts)
+        person.click("one.bin")
+        person.click("Upload", "Elm_Button")
+        told = both()
+        leave_result(person)
+        return told
+
+    if tour.name == "progress":
+        tour.step("an upload moves from 0 to 100", upload)
+    elif tour.name == "progress-retry":
+        tour.step("an upload fails", fails)
+        tour.step("another try moves from 0 to 100", try_again)
+    else:
+        tour.step("an upload fails, its result is opened", open_result)
+        tour.step("another try from there moves from 0 to 100", again_in_result)
+
+
+PACED = ("--delay", "20")  # seven seconds for the 24 MB
+WAYS = {"bubble": (bubble, {}), "again": (again, {"service": ("--fail", "1:503")}), "no-page": (no_page, {}),
+        "progress": (progress, {"service": PACED}), "progress-retry": (progress, {"service": (*PACED, "--fail", "1:503")}),
+        "progress-result": (progress, {"service": (*PACED, "--fail", "1:503")})}
