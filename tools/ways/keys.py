@@ -198,7 +198,7 @@ def reader(tour):
     def popup():
         person.click("large.bin")
         person.click("Done", "Elm_Button")
-        person.sees("Stop uploads")
+        person.sees("Stop 1 upload?")
         told = hears(("push button", "Stop"), ("push button", "Cancel"))
         person.click("Stop", "Elm_Button")
         person.leave()

@@ -106,7 +106,7 @@ def remove(tour):
 
     def stop():
         person.click("Done", "Elm_Button")
-        person.sees("Stop uploads", "Stop")
+        person.sees("Stop 3 uploads?", "Stop")
 
     def stopped():
         person.click("Stop", "Elm_Button")

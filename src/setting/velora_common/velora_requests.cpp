@@ -119,10 +119,23 @@ void _velora_request_answer(AppData *ad, int number, app_control_result_e result
     __answer(ad, std::move(request), result);
 }
 
+// The application may be at work on the request that it leaves over.
+static void __exit_job(void *data)
+{
+    if (_velora_pages_are_empty()) // another request may have come meanwhile
+        _velora_app_exit(static_cast<AppData *>(data));
+}
+
+static void __exit_over_pages_job(void *data)
+{
+    if (!_velora_pages_have_files())
+        _velora_app_exit(static_cast<AppData *>(data));
+}
+
 void _velora_request_finish(AppData *ad, int number)
 {
     if (_velora_pages_are_empty())
-        _velora_app_exit(ad);
+        ecore_job_add(__exit_job, ad);
     else
         _velora_request_answer(ad, number, APP_CONTROL_RESULT_SUCCEEDED);
 }
@@ -130,7 +143,7 @@ void _velora_request_finish(AppData *ad, int number)
 void _velora_requests_finish_held(AppData *ad)
 {
     if (!_velora_pages_have_files()) {
-        _velora_app_exit(ad);
+        ecore_job_add(__exit_over_pages_job, ad);
         return;
     }
     while (true) {

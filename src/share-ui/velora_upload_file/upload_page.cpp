@@ -96,7 +96,7 @@ void __page_create(UploadViewData *vd, Elm_Naviframe_Item_Pop_Cb back, Evas_Smar
     elm_object_style_set(button, "naviframe/end_btn/default");
     // Drawn as a sign; the words are for the screen reader.
     elm_object_domain_translatable_text_set(button, VELORA_SHARE_DOMAIN, "IDS_VELORA_BODY_BACK");
-    vd->nf_item = elm_naviframe_item_push(nf, s_title, button, nullptr, vd->layout, nullptr);
+    vd->nf_item = elm_naviframe_item_push(nf, __text(s_title), button, nullptr, vd->layout, nullptr);
     __title_set(vd, s_title);
     elm_naviframe_item_pop_cb_set(vd->nf_item, back, vd);
     evas_object_smart_callback_add(nf, "elm,action,more_event", more, vd);

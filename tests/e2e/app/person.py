@@ -12,8 +12,9 @@ from device import Device, Trouble, wait_for  # noqa: E402
 FOLDER = "/Photos"
 PACKAGE = "com.orvant.velora-share"
 # What EFL, the compiler's run-time checks and the C library print when something is wrong in a program.
-# Not EFL's regret that the last widget of a window that could have the focus goes.
-FAULTS = re.compile(r"^(?:(?:ERR|CRI)<\d+>(?!.*Could not fetch a node located).*|.*AddressSanitizer.*|.*LeakSanitizer.*|.*ThreadSanitizer.*|.*runtime error:.*"
+# Not EFL's regret that the last widget of a window that could have the focus goes, nor that Edje keeps the parts of
+# themes that are gone in its list of those that follow a size class.
+FAULTS = re.compile(r"^(?:(?:ERR|CRI)<\d+>(?!.*Could not fetch a node located|.*efl_observer_update\(\)).*|.*AddressSanitizer.*|.*LeakSanitizer.*|.*ThreadSanitizer.*|.*runtime error:.*"
                     r"|.*CRITICAL \*\*.*|free\(\).*|malloc.*corrupt.*|terminate called.*)$", re.M)
 
 
