@@ -1,6 +1,7 @@
 // Single files of a service: cached, downloaded, streamed, and their thumbnails.
 #include "backend.h"
 #include "cloud.h"
+#include "cloud_content_sync/account.h"
 #include <atomic>
 #include <gdk-pixbuf/gdk-pixbuf.h>
 #include <sys/resource.h>
@@ -143,6 +144,34 @@ TEST_P(Files, a_new_token_of_the_same_address_keeps_everything)
                 EXPECT_EQ(again.text, cached.text);
             }
         }
+    }
+}
+
+TEST_P(Files, settings_are_the_accounts_own)
+{
+    constexpr int NO_ACCOUNT = CLOUD_CONTENT_SYNC_ERROR_NO_ACCOUNT;
+    const struct {
+        const char *email, *secret; // null: nobody
+        bool seen;                  // of the images; of the videos it is always the default
+        int set;                    // to false
+        long long number;           // seen before it is set to the row's own
+    } rows[] = {{"a@example.org", "one", true, 0, -1},
+                {"b@example.org", "one", true, 0, -1},
+                {"a@example.org", "two", false, 0, 0},
+                {nullptr, nullptr, true, NO_ACCOUNT, -1},
+                {"b@example.org", "two", false, 0, 1LL << 40}};
+    cloud::Account account(*cloud::service_find("Test"));
+    ASSERT_TRUE(account.open());
+    for (const auto &row : rows) {
+        SCOPED_TRACE(&row - rows);
+        ASSERT_EQ(cloud_content_sync_credentials_set("Test", row.email, nullptr, row.secret), 0);
+        bool images = !row.seen, videos = false;
+        EXPECT_EQ(cloud_content_sync_setting_get_type_activation(handle, CLOUD_CONTENT_TYPE_IMAGE, &images), 0);
+        EXPECT_EQ(cloud_content_sync_setting_get_type_activation(handle, CLOUD_CONTENT_TYPE_VIDEO, &videos), 0);
+        EXPECT_EQ(std::pair(images, videos), std::pair(row.seen, true));
+        EXPECT_EQ(cloud_content_sync_setting_set_type_activation(handle, CLOUD_CONTENT_TYPE_IMAGE, false), row.set);
+        EXPECT_EQ(account.setting("number", -1), row.number);
+        EXPECT_EQ(account.set_setting("number", (&row - rows) << 40), row.set);
     }
 }
 
