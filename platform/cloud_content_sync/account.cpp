@@ -1,5 +1,6 @@
 #include "cloud_content_sync/account.h"
 #include "cloud_content_sync/cache.h"
+#include "cloud_content_sync/cloud_content_sync.h"
 #include "cloud_content_sync/names.h"
 #include <sys/stat.h>
 #include <unordered_set>
@@ -8,6 +9,8 @@ namespace cloud {
 
 static constexpr char SCHEMA[] = R"(
 CREATE TABLE IF NOT EXISTS setting(key TEXT PRIMARY KEY, value TEXT NOT NULL) WITHOUT ROWID;
+CREATE TABLE IF NOT EXISTS account_setting(account TEXT NOT NULL, key TEXT NOT NULL, value INTEGER NOT NULL,
+    PRIMARY KEY(account, key)) WITHOUT ROWID;
 CREATE TABLE IF NOT EXISTS folder(path TEXT PRIMARY KEY, parent TEXT NOT NULL, name TEXT NOT NULL,
     sort TEXT NOT NULL) WITHOUT ROWID;
 CREATE INDEX IF NOT EXISTS folder_order ON folder(parent, sort, name);
@@ -180,18 +183,23 @@ bool Account::clear()
     return writer.run("DELETE FROM folder; DELETE FROM content; DELETE FROM setting WHERE key = 'complete_for'");
 }
 
-bool Account::setting(const std::string &key, bool fallback)
+long long Account::setting(const std::string &key, long long fallback)
 {
     std::scoped_lock lock(reading);
-    Stmt stmt(reader, "SELECT value FROM setting WHERE key = ?");
-    return stmt.bind(1, key).row() ? stmt.integer(0) != 0 : fallback;
+    Stmt stmt(reader, "SELECT value FROM account_setting WHERE account = ? AND key = ?");
+    return stmt.bind(1, identity()).bind(2, key).row() ? stmt.integer(0) : fallback;
 }
 
-bool Account::set_setting(const std::string &key, bool value)
+int Account::set_setting(const std::string &key, long long value)
 {
-    std::scoped_lock lock(writing);
-    Stmt stmt(writer, "INSERT OR REPLACE INTO setting(key, value) VALUES(?, ?)");
-    return stmt.bind(1, key).bind(2, value ? "1" : "0").done();
+    bool is_anybody = true;
+    const bool is_stored = change([&] {
+        const std::string who = identity();
+        is_anybody = !who.empty();
+        Stmt stmt(writer, "INSERT OR REPLACE INTO account_setting(account, key, value) VALUES(?, ?, ?)");
+        return is_anybody && stmt.bind(1, who).bind(2, key).bind(3, value).done();
+    });
+    return !is_anybody ? CLOUD_CONTENT_SYNC_ERROR_NO_ACCOUNT : is_stored ? 0 : CLOUD_CONTENT_SYNC_ERROR_DB_FAILED;
 }
 
 } // namespace cloud

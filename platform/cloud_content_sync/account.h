@@ -59,9 +59,10 @@ class Account {
     // The account (account_identity()) whose whole tree the database holds; empty when there is none.
     std::string complete_for();
 
-    // Stored for the service; `fallback` when nothing is stored.
-    bool setting(const std::string &key, bool fallback);
-    bool set_setting(const std::string &key, bool value);
+    // A setting of the account that is signed in; `fallback` when it has none of that key, or nobody is signed in.
+    long long setting(const std::string &key, long long fallback);
+    // One of cloud_content_sync_error_e: NO_ACCOUNT when nobody is signed in, DB_FAILED.
+    int set_setting(const std::string &key, long long value);
 
   private:
     bool change(const std::function<bool()> &work);

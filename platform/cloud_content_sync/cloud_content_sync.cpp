@@ -78,7 +78,7 @@ int cloud_content_sync_setting_get_type_activation(cloud_content_sync_h handle, 
 {
     if (!handle || !value || !is_one_type(content_type))
         return INVALID;
-    *value = handle->client->account->setting(activation_key(content_type), true);
+    *value = handle->client->account->setting(activation_key(content_type), 1) != 0;
     return DONE;
 }
 
@@ -86,9 +86,7 @@ int cloud_content_sync_setting_set_type_activation(cloud_content_sync_h handle, 
 {
     if (!handle || !is_one_type(content_type))
         return INVALID;
-    return handle->client->account->set_setting(activation_key(content_type), value)
-               ? DONE
-               : CLOUD_CONTENT_SYNC_ERROR_DB_FAILED;
+    return handle->client->account->set_setting(activation_key(content_type), value);
 }
 
 int cloud_content_sync_refresh_meta(cloud_content_sync_h handle, int content_types, cloud_content_sync_refresh_cb cb,

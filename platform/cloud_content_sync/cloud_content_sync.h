@@ -69,8 +69,9 @@ int cloud_content_sync_create(const char *service_name, cloud_content_sync_h *ha
 // unless this is called from within it. Transfers in progress are broken off by closing their connection.
 int cloud_content_sync_destroy(cloud_content_sync_h handle);
 
-// Whether a content type (one of IMAGE, VIDEO, CAMERA) is to be kept in step; kept in the service's database, at first
-// true.
+// Whether a content type (one of IMAGE, VIDEO, CAMERA) is to be kept in step, at first true. It is a setting of the
+// account that is signed in: others do not see it, and it is there again when that account signs in again. With nobody
+// signed in it reads as true, and setting it answers NO_ACCOUNT.
 int cloud_content_sync_setting_get_type_activation(cloud_content_sync_h handle, int content_type, bool *value);
 int cloud_content_sync_setting_set_type_activation(cloud_content_sync_h handle, int content_type, bool value);
 

@@ -42,6 +42,8 @@ class ContentTask {
     void ask_for_address();
     void take_address(const Transfer &transfer, const std::string &answer);
     void finish(int error, const std::string &text, long status);
+    bool begin_last_callback();
+    void tell(int error, const std::string &text, long status);
 
     Client &client;
     const ContentRequest wanted;
@@ -149,9 +151,11 @@ void ContentTask::download()
 
 void ContentTask::store_download()
 {
-    if (!is_free_or_file(wanted.local_path) || !fetch->store(wanted.local_path))
-        return finish(CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE, "", fetch->status);
-    finish(0, wanted.local_path, fetch->status);
+    // From here on it cannot be cancelled: a cancel leaves no file.
+    if (!begin_last_callback())
+        return;
+    const bool is_stored = is_free_or_file(wanted.local_path) && fetch->store(wanted.local_path);
+    tell(is_stored ? 0 : CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE, wanted.local_path, fetch->status);
 }
 
 void ContentTask::ask_for_address()
@@ -208,11 +212,26 @@ void ContentTask::take_address(const Transfer &transfer, const std::string &answ
 
 void ContentTask::finish(int error, const std::string &text, long status)
 {
+    if (begin_last_callback())
+        tell(error, text, status);
+}
+
+// False when nobody is to be told any more.
+bool ContentTask::begin_last_callback()
+{
     ended = true;
+    if (client.begin_callback(wanted.id, true))
+        return true;
     if (fetch)
         fetch->discard();
-    if (!client.begin_callback(wanted.id, true))
-        return client.http.wake();
+    client.http.wake();
+    return false;
+}
+
+void ContentTask::tell(int error, const std::string &text, long status)
+{
+    if (fetch)
+        fetch->discard();
     if (wanted.cb)
         wanted.cb(error ? CLOUD_CONTENT_SYNC_STATE_FAILED : CLOUD_CONTENT_SYNC_STATE_DONE,
                   error ? nullptr : text.c_str(), static_cast<int>(status), error, wanted.user_data);

@@ -5,7 +5,6 @@
 #include <optional>
 
 struct Backend {
-    bool is_real = true;        // a service on the network, with credentials and a description
     Names taboo = {};           // names that it refuses
     std::string media_url = {}; // of the account interface that gives thumbnails, and addresses to stream from
 
@@ -23,6 +22,8 @@ inline constexpr char USER[] = "someone@example.org", PASSWORD[] = "a secret: wi
 // The backends of this program; each is started with an empty tree, its service is called "Test", and somebody is
 // signed in to it. Nothing when it does not start.
 Names backend_names();
+// Those of them that are services on the network, for what the fake does not do.
+Names server_names();
 std::optional<Backend> start_backend(const std::string &name);
 
 // A backend and a client of it.

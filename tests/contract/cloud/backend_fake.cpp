@@ -7,12 +7,16 @@ Names backend_names()
     return {"Fake"};
 }
 
+Names server_names()
+{
+    return {};
+}
+
 std::optional<Backend> start_backend(const std::string &)
 {
     fake_cloud_reset();
     fake_cloud_set_delay(2); // an upload takes long enough to be cancelled in its middle
-    return Backend{.is_real = false,
-                   .make_folder = fake_cloud_add_folder,
+    return Backend{.make_folder = fake_cloud_add_folder,
                    .remove = fake_cloud_remove,
                    .store = fake_cloud_add_file,
                    .content = fake_cloud_content,

@@ -129,6 +129,11 @@ Names backend_names()
     return names;
 }
 
+Names server_names()
+{
+    return backend_names();
+}
+
 std::optional<Backend> start_backend(const std::string &name)
 {
     return name == "VeloraCloud" ? start_velora_cloud() : start_apache();

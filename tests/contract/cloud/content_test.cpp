@@ -1,6 +1,7 @@
 // Single files of a service: cached, downloaded, streamed, and their thumbnails.
 #include "backend.h"
 #include "cloud.h"
+#include "cloud_content_sync/account.h"
 #include <atomic>
 #include <gdk-pixbuf/gdk-pixbuf.h>
 #include <sys/resource.h>
@@ -26,6 +27,10 @@ class Files : public OnBackend {
     }
 };
 INSTANTIATE_TEST_SUITE_P(All, Files, testing::ValuesIn(backend_names()), [](const auto &row) { return row.param; });
+using ServerFiles = Files;
+GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(ServerFiles); // the fake is none
+INSTANTIATE_TEST_SUITE_P(All, ServerFiles, testing::ValuesIn(server_names()),
+                         [](const auto &row) { return row.param; });
 
 TEST_P(Files, files_come_whole_and_the_cache_needs_no_service)
 {
@@ -64,11 +69,6 @@ TEST_P(Files, files_come_whole_and_the_cache_needs_no_service)
         EXPECT_EQ(failed.text, "");
     }
     EXPECT_EQ(names_in(scratch.path).size(), std::size(files));
-    if (!backend->is_real)
-        return;
-    // Nobody else may have them.
-    ASSERT_EQ(cloud_content_sync_credentials_set("Test", nullptr, "other@example.org", "x"), 0);
-    EXPECT_EQ(names_in(data("cache/Test")), Names{});
 }
 
 TEST_P(Files, what_changed_or_is_damaged_is_fetched_again)
@@ -146,10 +146,58 @@ TEST_P(Files, a_new_token_of_the_same_address_keeps_everything)
     }
 }
 
-TEST_P(Files, a_download_replaces_a_file_or_leaves_everything_as_it_was)
+TEST_P(Files, settings_are_the_accounts_own)
 {
-    if (!backend->is_real)
-        return;
+    constexpr int NO_ACCOUNT = CLOUD_CONTENT_SYNC_ERROR_NO_ACCOUNT;
+    const struct {
+        const char *email, *secret; // null: nobody
+        bool seen;                  // of the images; of the videos it is always the default
+        int set;                    // to false
+        long long number;           // seen before it is set to the row's own
+    } rows[] = {{"a@example.org", "one", true, 0, -1},
+                {"b@example.org", "one", true, 0, -1},
+                {"a@example.org", "two", false, 0, 0},
+                {nullptr, nullptr, true, NO_ACCOUNT, -1},
+                {"b@example.org", "two", false, 0, 1LL << 40}};
+    cloud::Account account(*cloud::service_find("Test"));
+    ASSERT_TRUE(account.open());
+    for (const auto &row : rows) {
+        SCOPED_TRACE(&row - rows);
+        ASSERT_EQ(cloud_content_sync_credentials_set("Test", row.email, nullptr, row.secret), 0);
+        bool images = !row.seen, videos = false;
+        EXPECT_EQ(cloud_content_sync_setting_get_type_activation(handle, CLOUD_CONTENT_TYPE_IMAGE, &images), 0);
+        EXPECT_EQ(cloud_content_sync_setting_get_type_activation(handle, CLOUD_CONTENT_TYPE_VIDEO, &videos), 0);
+        EXPECT_EQ(std::pair(images, videos), std::pair(row.seen, true));
+        EXPECT_EQ(cloud_content_sync_setting_set_type_activation(handle, CLOUD_CONTENT_TYPE_IMAGE, false), row.set);
+        EXPECT_EQ(account.setting("number", -1), row.number);
+        EXPECT_EQ(account.set_setting("number", (&row - rows) << 40), row.set);
+    }
+}
+
+// At every moment of a download: after its cancel nothing arrives, unless its last callback has run.
+TEST_P(Files, a_cancelled_download_leaves_nothing)
+{
+    publish("a.jpg", "content");
+    const std::string local = scratch.path + "/a.jpg";
+    int cancelled = 0;
+    for (int i = 0; i < 200; i++) {
+        Watch result;
+        const int id = ask(handle, Kind::DOWNLOAD, "a.jpg", result, local);
+        std::this_thread::sleep_for(std::chrono::microseconds(i * 25));
+        const bool is_cancelled = cloud_content_sync_cancel(handle, id) == 0;
+        // Another request's round trip is more time than a late file or callback would need.
+        Watch next;
+        ASSERT_EQ(fetch(handle, Kind::DOWNLOAD, "a.jpg", next, scratch.path + "/next"), 0);
+        EXPECT_EQ(result.count(), is_cancelled ? 0u : 1u) << i;
+        EXPECT_EQ(fs::exists(local), !is_cancelled) << i;
+        fs::remove(local);
+        cancelled += is_cancelled;
+    }
+    EXPECT_GT(cancelled, 0);
+}
+
+TEST_P(ServerFiles, a_download_replaces_a_file_or_leaves_everything_as_it_was)
+{
     publish("doc.txt", "new");
     publish("large.bin", some_bytes(3 << 20, 1));
     const std::string place = scratch.path + "/";
@@ -187,10 +235,8 @@ TEST_P(Files, a_download_replaces_a_file_or_leaves_everything_as_it_was)
     EXPECT_EQ(read_file(place + "file"), "new");
 }
 
-TEST_P(Files, an_address_opens_one_file)
+TEST_P(ServerFiles, an_address_opens_one_file)
 {
-    if (!backend->is_real)
-        return;
     const std::string bytes = some_bytes(300'000, 1);
     backend->store("/other.mp4", "secret");
     publish("cl?p & 100%.mp4", bytes);
@@ -244,10 +290,8 @@ static std::string picture(int width, int height, const char *encoding, bool cle
     return text;
 }
 
-TEST_P(Files, thumbnails_arrive_and_are_told_of)
+TEST_P(ServerFiles, thumbnails_arrive_and_are_told_of)
 {
-    if (!backend->is_real)
-        return;
     // A bitmap of 8512 x 8000 black points, in 8 MB: too many to be decoded for anybody.
     std::string huge("BM\0\0\0\0\0\0\0\0\x3e\0\0\0\x28\0\0\0\x40\x21\0\0\x40\x1f\0\0\x01\0\x01", 29);
     huge.resize(62 + 1064 * 8000);
@@ -309,7 +353,9 @@ TEST_P(Files, thumbnails_arrive_and_are_told_of)
 
     // Another version is another picture; without a callback it comes as well.
     ASSERT_EQ(cloud_content_sync_set_thumbnail_cb(handle, nullptr, nullptr), 0);
-    publish("small.bmp", picture(10, 20, "bmp"));
+    std::string other = rows[2].bytes; // of the same size
+    other.back() ^= 0x7f;
+    publish("small.bmp", other);
     EXPECT_FALSE(has_thumbnail(handle, "small.bmp"));
     EXPECT_TRUE(comes_true([&] { return has_thumbnail(handle, "small.bmp"); }));
     EXPECT_EQ(arrivals.count(), expected.size());

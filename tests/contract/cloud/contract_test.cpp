@@ -8,6 +8,10 @@
 static constexpr size_t MEGABYTE = 1 << 20;
 using Transfers = OnBackend;
 INSTANTIATE_TEST_SUITE_P(All, Transfers, testing::ValuesIn(backend_names()), [](const auto &row) { return row.param; });
+using ServerTransfers = OnBackend;
+GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(ServerTransfers); // the fake is none
+INSTANTIATE_TEST_SUITE_P(All, ServerTransfers, testing::ValuesIn(server_names()),
+                         [](const auto &row) { return row.param; });
 
 TEST_P(Transfers, refresh_brings_the_whole_tree_with_odd_names)
 {
@@ -233,11 +237,9 @@ TEST_P(Transfers, what_cannot_be_uploaded_is_told_by_the_callback)
     EXPECT_EQ(upload(handle, fine, "/a"), CLOUD_CONTENT_SYNC_ERROR_NETWORK);
 }
 
-TEST_P(Transfers, a_file_that_changes_on_the_way_is_not_kept)
+TEST_P(ServerTransfers, a_file_that_changes_on_the_way_is_not_kept)
 {
     ASSERT_TRUE(open());
-    if (!backend->is_real)
-        return;
     for (const bool grows : {true, false}) {
         const std::string local = scratch.file("changing", some_bytes(20 * MEGABYTE, 1));
         Watch watch;
@@ -255,11 +257,9 @@ TEST_P(Transfers, a_file_that_changes_on_the_way_is_not_kept)
     }
 }
 
-TEST_P(Transfers, credentials_decide)
+TEST_P(ServerTransfers, credentials_decide)
 {
     ASSERT_TRUE(open());
-    if (!backend->is_real)
-        return;
     const std::string local = scratch.file("local", "x");
     ASSERT_EQ(refresh(handle), 0);
     for (const char *user : {static_cast<const char *>("nobody@example.org"), static_cast<const char *>(nullptr)}) {

@@ -82,6 +82,46 @@ TEST_F(ScriptedContent, only_what_is_right_is_taken)
     EXPECT_EQ(sent.authorization, "Bearer token");
 }
 
+// Of files that keep their size, by the service's entity tag, or by its time where it has none.
+TEST_F(ScriptedContent, another_version_of_the_same_size_is_fetched)
+{
+    const auto version = [](const std::string &tag, const std::string &second) {
+        return (tag.empty() ? "" : "<d:getetag>\"" + tag + "\"</d:getetag>") +
+               "<d:getlastmodified>Mon, 12 Jan 2026 10:00:" + second + " GMT</d:getlastmodified>";
+    };
+    const struct {
+        std::string before, after;
+        bool is_fetched;
+    } rows[] = {{version("1", "00"), version("1", "00"), false},
+                {version("1", "00"), version("2", "00"), true},
+                {version("", "00"), version("", "00"), false},
+                {version("", "00"), version("", "01"), true}};
+    for (const auto &row : rows) {
+        std::string now = row.before, bytes = "hello";
+        serve(
+            [&](const Request &request) {
+                if (request.method == "PROPFIND")
+                    return multistatus(folder("/r%20t/") + file("/r%20t/p0.jpg", "5", now));
+                const size_t start = now.find('"'), end = now.find('"', start + 1);
+                return answer("200 OK", bytes,
+                              start == now.npos ? "" : "ETag: " + now.substr(start, end - start + 1) + "\r\n");
+            },
+            30);
+        Watch first, second, arrivals;
+        ASSERT_EQ(cloud_content_sync_set_thumbnail_cb(handle, thumbnail_cb, &arrivals), 0);
+        ASSERT_EQ(refresh(handle), 0);
+        ASSERT_EQ(fetch(handle, Kind::CACHED, "p0.jpg", first), 0);
+        EXPECT_FALSE(has_thumbnail(handle, "p0.jpg"));
+        EXPECT_TRUE(comes_true([&] { return has_thumbnail(handle, "p0.jpg"); }));
+        now = row.after;
+        bytes = "jello";
+        ASSERT_EQ(refresh(handle), 0);
+        EXPECT_EQ(has_thumbnail(handle, "p0.jpg"), !row.is_fetched) << row.after;
+        ASSERT_EQ(fetch(handle, Kind::CACHED, "p0.jpg", second), 0);
+        EXPECT_EQ(read_file(second.text), row.is_fetched ? "jello" : "hello") << row.after;
+    }
+}
+
 TEST_F(ScriptedContent, nothing_calls_back_and_nothing_is_left_after_cancel_or_destroy)
 {
     // Half of the answer, then silence.

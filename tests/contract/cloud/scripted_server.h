@@ -45,6 +45,8 @@ class ScriptedServer {
     ScriptedServer &operator=(const ScriptedServer &) = delete;
 
     std::string url;
+    // Called before the script and without the lock, so that it may wait. To be set before the first request.
+    std::function<void(const Request &)> on_request = [](const Request &) {};
     std::vector<Request> requests()
     {
         std::scoped_lock lock(mutex);
@@ -82,6 +84,7 @@ class ScriptedServer {
         FILE *stream = fdopen(fd, "r");
         Request request{"", "", "", "", number};
         for (bool goes_on = true; goes_on && read_request(stream, request);) {
+            on_request(request);
             std::unique_lock lock(mutex);
             seen.push_back(request);
             std::string answer = script(request);

@@ -1,6 +1,7 @@
 // The client against a service that answers wrongly, incompletely or with ill will.
 #include "cloud_content_sync/names.h"
 #include "scripted_server.h"
+#include <future>
 #include <glib.h>
 
 TEST_F(Scripted, refused_lists_change_nothing)
@@ -71,6 +72,74 @@ TEST_F(Scripted, hrefs_in_every_form)
                                            "d:5",
                                            "gone:0", "huge:0", "slashes:5"}));
     EXPECT_EQ(server->requests().at(0).authorization, "Bearer token");
+}
+
+TEST_F(Scripted, one_folder_that_is_closed_costs_nothing_but_itself)
+{
+    const struct {
+        const char *reply;
+        int error;
+    } rows[] = {{"403 Forbidden", 0}, {"404 Not Found", 0}, {"500 Broken", CLOUD_CONTENT_SYNC_ERROR_SERVER}};
+    const std::string self = folder("/r%20t/");
+    for (const auto &row : rows) {
+        serve([&](const Request &request) {
+            if (request.path == "/r%20t/closed/")
+                return answer(row.reply);
+            return request.path == "/r%20t/" ? multistatus(self + folder("/r%20t/closed/") + folder("/r%20t/open/"))
+                                             : multistatus(folder(request.path) + file(request.path + "in.txt"));
+        });
+        EXPECT_EQ(refresh(handle), row.error) << row.reply;
+        EXPECT_EQ(listing(handle, "/"), row.error ? Names{} : (Names{"closed/", "open/"})) << row.reply;
+        EXPECT_EQ(listing(handle, "/open"), row.error ? Names{"no such folder"} : Names{"in.txt:5"}) << row.reply;
+    }
+}
+
+// While the service is asked for the tree, a file is stored, or somebody else signs in; and while a file is stored.
+TEST_F(Scripted, what_happens_in_the_middle)
+{
+    const std::string local = scratch.file("hello", "hello"), old = multistatus(folder("/r%20t/") + file("/r%20t/old"));
+    const struct {
+        std::string held; // method of the request in whose middle it happens
+        bool is_upload, is_sign_in;
+        int error;
+        Names rows;
+    } cases[] = {
+        {"PROPFIND", true, false, 0, {"new:5", "old:5"}},
+        {"PROPFIND", false, true, CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED, {}},
+        {"PROPFIND", true, true, CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED, {}},
+        {"PUT", false, true, 0, {}},
+    };
+    for (const auto &row : cases) {
+        SCOPED_TRACE(&row - cases);
+        serve(
+            [&](const Request &request) {
+                return request.method == "PUT" ? answer("201 Created", "", HELLO_DIGEST) : old;
+            },
+            30);
+        ASSERT_EQ(cloud_content_sync_credentials_set("Test", "first@example.org", nullptr, "token"), 0);
+        std::promise<void> reached, goes_on;
+        server->on_request = [&](const Request &request) {
+            if (request.method != row.held)
+                return;
+            reached.set_value();
+            goes_on.get_future().wait();
+        };
+        Watch watch;
+        if (row.held == "PUT")
+            start(handle, local, "/new", watch);
+        else
+            cloud_content_sync_refresh_meta(handle, 7, refresh_cb, &watch);
+        reached.get_future().wait();
+        if (row.is_upload) {
+            EXPECT_EQ(upload(handle, local, "/new"), 0);
+        }
+        if (row.is_sign_in) {
+            EXPECT_EQ(cloud_content_sync_credentials_set("Test", "second@example.org", nullptr, "token"), 0);
+        }
+        goes_on.set_value();
+        EXPECT_EQ(watch.end(), row.error);
+        EXPECT_EQ(listing(handle, "/"), row.rows);
+    }
 }
 
 // What becomes of an upload of "hello", by the answers that the service gives to it one after the other.

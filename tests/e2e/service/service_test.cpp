@@ -1,6 +1,9 @@
 // Who may ask, what names and addresses reach, and what stays known about files.
+#include "base/base.h"
 #include "cloud.h"
 #include <csignal>
+#include <ctime>
+#include <glib.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
@@ -221,4 +224,49 @@ TEST(Service, KnowsDigests)
     fs::last_write_time(file, time);
     EXPECT_EQ(cloud.ask("GET", "/dav/four").header("repr-digest"), "");
     EXPECT_EQ(count_of(properties("/dav/four"), ABC_HEX), 0u);
+}
+
+TEST(Service, AnAddressExpires)
+{
+    Cloud cloud;
+    cloud.ask("PUT", "/dav/clip.mp4", {}, "abc");
+    const std::string json = cloud.ask("POST", "/1/media", {}, "{\"path\":\"/clip.mp4\",\"minutes\":1}").body;
+    const size_t begin = json.find("/1/media"), end = json.find('"', begin);
+    const std::string url = cloud.url + json.substr(begin, end - begin);
+    // The service's own key, for an address of which the minute is over.
+    Db db;
+    ASSERT_TRUE(db.open(cloud.root / "velora-cloud.db", nullptr));
+    Stmt secret(db, "SELECT value FROM secrets WHERE name = 'media'");
+    ASSERT_TRUE(secret.row());
+    const std::string key = secret.text(0), field = "&expires=", base = url.substr(0, url.find(field));
+    const std::string account = base.substr(base.rfind('=') + 1);
+    const auto address = [&](long long expires) {
+        const std::string text = account + "\n" + std::to_string(expires) + "\nclip.mp4";
+        g_autofree char *signature =
+            g_compute_hmac_for_string(G_CHECKSUM_SHA256, reinterpret_cast<const guchar *>(key.data()), key.size(),
+                                      text.data(), static_cast<gssize>(text.size()));
+        return base + field + std::to_string(expires) + "&signature=" + signature;
+    };
+    EXPECT_EQ(address(std::stoll(url.substr(base.size() + field.size()))), url);
+    EXPECT_EQ(ask_url("GET", address(time(nullptr) + 30)).status, 200);
+    EXPECT_EQ(ask_url("GET", address(time(nullptr) - 1)).status, 403);
+}
+
+TEST(Service, ALockGoesWithItsFile)
+{
+    Cloud cloud;
+    cloud.ask("MKCOL", "/dav/d/");
+    const std::string body = "<lockinfo xmlns='DAV:'><lockscope><exclusive/></lockscope><locktype><write/></locktype>"
+                             "</lockinfo>";
+    for (const std::string removed : {"/dav/d/f", "/dav/d/"}) {
+        cloud.ask("MKCOL", "/dav/d/");
+        cloud.ask("PUT", "/dav/d/f", {}, "x");
+        const std::string token = cloud.ask("LOCK", "/dav/d/f", {"Timeout: Second-600"}, body).header("lock-token");
+        ASSERT_NE(token, "");
+        EXPECT_EQ(cloud.ask("PUT", "/dav/d/f", {}, "y").status, 423);
+        EXPECT_EQ(cloud.ask("DELETE", removed).status, 423);
+        EXPECT_EQ(cloud.ask("DELETE", removed, {"If: <" + cloud.url + "/dav/d/f> (" + token + ")"}).status, 204);
+        cloud.ask("MKCOL", "/dav/d/");
+        EXPECT_EQ(cloud.ask("PUT", "/dav/d/f", {}, "y").status, 201) << removed;
+    }
 }

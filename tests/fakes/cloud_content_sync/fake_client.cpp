@@ -282,10 +282,10 @@ static void run_content(Client &client, const ContentRequest &request)
     lock.unlock();
     if (request.kind == ContentRequest::STREAMING_ADDRESS)
         text = "https://media.example.org" + percent_encode(path);
-    else if (!error && !write_file(text, content))
-        error = CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE;
     if (!client.begin_callback(request.id, true))
         return;
+    if (request.kind != ContentRequest::STREAMING_ADDRESS && !error && !write_file(text, content))
+        error = CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE;
     lock.lock();
     if (is_cached && !error)
         fake().cached[path] = content;
