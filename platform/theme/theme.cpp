@@ -2,7 +2,9 @@
 #include <Edje.h>
 #include <Elementary.h>
 #include <algorithm>
+#include <climits>
 #include <cstring>
+#include <string>
 
 namespace {
 
@@ -16,6 +18,7 @@ constexpr int widest_dialog = 600, widest_dialog_of_large_text = 760;
 constexpr int narrowest_dialog = 160;
 constexpr int room_for_two = 480, room_for_three = 590; // buttons beside each other
 constexpr int plain_text = 26;                          // the size of "ui.body" that these widths are for
+constexpr int narrow = 480, narrowest = 320; // letters can be twice as large in the first, not larger in the other
 
 // Whether the buttons of a dialog stand beside each other, as the spacers of the theme take it.
 void buttons_beside(const char *size_class, bool beside)
@@ -40,6 +43,31 @@ void measure_again(Evas_Object *object)
     eina_list_free(members);
 }
 
+struct Letters {
+    const char *text_class;
+    int plain;      // the size that the palette gives
+    int wanted = 0; // what the program has set, or nothing
+    int given = 0;  // what this file has made of it
+} letters[] = {{"ui.title", 30}, {"ui.body", 26}, {"ui.caption", 22}};
+
+// Large letters in a narrow window leave a row two of them: they grow less there.
+void bound_letters(int width)
+{
+    for (Letters &one : letters) {
+        const char *font = nullptr;
+        Evas_Font_Size now = 0;
+        if (!edje_text_class_get(one.text_class, &font, &now) || !font || now <= 0)
+            continue;
+        if (now != one.given)
+            one.wanted = now;
+        const int more = one.plain * std::max(width - narrowest, 0) / (narrow - narrowest);
+        const int most = width < narrow ? one.plain + more : INT_MAX;
+        one.given = std::min(one.wanted, most);
+        if (one.given != now)
+            edje_text_class_set(one.text_class, std::string(font).c_str(), one.given);
+    }
+}
+
 void fit_to_window(void *, Evas *, Evas_Object *win, void *)
 {
     int width = 0;
@@ -47,6 +75,7 @@ void fit_to_window(void *, Evas *, Evas_Object *win, void *)
     const double scale = elm_config_scale_get() * elm_object_scale_get(win) / theme_scale;
     if (width <= 1 || scale <= 0)
         return;
+    bound_letters(int(width / scale));
     const char *font = nullptr;
     Evas_Font_Size size = plain_text;
     edje_text_class_get("ui.body", &font, &size);
@@ -57,7 +86,7 @@ void fit_to_window(void *, Evas *, Evas_Object *win, void *)
     buttons_beside("ui.dialog.beside.2", dialog >= room_for_two);
     buttons_beside("ui.dialog.beside.3", dialog >= room_for_three);
     edje_size_class_set("ui.dialog.card", 0, 0, dialog + card_edges, 99999);
-    edje_size_class_set("ui.dialog.text", dialog - text_margins, 0, -1, -1);
+    edje_size_class_set("ui.dialog.text", dialog - text_margins, 0, dialog - text_margins, -1);
     for (Evas_Object *object = evas_object_bottom_get(evas_object_evas_get(win)); object;
          object = evas_object_above_get(object))
         measure_again(object);
