@@ -98,6 +98,7 @@ Evas_Object *_velora_common_with_title_btn_popup(Evas_Object *parent, const char
     }
     Evas_Object *popup = elm_popup_add(parent);
     elm_popup_align_set(popup, ELM_NOTIFY_ALIGN_FILL, 1.0);
+    elm_popup_scrollable_set(popup, EINA_TRUE); // long words in a low window
     __expand(popup);
     elm_object_text_set(popup, text);
     elm_object_part_text_set(popup, "title,text", title);
