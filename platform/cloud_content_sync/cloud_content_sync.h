@@ -125,11 +125,17 @@ typedef void (*cloud_content_sync_thumbnail_cb)(const char *server_path, void *u
 int cloud_content_sync_set_thumbnail_cb(cloud_content_sync_h handle, cloud_content_sync_thumbnail_cb cb,
                                         void *user_data);
 
+// The name to try when `name` (not empty) is taken: a counter before the last dot, or one more than the counter that is
+// there: what stands in parentheses at the end of that part and begins with a number of 1 or more ("a.jpg" gives
+// "a(1).jpg", "a(2 b).jpg" gives "a(3).jpg", "a(0)" gives "a(0)(1)"). At most 255 bytes, shortened by whole characters.
+// *next is the caller's to free().
+int cloud_content_sync_name_get_next(const char *name, char **next);
+
 // Stores a local file at server_path, whose folder must exist. Returns at once; *req_id (above 0) is written before the
 // first callback. Uploads of one handle run one after the other, in the order in which they were asked for.
 //
-// Nothing is ever overwritten: when the name is taken, by a file or a folder, the next free one is used ("a.jpg",
-// "a(1).jpg", "a(2).jpg"; "README", "README(1)"). DONE means that the service holds a file of the same size and
+// Nothing is ever overwritten: when the name is taken, by a file or a folder, the next free one is used, as
+// cloud_content_sync_name_get_next has it. DONE means that the service holds a file of the same size and
 // SHA-256; a service that offers no digests has the file read back. An answer that is lost is settled by looking, not
 // by sending again; one more attempt follows when nothing is there. The file is in the database before the last
 // callback.

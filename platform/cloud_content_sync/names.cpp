@@ -2,12 +2,14 @@
 #include "cloud_content_sync/cloud_content_sync.h"
 #include <algorithm>
 #include <array>
+#include <cstdint>
+#include <cstdlib>
+#include <cstring>
 #include <glib.h>
 
 namespace cloud {
 
 static constexpr size_t NAME_BYTES_MAX = 255;
-static constexpr size_t COUNTER_DIGITS_MAX = 9; // a longer number is part of the name, not a counter
 
 bool name_is_valid(std::string_view name)
 {
@@ -107,26 +109,36 @@ static size_t utf8_boundary(const std::string &text, size_t size)
     return std::min(size, text.size());
 }
 
+// A base such as "photo(3)" with a counter of 1 or more: its stem, and the counter. 0 when it has none.
+static long counter_of(const std::string &base, std::string &stem)
+{
+    if (base.empty() || base.back() != ')')
+        return 0;
+    const size_t open = base.rfind('(', base.size() - 1);
+    if (open == base.npos)
+        return 0;
+    const long counter = std::strtol(base.c_str() + open + 1, nullptr, 10);
+    if (counter < 1 || counter >= INT32_MAX) // the next number must be one that can be written
+        return 0;
+    stem = base.substr(0, open);
+    return counter;
+}
+
 std::string next_free_name(const std::string &name)
 {
     const size_t dot = name.rfind('.');
     // An "extension" that fills the name is none: there would be no room for the counter.
     const bool has_extension = dot != name.npos && name.size() - dot < NAME_BYTES_MAX / 2;
-    std::string base = has_extension ? name.substr(0, dot) : name;
+    std::string head = has_extension ? name.substr(0, dot) : name;
     const std::string extension = has_extension ? name.substr(dot) : "";
-    long counter = 1;
-    if (const size_t open = base.rfind('('); open != base.npos && base.back() == ')') {
-        const std::string digits = base.substr(open + 1, base.size() - open - 2);
-        if (!digits.empty() && digits.size() <= COUNTER_DIGITS_MAX &&
-            digits.find_first_not_of("0123456789") == digits.npos && std::stol(digits) >= 1) {
-            counter = std::stol(digits) + 1;
-            base.resize(open);
-        }
-    }
-    const std::string tail = "(" + std::to_string(counter) + ")" + extension;
-    if (base.size() + tail.size() > NAME_BYTES_MAX)
-        base.resize(utf8_boundary(base, NAME_BYTES_MAX - tail.size()));
-    return base + tail;
+    std::string stem;
+    const long counter = counter_of(head, stem);
+    if (counter)
+        head = stem;
+    const std::string tail = "(" + std::to_string(counter + 1) + ")" + extension;
+    if (head.size() + tail.size() > NAME_BYTES_MAX)
+        head.resize(utf8_boundary(head, NAME_BYTES_MAX - tail.size()));
+    return head + tail;
 }
 
 int content_type_of(const std::string &name)
@@ -170,3 +182,13 @@ std::string sort_key(const std::string &name)
 }
 
 } // namespace cloud
+
+int cloud_content_sync_name_get_next(const char *name, char **next)
+{
+    if (!name || !*name || !next)
+        return CLOUD_CONTENT_SYNC_ERROR_INVALID_PARAMETER;
+    *next = strdup(cloud::next_free_name(name).c_str());
+    if (!*next)
+        std::abort();
+    return CLOUD_CONTENT_SYNC_ERROR_NONE;
+}

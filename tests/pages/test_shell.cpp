@@ -23,7 +23,6 @@ AppData *app; // the application's one record
 int page_ends, page_abandons;
 char pages[16]; // stand for pages by their addresses
 
-
 void page_opened(const char *page, AppData *ad)
 {
     app = ad;
@@ -265,5 +264,4 @@ TEST_F(Shell, PauseAndTerminateTidyUp)
         EXPECT_EQ(app->noti_priv_id, -1);
         EXPECT_TRUE(read_posted(nullptr).empty());
     }
-    
 }

@@ -3,6 +3,7 @@
 #include <Ecore_File.h>
 #include <cstdlib>
 #include <cstring>
+#include <utility>
 
 // The last dot of the name's last component, or null.
 static const char *__find_last_dot(const char *name)
@@ -25,50 +26,6 @@ char *__get_file_ext_name(const char *name)
     }
     const char *dot = __find_last_dot(name);
     return dot ? g_strdup(dot + 1) : nullptr;
-}
-
-char *__get_file_base_name(const char *name)
-{
-    if (!name) {
-        VELORA_LOGE("Invalid argument");
-        return nullptr;
-    }
-    const char *dot = __find_last_dot(name);
-    return dot ? g_strndup(name, static_cast<gsize>(dot - name)) : nullptr;
-}
-
-// A base such as "photo(3)" with a counter of 1 or more: its stem, and the counter. 0 when it has none.
-static long __get_counter(const std::string &base, std::string *stem)
-{
-    if (base.empty() || base.back() != ')')
-        return 0;
-    const size_t open = base.rfind('(', base.size() - 1);
-    if (open == std::string::npos)
-        return 0;
-    const long counter = std::strtol(base.c_str() + open + 1, nullptr, 10);
-    if (counter < 1 || counter >= INT32_MAX) // the next number must be one that can be written
-        return 0;
-    *stem = base.substr(0, open);
-    return counter;
-}
-
-// The name that follows `base`.`ext`; a name without a dot has no ext and keeps none.
-static char *__check_file_name_postfix(const char *base, const char *ext)
-{
-    std::string stem;
-    const long counter = __get_counter(base, &stem);
-    const std::string tail = ext ? std::string(".") + ext : std::string();
-    std::string head = counter ? stem : std::string(base);
-    const std::string number = "(" + std::to_string(counter + 1) + ")";
-    // No file system takes more than 255 bytes: the head gives way, by whole characters.
-    constexpr size_t most = 255;
-    while (head.size() + number.size() + tail.size() > most && !head.empty()) {
-        size_t cut = head.size() - 1;
-        while (cut > 0 && (static_cast<unsigned char>(head[cut]) & 0xC0) == 0x80)
-            cut--;
-        head.resize(cut);
-    }
-    return g_strdup((head + number + tail).c_str());
 }
 
 static bool __check_same_file_cb(cloud_content_sync_content_h content, int error, void *data)
@@ -98,19 +55,16 @@ TakenNames::TakenNames(cloud_content_sync_folder_h folder)
 
 char *__get_server_path(const TakenNames &taken, const char *folder_path, const char *local_path)
 {
-    char *name = g_strdup(ecore_file_file_get(local_path));
+    char *name = strdup(ecore_file_file_get(local_path));
     while (taken.contains(name)) {
-        char *base = __get_file_base_name(name);
-        char *ext = __get_file_ext_name(name);
-        char *next = __check_file_name_postfix(base ? base : name, base ? ext : nullptr);
-        g_free(base);
-        g_free(ext);
-        g_free(name);
-        name = next;
+        char *next = nullptr; // by the rule that the client itself uses when a name is taken in the last moment
+        cloud_content_sync_name_get_next(name, &next);
+        std::swap(name, next);
+        std::free(next);
     }
     const char *folder = folder_path ? folder_path : "/";
     char *destination = g_strdup_printf(std::strcmp(folder, "/") == 0 ? "%s%s" : "%s/%s", folder, name);
-    g_free(name);
+    std::free(name);
     return destination;
 }
 

@@ -24,5 +24,4 @@ char *__get_upload_server_path(UploadViewData *vd, const char *local_path);
 // The same for any folder whose names are known.
 char *__get_server_path(const TakenNames &taken, const char *folder_path, const char *local_path);
 
-char *__get_file_base_name(const char *name); // null when the name has no dot
-char *__get_file_ext_name(const char *name);  // null when the name has no dot
+char *__get_file_ext_name(const char *name); // null when the name has no dot
