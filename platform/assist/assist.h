@@ -22,8 +22,19 @@ void ea_object_event_callback_add(Evas_Object *obj, ea_callback_type_e type, ea_
 void *ea_object_event_callback_del(Evas_Object *obj, ea_callback_type_e type, ea_event_cb func);
 
 // Tells that the window's widgets carry texts for a screen reader. When the desktop says that one is on
-// (org.a11y.Status.ScreenReaderEnabled on the session bus), the window is offered to it over AT-SPI.
+// (org.a11y.Status.ScreenReaderEnabled on the session bus), now or later, the window is offered to it over AT-SPI.
+// Asking takes a second at most.
 void ea_screen_reader_support_set(Evas_Object *win, bool supported);
+
+// Whether the desktop says that a screen reader is on. False before the first window that supports one.
+bool ea_screen_reader_is_on();
+
+// Has a widget that appears, a popup say, read out as a notification with `text` (plain, copied) as its name, and emits
+// the smart event "access,read,stop" on it, with null as its event_info, once the text was read. AT-SPI does not tell
+// an application when speech ends: the event comes after the time that the text takes a slow voice, 2 seconds and 0.1
+// for each letter (0.4 for a wide one), and at least 6, also when no reader is on. It does not come when the widget
+// goes before; a second call takes the place of the first. Null `widget` or `text`: no effect.
+void ea_screen_reader_read(Evas_Object *widget, const char *text);
 
 // What a screen reader says of a widget in place of the text that it shows. `name` is plain text and copied. Null
 // `widget` or `name`: no effect.

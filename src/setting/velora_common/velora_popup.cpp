@@ -141,8 +141,12 @@ Evas_Object *_velora_common_create_one_text_popup_with_timer(Evas_Object *parent
     __expand(popup);
     elm_object_domain_translatable_text_set(
         popup, VELORA_DOMAIN, "IDS_CLOUD_BODY_WI_FI_CONNECTION_REQUIRED_CONNECT_TO_WI_FI_NETWORK_AND_TRY_AGAIN");
-    if (elm_config_access_get()) {
+    if (ea_screen_reader_is_on()) {
         evas_object_smart_callback_add(popup, "access,read,stop", __popup_del_by_timeout, ad);
+        ea_screen_reader_read(
+            popup,
+            dcgettext(VELORA_DOMAIN, "IDS_CLOUD_BODY_WI_FI_CONNECTION_REQUIRED_CONNECT_TO_WI_FI_NETWORK_AND_TRY_AGAIN",
+                      LC_MESSAGES));
     } else {
         elm_popup_timeout_set(popup, 3.0);
         evas_object_smart_callback_add(popup, "timeout", __popup_del_by_timeout, ad);
