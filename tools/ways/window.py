@@ -4,14 +4,15 @@ from ways.steps import SLOW, check, wait_for
 
 
 def resize(person, width, height):
-    """Gives the window a size, and comes back when it has it and its place: (x, y, width, height)."""
+    """Puts the window into the screen's corner, where its coordinates are the screen's, in a size: (0, 0, width, height)."""
     window = person.run("xdotool", "search", "--onlyvisible", "--name", "^velora$").split()[-1]
     person.run("xdotool", "windowsize", "--sync", window, str(width), str(height))
+    person.run("xdotool", "windowmove", window, "0", "0")
 
     def place():
         words = person.run("xdotool", "getwindowgeometry", "--shell", window)
         box = {key: int(value) for key, value in (line.split("=") for line in words.split())}
-        return (box["X"], box["Y"], width, height) if (box["WIDTH"], box["HEIGHT"]) == (width, height) else None
+        return (0, 0, width, height) if (box["WIDTH"], box["HEIGHT"]) == (width, height) else None
     return wait_for("the window's size", place)
 
 

@@ -1,6 +1,8 @@
 #include "velora_common/velora_popup.h"
 #include "velora_common/velora_log.h"
 #include "velora_common/velora_paths.h"
+#include <clocale>
+#include <libintl.h>
 
 static void __popup_mouse_up_cb(void *data, Evas *, Evas_Object *, void *event_info)
 {

@@ -136,6 +136,12 @@ static Evas_Object *__ud_genlist_uploading_content_get(void *data, Evas_Object *
     return __is_part(part, "elm.swallow.progressbar") ? __progress_create(obj, record) : nullptr;
 }
 
+// The style is that of any row with a second line; this one's is about a failure.
+static Eina_Bool __failed_state_get(void *, Evas_Object *, const char *part)
+{
+    return __is_part(part, "failed");
+}
+
 void __item_classes_create(UploadViewData *vd)
 {
     vd->itc_dir = __item_class_create("1line", __ud_genlist_dir_text_get, __dir_content_get);
@@ -143,6 +149,7 @@ void __item_classes_create(UploadViewData *vd)
     vd->itc_uploading =
         __item_class_create("2line.velora", __ud_genlist_uploading_text_get, __ud_genlist_uploading_content_get);
     vd->itc_fail = __item_class_create("2line.top", __ud_genlist_file_text_get, __ud_genlist_file_content_get);
+    vd->itc_fail->func.state_get = __failed_state_get;
 }
 
 void __item_classes_free(UploadViewData *vd)

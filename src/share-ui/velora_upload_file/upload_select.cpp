@@ -248,7 +248,7 @@ static void __btn_delete_cb(void *data, Evas_Object *, void *)
     Evas_Object *popup = _velora_common_with_title_btn_popup(
         vd->ad->win_main, title, __text("IDS_KQ_POP_THE_UPLOAD_WILL_STOP_BUT_THE_FILE_WILL_NOT_BE_DELETED"),
         __stop_popup_cancel_cb, __btn_stop_cb, __text("IDS_CLOUD_SK2_CANCEL"), __text("IDS_KQ_BUTTON_STOP_ABB2"), vd);
-    elm_object_signal_emit(elm_object_part_content_get(popup, "button2"), "platform,button,destructive", "platform");
+    elm_layout_signal_emit(elm_object_part_content_get(popup, "button2"), "platform,button,destructive", "platform");
     _velora_popup_show(vd->ad, {vd, s_topic}, popup, __stop_popup_replaced_cb, vd);
 }
 
