@@ -2,7 +2,8 @@
 """Checks who includes whom: main -> pages -> velora_common -> platform, and never the other way.
 
 platform/ and service/ know nothing of src/. A page knows velora_common, the platform and, of another page, only a header of
-at most 20 lines: the one that declares its constructor. Prints one line per fault; exits 1 when there is one.
+at most 20 lines: the one that declares its constructor. The files of the upload view know only those that stand before
+them in UPLOAD_VIEW, which ARCHITECTURE.md draws. Prints one line per fault; exits 1 when there is one.
 Usage: tools/layers.py [ROOT]
 """
 import pathlib
@@ -11,6 +12,23 @@ import subprocess
 import sys
 
 SHORT_HEADER = 20
+# The files of the upload view without "upload_" and ending, from the bottom up: each knows those of earlier lines alone.
+UPLOAD_VIEW = (
+    "notification run text waiting",
+    "record worker",
+    "names page path_bar row state",
+    "meta progress thumbnails types",
+    "cancel icon open",
+    "browser select",
+    "keys menu",
+    "list start",
+    "retry",
+    "queue",
+    "result share",
+    "messages",
+    "view",
+)
+UPLOAD_RANK = {name: rank for rank, names in enumerate(UPLOAD_VIEW) for name in names.split()}
 SOURCES = ("platform/**.h", "platform/**.cpp", "service/**.h", "service/**.cpp", "src/**.h", "src/**.cpp")
 
 
@@ -33,6 +51,19 @@ def allowed(source, target, lines):
     if target == "common" or (source == "main" and target.startswith("src/")):
         return True
     return target.startswith("src/") and lines <= SHORT_HEADER
+
+
+def upload_rank(path):
+    """Where a file of the upload view stands; None for other files. A file that stands nowhere is above all."""
+    match = re.fullmatch(r"src/share-ui/velora_upload_file/(?:velora_)?upload_(\w+)\.(?:h|cpp)", str(path))
+    return UPLOAD_RANK.get(match[1], len(UPLOAD_VIEW)) if match else None
+
+
+def in_order(source, target):
+    """Whether a file may include a header as far as the order within the upload view goes."""
+    above, below = upload_rank(source), upload_rank(target)
+    own = re.sub(r"\.\w+$", "", target.name).removeprefix("velora_") == source.stem
+    return above is None or below is None or own or below < above
 
 
 def resolve(root, including, name, headers):
@@ -62,7 +93,7 @@ def main():
             includes += 1
             targets = resolve(root, path, match[1] or match[2], headers)
             # Where a name fits several headers, the compiler may take any of them: one that is allowed will do.
-            if targets and not any(
+            if targets and not any(in_order(path, target) and
                     allowed(layer_of(path), layer_of(target), len((root / target).read_text().splitlines()))
                     for target in targets):
                 print(f"{path}:{number}: must not include {targets[0]}")
