@@ -1,6 +1,7 @@
 #include "velora_upload_file/upload_progress.h"
 #include "velora_upload_file/upload_page.h"
 #include "velora_upload_file/upload_row.h"
+#include "velora_upload_file/upload_state.h"
 #include "velora_upload_file/upload_text.h"
 #include "velora_upload_file/upload_waiting.h"
 #include <algorithm>
@@ -61,12 +62,17 @@ static void __show_end(UploadViewData *vd)
 
 void __progress_line_update(UploadViewData *vd)
 {
+    // What is wrong, and what is being chosen, has the room of a low window to itself.
+    const ViewState state = __state_shown(vd);
+    const bool is_trouble = state == VIEW_STATE_OFFLINE || state == VIEW_STATE_ERROR || state == VIEW_STATE_SIGNED_OUT;
     switch (vd->phase) {
     case PHASE_BROWSING:
-        __info_set(vd, __waiting_words().c_str());
+        __info_set(vd, is_trouble ? nullptr : __waiting_words().c_str());
         break;
     case PHASE_UPLOADING:
-        if (vd->run)
+        if (vd->is_select_mode)
+            __info_set(vd, nullptr);
+        else if (vd->run)
             __show_run(vd);
         break;
     case PHASE_ENDED:

@@ -5,6 +5,7 @@
 #include "velora_common/velora_popup.h"
 #include "velora_upload_file/upload_cancel.h"
 #include "velora_upload_file/upload_page.h"
+#include "velora_upload_file/upload_progress.h"
 #include "velora_upload_file/upload_row.h"
 #include "velora_upload_file/upload_text.h"
 #include <cstdio>
@@ -163,6 +164,7 @@ void __remove_all_selete_item(UploadViewData *vd)
     __select_all_set(false);
     __select_all_list_delete(vd);
     __rows_refresh(vd);
+    __progress_line_update(vd);
 }
 
 void __selection_cancel(UploadViewData *vd)
@@ -269,6 +271,7 @@ void __ctx_delete_cb(void *data, Evas_Object *, void *)
     if (vd->is_select_mode || vd->phase != PHASE_UPLOADING)
         return;
     vd->is_select_mode = true;
+    __progress_line_update(vd);
     __select_all_list_create(vd);
     __title_buttons_create(vd, __btn_delete_cancel_cb, __btn_delete_cb);
     if (s_is_select_all)
