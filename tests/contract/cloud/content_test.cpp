@@ -102,6 +102,16 @@ TEST_P(Files, what_changed_or_is_damaged_is_fetched_again)
         EXPECT_EQ(read_file(grown.text), "larger than before");
         EXPECT_EQ(grown.status, i == 0 ? 200 : 0) << "asked again for what is known";
     }
+    // Of the same size as it was, likewise; the next refresh brings what is known by then.
+    publish("c.jpg", "one");
+    backend->store("/c.jpg", "two");
+    for (int i = 0; i < 2; i++) {
+        Watch changed;
+        ASSERT_EQ(fetch(handle, Kind::CACHED, "c.jpg", changed), 0);
+        EXPECT_EQ(read_file(changed.text), "two");
+        EXPECT_EQ(changed.status, i == 0 ? 200 : 0) << "asked again for what is known";
+        ASSERT_EQ(refresh(handle), 0);
+    }
 }
 
 // What the client keeps belongs to an e-mail address, or to the user or the token where none is known.

@@ -45,8 +45,12 @@ class ScriptedServer {
     ScriptedServer &operator=(const ScriptedServer &) = delete;
 
     std::string url;
-    // Called before the script and without the lock, so that it may wait. To be set before the first request.
-    std::function<void(const Request &)> on_request = [](const Request &) {};
+    // Called before the script and without the lock, so that it may wait.
+    void set_hook(std::function<void(const Request &)> on_request)
+    {
+        std::scoped_lock lock(mutex);
+        hook = std::move(on_request);
+    }
     std::vector<Request> requests()
     {
         std::scoped_lock lock(mutex);
@@ -84,8 +88,11 @@ class ScriptedServer {
         FILE *stream = fdopen(fd, "r");
         Request request{"", "", "", "", number};
         for (bool goes_on = true; goes_on && read_request(stream, request);) {
-            on_request(request);
             std::unique_lock lock(mutex);
+            const auto before = hook;
+            lock.unlock();
+            before(request);
+            lock.lock();
             seen.push_back(request);
             std::string answer = script(request);
             lock.unlock();
@@ -99,6 +106,7 @@ class ScriptedServer {
 
     std::mutex mutex;
     Script script;
+    std::function<void(const Request &)> hook = [](const Request &) {};
     int listener = -1;
     std::thread acceptor;
     std::vector<std::thread> workers; // the acceptor's until it has ended

@@ -118,12 +118,12 @@ TEST_F(Scripted, what_happens_in_the_middle)
             30);
         ASSERT_EQ(cloud_content_sync_credentials_set("Test", "first@example.org", nullptr, "token"), 0);
         std::promise<void> reached, goes_on;
-        server->on_request = [&](const Request &request) {
+        server->set_hook([&](const Request &request) {
             if (request.method != row.held)
                 return;
             reached.set_value();
             goes_on.get_future().wait();
-        };
+        });
         Watch watch;
         if (row.held == "PUT")
             start(handle, local, "/new", watch);
