@@ -15,7 +15,7 @@ import time
 
 from person import FOLDER, Person, check, wait_for
 
-GONE = "Upload failed · File not readable"
+GONE = "Upload failed · File not readable · Tap to try again"
 
 
 def hostile_names(person):
