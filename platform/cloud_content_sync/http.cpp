@@ -1,5 +1,4 @@
 #include "cloud_content_sync/http.h"
-#include "cloud_content_sync/cloud_content_sync.h"
 #include "cloud_content_sync/names.h"
 #include <algorithm>
 #include <cstdlib>
@@ -61,66 +60,6 @@ static size_t header_cb(char *bytes, size_t size, size_t count, void *data)
     take_header(line, "ETag", transfer->etag);
     take_header(line, "Repr-Digest", transfer->repr_digest);
     return size * count;
-}
-
-bool Transfer::never_sent() const
-{
-    switch (result) {
-    case CURLE_COULDNT_RESOLVE_HOST:
-    case CURLE_COULDNT_RESOLVE_PROXY:
-    case CURLE_COULDNT_CONNECT:
-    case CURLE_SSL_CONNECT_ERROR:
-    case CURLE_PEER_FAILED_VERIFICATION:
-    case CURLE_SSL_CACERT_BADFILE:
-    case CURLE_UNSUPPORTED_PROTOCOL:
-    case CURLE_URL_MALFORMAT:
-        return true;
-    default:
-        return false;
-    }
-}
-
-int Transfer::error() const
-{
-    if (result == CURLE_WRITE_ERROR || result == CURLE_WEIRD_SERVER_REPLY || result == CURLE_UNSUPPORTED_PROTOCOL)
-        return CLOUD_CONTENT_SYNC_ERROR_SERVER;
-    if (result != CURLE_OK)
-        return CLOUD_CONTENT_SYNC_ERROR_NETWORK;
-    switch (status) {
-    case 401:
-        return CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED;
-    case 403:
-    case 409:
-    case 423:
-        return CLOUD_CONTENT_SYNC_ERROR_FORBIDDEN;
-    case 400:
-    case 414:
-        return CLOUD_CONTENT_SYNC_ERROR_BAD_NAME;
-    case 507:
-        return CLOUD_CONTENT_SYNC_ERROR_STORAGE_FULL;
-    default:
-        return CLOUD_CONTENT_SYNC_ERROR_SERVER;
-    }
-}
-
-std::string sha256_of(const std::string &repr_digest)
-{
-    static constexpr char START[] = "sha-256=:";
-    const size_t start = repr_digest.find(START);
-    if (start == repr_digest.npos)
-        return "";
-    const size_t begin = start + sizeof START - 1;
-    const size_t end = repr_digest.find(':', begin);
-    if (end == repr_digest.npos)
-        return "";
-    gsize size = 0;
-    g_autofree guchar *bytes = g_base64_decode(repr_digest.substr(begin, end - begin).c_str(), &size);
-    std::string hex;
-    for (gsize i = 0; i < size; i++) {
-        static constexpr char DIGITS[] = "0123456789abcdef";
-        hex.append({DIGITS[bytes[i] >> 4], DIGITS[bytes[i] & 15]});
-    }
-    return hex;
 }
 
 Http::Http(const Service &description) : service(description), multi(nullptr, curl_multi_cleanup)

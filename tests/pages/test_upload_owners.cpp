@@ -139,7 +139,6 @@ TEST_F(Owners, TheEndOfARunIsNotThatOfTheNextOne)
             const int ended = the_run()->number;
             share_from("second", {"b.txt"});
             share_from("third", {"c.txt"});
-            fake_cloud_let_through(1);
             ASSERT_TRUE(wait_for([] { return states()[0] == UPLOAD_STATE_UPLOADING; }));
             ASSERT_TRUE(c.cancel());
             fake_cloud_hold(false);
@@ -171,7 +170,7 @@ TEST_F(Owners, AFullStorageDoesNotDropWhatWaits)
         share_from("late", {"late.txt"});
         fake_cloud_hold(false);
         ASSERT_TRUE(wait_for(is_browsing));
-        EXPECT_TRUE(log.has("Unable to upload, not enough memory"));
+        EXPECT_TRUE(wait_for([&] { return log.has("Unable to upload, not enough memory"); }));
         EXPECT_EQ(notifications(), Texts{"2 files: Upload failed fail:"});
         ASSERT_TRUE(press_done());
         ASSERT_TRUE(wait_for(is_over));
@@ -193,7 +192,7 @@ TEST_F(Owners, TheWaitStaysUntilItsRefreshHasEnded)
         EXPECT_TRUE(popup_is("wait")) << "a second share";
         request({.sender = "icon"});
         EXPECT_TRUE(popup_is("wait")) << "a tap on the icon";
-        EXPECT_TRUE(log.has("The new files go along with these"));
+        EXPECT_TRUE(wait_for([&] { return log.has("The new files go along with these"); }));
         fake_cloud_hold(false);
         ASSERT_TRUE(wait_for(is_browsing));
         EXPECT_EQ(rows(), Texts{"folder Fresh"});
@@ -256,7 +255,6 @@ TEST_F(Owners, AResultOverARunKeepsItsFolderAndGivesTheQueueBack)
         ASSERT_TRUE(s_vd) << "what is tried again is not only looked at";
         share_from("late", {"late.txt"});
         EXPECT_EQ(rows(), Texts{"queued old.txt"});
-        fake_cloud_let_through(1);
         ASSERT_TRUE(wait_for([] { return states()[0] == UPLOAD_STATE_UPLOADING; }));
         EXPECT_NE(read_posted(VELORA_SHARE_PACKAGE)[0].looks.find(" 5 0 "), std::string::npos)
             << "another try starts at nothing: " << read_posted(VELORA_SHARE_PACKAGE)[0].looks;
@@ -271,7 +269,7 @@ TEST_F(Owners, AQuestionGoesWithWhatItIsAbout)
     fake_cloud_fail_upload(1, CLOUD_CONTENT_SYNC_ERROR_SERVER);
     run([&] {
         start({"a.txt", "b.txt", "c.txt"});
-        fake_cloud_let_through(4);
+        fake_cloud_let_through(3);
         ASSERT_TRUE(wait_for([] { return rows()[0] == "failed a.txt" && the_run()->report.current == 1; }));
         __ctx_delete_cb(s_vd, nullptr, nullptr);
         driver::settle();

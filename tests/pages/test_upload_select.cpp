@@ -64,7 +64,7 @@ TEST_F(Selecting, CountsWhatIsStillInTheQueue)
             ASSERT_TRUE(one.row < 0 ? tap_all() : tap(one.row));
             EXPECT_EQ(state(), one.state) << one.row;
         }
-        fake_cloud_let_through(4); // the first file ends, and with it its flag
+        fake_cloud_let_through(3); // the first file ends, and with it its flag
         ASSERT_TRUE(wait_for([] { return rows()[0] == "uploaded a.txt" && state() == "0 Selected!"; })) << state();
         ASSERT_TRUE(tap_all());
         EXPECT_EQ(state(), "2 Selected all");

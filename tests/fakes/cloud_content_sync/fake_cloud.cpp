@@ -1,30 +1,15 @@
 // The fake's service, and the control of the tests.
 #include "fake_cloud.h"
 #include "base/base.h"
+#include "cloud_content_sync/account.h"
+#include "cloud_content_sync/cloud_content_sync.h"
 #include "cloud_content_sync/names.h"
 #include "fake_state.h"
 #include <filesystem>
 #include <fstream>
+#include <utility>
 
 using namespace cloud;
-
-FakeCloud &fake()
-{
-    static FakeCloud state;
-    return state;
-}
-
-void FakeState::refresh(Account &account) const
-{
-    std::vector<FolderRow> folder_rows;
-    std::vector<ContentRow> content_rows;
-    for (const std::string &path : folders)
-        if (path != "/")
-            folder_rows.push_back({path, name_of(path)});
-    for (const auto &[path, content] : files)
-        content_rows.push_back({parent_of(path), name_of(path), static_cast<long long>(content.size()), 0, ""});
-    account.replace(folder_rows, content_rows, {}, account.identity());
-}
 
 template <class Change> static void change(Change apply)
 {
@@ -35,20 +20,46 @@ template <class Change> static void change(Change apply)
     fake().changed.notify_all();
 }
 
+// The library's own two are compiled under other names.
+#undef cloud_content_sync_create
+#undef cloud_content_sync_upload
+int real_cloud_content_sync_create(const char *service_name, cloud_content_sync_h *handle);
+int real_cloud_content_sync_upload(cloud_content_sync_h handle, const char *local_path, const char *server_path,
+                                   int *req_id, cloud_content_sync_transfer_cb cb, void *user_data);
+
+int cloud_content_sync_create(const char *service_name, cloud_content_sync_h *handle)
+{
+    std::unique_lock lock(fake().mutex);
+    if (const int error = std::exchange(fake().create_error, 0))
+        return error;
+    lock.unlock();
+    return real_cloud_content_sync_create(service_name, handle);
+}
+
+int cloud_content_sync_upload(cloud_content_sync_h handle, const char *local_path, const char *server_path, int *req_id,
+                              cloud_content_sync_transfer_cb cb, void *user_data)
+{
+    change([&](FakeState &state) { state.log.push_back(std::string(local_path) + " -> " + server_path); });
+    return real_cloud_content_sync_upload(handle, local_path, server_path, req_id, cb, user_data);
+}
+
 void fake_cloud_reset()
 {
-    change([](FakeState &state) {
-        if (state.handles)
+    {
+        // A client that was destroyed from within its callback may need a moment.
+        std::unique_lock lock(fake().mutex);
+        if (!fake().changed.wait_for(lock, std::chrono::seconds(10), [] { return fake().clients.empty(); }))
             std::abort(); // a handle that was not destroyed
-        state = FakeState();
-    });
+    }
+    change([](FakeState &state) { state = FakeState(); });
     std::filesystem::remove_all(cloud_data_dir());
     const std::string descriptions = cloud_data_dir() + "/services";
     std::filesystem::create_directory(descriptions);
     setenv("CLOUD_SERVICES_DIR", descriptions.c_str(), 1);
     const Credentials credentials = {"someone@example.org", "secret", "someone@example.org"};
     for (const std::string name : {"Velora", "Test"}) {
-        std::ofstream(descriptions + "/" + name + ".conf") << "[Service]\nStorage=http://127.0.0.1:1/\n";
+        std::ofstream(descriptions + "/" + name + ".conf")
+            << "[Service]\nStorage=http://127.0.0.1:1/\nApi=http://127.0.0.1:1\n";
         credentials_store(name, &credentials);
     }
 }
@@ -58,7 +69,17 @@ void fake_cloud_refresh_now()
     Account account(*service_find("Velora"));
     if (!account.open())
         std::abort();
-    change([&](FakeState &state) { state.refresh(account); });
+    std::vector<FolderRow> folders;
+    std::vector<ContentRow> contents;
+    change([&](FakeState &state) {
+        for (const std::string &path : state.folders)
+            if (path != "/")
+                folders.push_back({path, name_of(path)});
+        for (const auto &[path, file] : state.files)
+            contents.push_back(
+                {parent_of(path), name_of(path), static_cast<long long>(file.content.size()), 0, file.etag});
+    });
+    account.replace(folders, contents, {}, account.identity());
 }
 
 void fake_cloud_add_folder(const std::string &path)
@@ -68,7 +89,7 @@ void fake_cloud_add_folder(const std::string &path)
 
 void fake_cloud_add_file(const std::string &path, const std::string &content)
 {
-    change([&](FakeState &state) { state.files[path] = content; });
+    change([&](FakeState &state) { state.store(path, content); });
 }
 
 void fake_cloud_remove(const std::string &path)
@@ -84,7 +105,7 @@ std::optional<std::string> fake_cloud_content(const std::string &path)
 {
     std::scoped_lock lock(fake().mutex);
     const auto found = fake().files.find(path);
-    return found == fake().files.end() ? std::nullopt : std::optional(found->second);
+    return found == fake().files.end() ? std::nullopt : std::optional(found->second.content);
 }
 
 std::vector<std::string> fake_cloud_list(const std::string &folder)
@@ -97,7 +118,7 @@ std::vector<std::string> fake_cloud_list(const std::string &folder)
     };
     for (const std::string &path : fake().folders)
         add(path);
-    for (const auto &[path, content] : fake().files)
+    for (const auto &[path, file] : fake().files)
         add(path);
     return names;
 }
@@ -140,15 +161,15 @@ void fake_cloud_hold(bool hold)
     });
 }
 
-void fake_cloud_let_through(int callbacks)
+void fake_cloud_let_through(int steps)
 {
-    change([&](FakeState &state) { state.permits += callbacks; });
+    change([&](FakeState &state) { state.permits += steps; });
 }
 
 int fake_cloud_open_handles()
 {
     std::scoped_lock lock(fake().mutex);
-    return fake().handles;
+    return static_cast<int>(fake().clients.size());
 }
 
 std::vector<std::string> fake_cloud_upload_log()

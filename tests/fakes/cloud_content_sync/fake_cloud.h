@@ -1,7 +1,7 @@
 #pragma once
-// Control of the fake cloud client. What the application calls, the client's database, its accounts and paths are the
-// real library's; its thread and the service are a tree in memory. What a test calls is this. All functions but the
-// reset may be called from any thread. The services "Velora" and "Test" are known, and share one tree.
+// Control of the fake service. The cloud client is the real one; its requests are answered from a tree in memory. What
+// a test calls is this. All functions but the reset may be called from any thread. The services "Velora" and "Test" are
+// known, and share one tree.
 #include <optional>
 #include <string>
 #include <vector>
@@ -25,8 +25,7 @@ void fake_cloud_refresh_now();
 // false: requests end with NETWORK.
 void fake_cloud_set_reachable(bool reachable);
 
-// The nth upload that reaches the service from now on (1: the next one) ends with this error after its progress, which
-// is 0, 50 and 100.
+// The nth upload whose body reaches the service from now on (1: the next one) ends with this error.
 void fake_cloud_fail_upload(int nth, int error);
 // The next refresh ends with this error; the next cloud_content_sync_create answers it; the next request about a single
 // file ends with it.
@@ -34,11 +33,12 @@ void fake_cloud_fail_refresh(int error);
 void fake_cloud_fail_create(int error);
 void fake_cloud_fail_content(int error);
 
-// A pause before each callback, in milliseconds.
+// A pause before each step of a request, in milliseconds. An upload takes three steps: half of its body, the rest
+// and the answer (more when it is large); a refresh one, and any other request one.
 void fake_cloud_set_delay(int milliseconds);
-// While held, nothing calls back, except for as many callbacks as are let through.
+// While held, no step is taken, except for as many as are let through.
 void fake_cloud_hold(bool hold);
-void fake_cloud_let_through(int callbacks);
+void fake_cloud_let_through(int steps);
 
 // Handles that are created and not yet destroyed; uploads asked for since the reset, as "LOCAL -> SERVER".
 int fake_cloud_open_handles();

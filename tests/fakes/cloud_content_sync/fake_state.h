@@ -1,25 +1,40 @@
 #pragma once
-// The service of the fake, and what it is told to do. One lock guards everything, the clients too.
-#include "cloud_content_sync/client.h"
-#include <functional>
+// The service of the fake, and what it is told to do. One lock guards everything.
+#include "cloud_content_sync/http.h"
+#include <condition_variable>
+#include <mutex>
+#include <set>
+
+struct FakeFile {
+    std::string content, etag;
+};
 
 struct FakeState {
     std::set<std::string> folders = {"/"};
-    std::map<std::string, std::string> files; // path -> content
+    std::map<std::string, FakeFile> files; // by path
     bool reachable = true, held = false;
-    int permits = 0, delay = 0, uploads_sent = 0, refresh_error = 0, create_error = 0, content_error = 0, handles = 0;
+    int permits = 0, delay = 0, versions = 0, uploads_sent = 0, refresh_error = 0, create_error = 0, content_error = 0;
     std::map<int, int> upload_errors; // number of the upload -> error
     std::vector<std::string> log;
-    std::map<std::string, std::string> cached; // path -> content of the cached file
-    std::map<const cloud::Client *, std::deque<std::function<void()>>> jobs;
-    std::map<std::pair<const cloud::Client *, int>, std::string> landed;
 
-    // Writes the tree into a client's database.
-    void refresh(cloud::Account &account) const;
+    bool exists(const std::string &path) const
+    {
+        return files.count(path) || folders.count(path);
+    }
+    void store(const std::string &path, std::string content)
+    {
+        files[path] = {std::move(content), "\"" + std::to_string(++versions) + "\""};
+    }
+};
+
+struct FakeClient {
+    std::vector<cloud::Transfer *> requests; // in the order of their starts
+    bool is_woken = false;
 };
 
 struct FakeCloud : FakeState {
     std::mutex mutex;
     std::condition_variable changed;
+    std::map<const cloud::Http *, FakeClient> clients;
 };
 FakeCloud &fake();
