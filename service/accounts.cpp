@@ -113,25 +113,31 @@ Account *Accounts::by_token(const std::string &token)
     return row.bind(1, hash).row() && equal_in_constant_time(row.text(1), hash) ? find(row.integer(0)) : nullptr;
 }
 
-Account *Accounts::by_password(const std::string &email, const std::string &password)
+void PasswordCheck::run()
 {
-    Stmt row(*db, "SELECT id, password FROM accounts WHERE email = ?");
-    if (!row.bind(1, folded(email)).row()) {
-        password_hash(password); // an unknown address takes as long as a wrong password
+    if (hash.empty())
+        password_hash(password);
+    else
+        is_right = password_matches(password, hash);
+}
+
+std::string Accounts::proof(const std::string &password, const std::string &hash) const
+{
+    return hmac_sha256(key, hash + '\0' + password);
+}
+
+Account *Accounts::settle(const PasswordCheck &check)
+{
+    Stmt row(*db, "SELECT id FROM accounts WHERE email = ? AND password = ?");
+    if (!check.is_right || !row.bind(1, check.email).bind(2, check.hash).row())
         return nullptr;
-    }
-    const std::string hash = row.text(1), proof = hmac_sha256(key, hash + '\0' + password);
-    if (!proved.count(proof)) {
-        if (!password_matches(password, hash))
-            return nullptr;
-        if (proved.size() >= PROVED_AT_MOST)
-            proved.clear();
-        proved.insert(proof);
-    }
+    if (proved.size() >= PROVED_AT_MOST)
+        proved.clear();
+    proved.insert(proof(check.password, check.hash));
     return find(row.integer(0));
 }
 
-Account *Accounts::authorize(const char *header)
+Account *Accounts::authorize(const char *header, PasswordCheck &check)
 {
     if (header && strncasecmp(header, "Bearer ", 7) == 0)
         return by_token(header + 7);
@@ -143,5 +149,11 @@ Account *Accounts::authorize(const char *header)
     const size_t colon = pair.find(':');
     if (colon == std::string::npos || pair.find('\0') != std::string::npos)
         return nullptr;
-    return by_password(pair.substr(0, colon), pair.substr(colon + 1));
+    check.email = folded(pair.substr(0, colon));
+    check.password = pair.substr(colon + 1);
+    Stmt row(*db, "SELECT id, password FROM accounts WHERE email = ?");
+    if (!row.bind(1, check.email).row())
+        return nullptr;
+    check.hash = row.text(1);
+    return proved.count(proof(check.password, check.hash)) ? find(row.integer(0)) : nullptr;
 }

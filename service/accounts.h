@@ -25,6 +25,15 @@ struct Account {
     }
 };
 
+// A password that is not known to be right. run() may be called from any thread and takes some ten milliseconds.
+struct PasswordCheck {
+    std::string email, password;
+    std::string hash; // of the account's password; empty when there is no such account, and then it takes as long
+    bool is_right = false;
+
+    void run();
+};
+
 class Accounts {
   public:
     // `db` and `files`, the folder that holds one folder per account, are borrowed for the object's life. False when
@@ -36,14 +45,17 @@ class Accounts {
     // A new token of 256 random bits; only its SHA-256 is kept. Empty when there is no such account.
     std::string issue_token(const std::string &email);
     // Reads the value of an Authorization header (RFC 6750 Bearer, RFC 7617 Basic; null is allowed). Null when it
-    // proves nothing. The account stays valid and at its address for the object's life.
-    Account *authorize(const char *header);
+    // proves nothing; when `check` has a password then, it is to be run and settled. The account stays valid and at its
+    // address for the object's life.
+    Account *authorize(const char *header, PasswordCheck &check);
+    // The account of a check that has run; null when the password was wrong.
+    Account *settle(const PasswordCheck &check);
     // Null when there is no such account.
     Account *find(long long id);
 
   private:
     Account *by_token(const std::string &token);
-    Account *by_password(const std::string &email, const std::string &password);
+    std::string proof(const std::string &password, const std::string &hash) const;
 
     Db *db = nullptr;
     int root = -1;

@@ -33,11 +33,8 @@ int check_if_header(Request &request)
     for (const IfHeader::List &list : header.lists) {
         Path path = request.path;
         if (!list.resource.empty()) {
-            GUri *uri = g_uri_parse_relative(soup_server_message_get_uri(request.message), list.resource.c_str(),
-                                             static_cast<GUriFlags>(SOUP_HTTP_URI_FLAGS), nullptr);
-            const bool readable = uri && parse_path(g_uri_get_path(uri), path) == 0;
-            if (uri)
-                g_uri_unref(uri);
+            const auto uri = read_address(request, list.resource.c_str());
+            const bool readable = uri && parse_path(g_uri_get_path(uri.get()), path) == 0;
             if (!readable)
                 continue;
         }
@@ -85,7 +82,7 @@ static void refresh_lock(Request &request)
 
 void dav_lock(Request &request)
 {
-    const std::string body = request.body();
+    const std::string &body = request.body;
     if (body.empty())
         return refresh_lock(request);
     Lock lock;

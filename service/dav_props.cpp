@@ -264,7 +264,7 @@ void dav_propfind(Request &request)
     if (depth != "0" && depth != "1" && g_ascii_strcasecmp(depth.c_str(), "infinity") != 0)
         return request.answer(400);
     PropfindBody body;
-    if (!read_propfind(request.body(), body))
+    if (!read_propfind(request.body, body))
         return request.answer(400);
     const Entry entry = request.look_up();
     if (entry.kind != Entry::FILE && entry.kind != Entry::FOLDER)
@@ -276,7 +276,7 @@ void dav_propfind(Request &request)
 void dav_proppatch(Request &request)
 {
     std::vector<PropertyUpdate> updates;
-    if (!read_proppatch(request.body(), updates))
+    if (!read_proppatch(request.body, updates))
         return request.answer(400);
     const Entry entry = request.look_up();
     if (entry.kind != Entry::FILE && entry.kind != Entry::FOLDER)

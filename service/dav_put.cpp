@@ -7,8 +7,6 @@
 #include <sys/stat.h>
 
 static const int64_t DELAY_STEP = 64 << 10;
-// A sender that is faster than the disk would keep the loop for itself: after so many bytes it has to queue again.
-static const int64_t TURN = 1 << 20;
 // Written-back in steps while the body arrives, so that the final fsync has little left to wait for.
 static const int64_t FLUSH_STEP = 8 << 20;
 
@@ -61,12 +59,14 @@ static bool reserve(Upload &upload, int64_t bytes)
 // The SHA-256 of a Repr-Digest header as hexadecimal digits: empty when it has none. False when it cannot be read.
 static bool read_repr_digest(const char *header, std::string &digest)
 {
-    GHashTable *members = soup_header_parse_param_list(header);
-    const auto *value = static_cast<const char *>(g_hash_table_lookup(members, "sha-256"));
-    const std::string text = value ? value : "";
-    const bool present = g_hash_table_contains(members, "sha-256");
-    soup_header_free_param_list(members);
-    if (!present)
+    // A dictionary of byte sequences (RFC 9651): none of them holds a comma.
+    char **members = g_strsplit(header, ",", -1);
+    std::string text;
+    for (char **member = members; *member; member++)
+        if (g_str_has_prefix(g_strstrip(*member), "sha-256="))
+            text = *member + std::strlen("sha-256=");
+    g_strfreev(members);
+    if (text.empty())
         return true;
     gsize size = 0;
     if (text.size() != 46 || text.front() != ':' || text.back() != ':') // 32 bytes are 44 characters
@@ -94,7 +94,6 @@ static int check_target(Request &request, const Fd &folder, Entry &entry)
 void put_begin(Request &request)
 {
     Service &service = *request.service;
-    soup_message_body_set_accumulate(soup_server_message_get_request_body(request.message), FALSE);
     if (service.faults.fail_count > 0) {
         service.faults.fail_count--;
         return refuse(request, service.faults.fail_status);
@@ -114,11 +113,9 @@ void put_begin(Request &request)
     upload.replaced = old.size;
     const char *none_match = request.header("If-None-Match");
     upload.only_new = none_match && std::strcmp(none_match, "*") == 0;
-    SoupMessageHeaders *headers = soup_server_message_get_request_headers(request.message);
-    if (soup_message_headers_get_encoding(headers) != SOUP_ENCODING_CHUNKED)
-        upload.length = soup_message_headers_get_content_length(headers);
+    upload.length = request.body_length();
     const char *digest = request.header("Repr-Digest");
-    if (upload.length < -1 || (digest && !read_repr_digest(digest, upload.wanted_digest)))
+    if (digest && !read_repr_digest(digest, upload.wanted_digest))
         return refuse(request, 400);
     if (!reserve(upload, std::max<int64_t>(0, upload.length)))
         return refuse(request, 507);
@@ -136,15 +133,13 @@ static gboolean go_on(gpointer data)
 {
     auto *request = static_cast<Request *>(data);
     request->upload->pause_timer = 0;
-    soup_server_message_unpause(request->message);
+    request->unpause();
     return G_SOURCE_REMOVE;
 }
 
-void put_chunk(Request &request, GBytes *chunk)
+void put_chunk(Request &request, const char *bytes, size_t size)
 {
     Upload &upload = *request.upload;
-    gsize size = 0;
-    const auto *bytes = static_cast<const char *>(g_bytes_get_data(chunk, &size));
     const int64_t before = upload.received;
     upload.received += static_cast<int64_t>(size);
     if (upload.length < 0 && !reserve(upload, upload.received))
@@ -161,9 +156,8 @@ void put_chunk(Request &request, GBytes *chunk)
         upload.flushed = upload.received;
     }
     const unsigned delay = request.service->faults.delay;
-    const int64_t step = delay ? DELAY_STEP : TURN;
-    if (before / step != upload.received / step && !upload.pause_timer) {
-        soup_server_message_pause(request.message);
+    if (delay && before / DELAY_STEP != upload.received / DELAY_STEP && !upload.pause_timer) {
+        request.pause();
         upload.pause_timer = g_timeout_add(delay, go_on, &request);
     }
 }
@@ -210,7 +204,7 @@ static void store_and_answer(Request &request)
     put_drop(request);
     request.answer(status);
     if (status < 300 && request.service->faults.lose_reply > 0 && --request.service->faults.lose_reply == 0)
-        g_socket_shutdown(soup_server_message_get_socket(request.message), TRUE, TRUE, nullptr);
+        request.cut();
 }
 
 void put_finish(Request &request)

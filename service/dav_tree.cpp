@@ -46,7 +46,7 @@ void dav_delete(Request &request)
 
 void dav_mkcol(Request &request)
 {
-    if (soup_server_message_get_request_body(request.message)->length > 0)
+    if (!request.body.empty())
         return request.answer(415);
     if (request.path.root())
         return request.answer(405);
@@ -70,21 +70,19 @@ static int read_destination(const Request &request, Path &path)
     const char *text = request.header("Destination");
     if (!text)
         return 400;
-    GUri *own = soup_server_message_get_uri(request.message);
-    GUri *uri = g_uri_parse_relative(own, text, static_cast<GUriFlags>(SOUP_HTTP_URI_FLAGS), nullptr);
+    const auto uri = read_address(request, text);
     if (!uri)
         return 400;
-    const char *host = soup_message_headers_get_one(soup_server_message_get_request_headers(request.message), "Host");
-    std::string authority = g_uri_get_host(uri) ? g_uri_get_host(uri) : "";
+    const char *host = request.header("Host");
+    std::string authority = g_uri_get_host(uri.get()) ? g_uri_get_host(uri.get()) : "";
     if (authority.find(':') != std::string::npos)
         authority = "[" + authority + "]";
-    const std::string with_port = authority + ":" + std::to_string(g_uri_get_port(uri));
     // Behind a proxy that speaks TLS our own address is the Host header's, whatever the scheme.
-    const bool ours = g_uri_get_host(own) && g_uri_get_host(uri) &&
-                      (!g_ascii_strcasecmp(g_uri_get_host(own), g_uri_get_host(uri)) ||
-                       (host && (authority == host || with_port == host)));
-    const int status = ours ? parse_path(g_uri_get_path(uri), path) : 502;
-    g_uri_unref(uri);
+    const int port = g_uri_get_port(uri.get());
+    const std::string with_port = authority + ":" + std::to_string(port);
+    const bool is_ours =
+        host && (!g_ascii_strcasecmp(authority.c_str(), host) || !g_ascii_strcasecmp(with_port.c_str(), host));
+    const int status = is_ours ? parse_path(g_uri_get_path(uri.get()), path) : 502;
     return status == 404 ? 502 : status;
 }
 

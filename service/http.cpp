@@ -1,28 +1,30 @@
 #include "http.h"
 #include <cstring>
 #include <gio/gio.h>
-#include <netinet/in.h>
-#include <netinet/tcp.h>
 
-static const int64_t BODY_AT_MOST = 1 << 20;    // of requests that are not uploads
-static const int64_t WORTH_READING = 256 << 10; // what is read to the end to keep a connection alive
+static const size_t BODY_AT_MOST = 1 << 20; // of requests that are not uploads
 static const char *const ALLOWED =
     "OPTIONS, GET, HEAD, PUT, DELETE, MKCOL, COPY, MOVE, PROPFIND, PROPPATCH, LOCK, UNLOCK";
 
-void Request::answer(int status, const char *type, const std::string &body) const
+std::string Request::query_field(const char *name) const
 {
-    answer(status);
-    soup_server_message_set_response(message, type, SOUP_MEMORY_COPY, body.data(), body.size());
+    GHashTable *fields = query() ? g_uri_parse_params(query(), -1, "&", G_URI_PARAMS_WWW_FORM, nullptr) : nullptr;
+    const auto *value = fields ? static_cast<const char *>(g_hash_table_lookup(fields, name)) : nullptr;
+    std::string text = value ? value : "";
+    if (fields)
+        g_hash_table_unref(fields);
+    return text;
 }
 
-std::string Request::body() const
+std::unique_ptr<GUri, decltype(&g_uri_unref)> read_address(const Request &request, const char *text)
 {
-    GBytes *bytes = soup_message_body_flatten(soup_server_message_get_request_body(message));
-    gsize size = 0;
-    const auto *data = static_cast<const char *>(g_bytes_get_data(bytes, &size));
-    const std::string text(data ? data : "", size);
-    g_bytes_unref(bytes);
-    return text;
+    static constexpr auto FLAGS = static_cast<GUriFlags>(G_URI_FLAGS_ENCODED_PATH | G_URI_FLAGS_ENCODED_QUERY |
+                                                         G_URI_FLAGS_ENCODED_FRAGMENT | G_URI_FLAGS_SCHEME_NORMALIZE);
+    const char *host = request.header("Host");
+    const std::string base =
+        std::string(request.is_secure() ? "https://" : "http://") + (host ? host : "localhost") + "/";
+    const std::unique_ptr<GUri, decltype(&g_uri_unref)> own(g_uri_parse(base.c_str(), FLAGS, nullptr), g_uri_unref);
+    return {own ? g_uri_parse_relative(own.get(), text, FLAGS, nullptr) : nullptr, g_uri_unref};
 }
 
 Entry Request::look_up() const
@@ -34,16 +36,6 @@ Entry Request::look_up() const
     if (path.slash && entry.kind == Entry::FILE)
         entry.kind = Entry::NONE;
     return entry;
-}
-
-std::string http_date(int64_t nanoseconds)
-{
-    const time_t seconds = nanoseconds / 1000000000;
-    struct tm parts;
-    char text[64];
-    gmtime_r(&seconds, &parts);
-    std::strftime(text, sizeof text, "%a, %d %b %Y %H:%M:%S GMT", &parts); // the locale is always "C" here
-    return text;
 }
 
 std::string content_type(const std::string &name)
@@ -65,132 +57,61 @@ std::string repr_digest(const std::string &sha256_hex)
 }
 
 // Whether a list of entity tags names the entry's. Weak tags never match: ours are strong.
-static bool names_etag(const char *list, const Entry &entry)
+static bool names_etag(std::string_view list, const Entry &entry)
 {
     const std::string etag = entry.etag();
-    GSList *tags = soup_header_parse_list(list);
-    bool found = false;
-    for (const GSList *tag = tags; tag; tag = tag->next) {
-        const char *text = static_cast<const char *>(tag->data);
-        found = found || etag == text || std::strcmp(text, "*") == 0;
+    while (!list.empty()) {
+        const bool is_weak = list.substr(0, 2) == "W/";
+        list.remove_prefix(is_weak ? 2 : 0);
+        const size_t quote = list.front() == '"' ? list.find('"', 1) : list.npos;
+        const size_t end = std::min(quote != list.npos ? quote + 1 : list.find(','), list.size());
+        const std::string_view tag = list.substr(0, list.front() == '"' ? end : list.find_first_of(", \t"));
+        if (!is_weak && (tag == etag || tag == "*"))
+            return true;
+        list.remove_prefix(end);
+        list.remove_prefix(std::min(list.find_first_not_of(", \t"), list.size()));
     }
-    soup_header_free_list(tags);
-    return found;
-}
-
-// The date of a header in seconds since 1970, or -1.
-static int64_t date_of(const char *text)
-{
-    GDateTime *date = text ? soup_date_time_new_from_http_string(text) : nullptr;
-    const int64_t seconds = date ? g_date_time_to_unix(date) : -1;
-    if (date)
-        g_date_time_unref(date);
-    return seconds;
+    return false;
 }
 
 int check_conditions(const Request &request, const Entry &entry)
 {
-    const bool exists = entry.kind != Entry::NONE,
-               reading = !std::strcmp(request.method(), "GET") || !std::strcmp(request.method(), "HEAD");
+    const bool exists = entry.kind != Entry::NONE, reading = request.is("GET") || request.is("HEAD");
     const int64_t modified = entry.modified / 1000000000;
     if (const char *match = request.header("If-Match")) {
         if (!exists || !names_etag(match, entry))
             return 412;
-    } else if (const int64_t date = date_of(request.header("If-Unmodified-Since")); date >= 0 && exists) {
+    } else if (const int64_t date = http_date_read(request.header("If-Unmodified-Since")); date >= 0 && exists) {
         if (modified > date)
             return 412;
     }
     if (const char *none = request.header("If-None-Match")) {
         if (exists && names_etag(none, entry))
             return reading ? 304 : 412;
-    } else if (const int64_t date = date_of(request.header("If-Modified-Since")); date >= 0 && exists && reading) {
+    } else if (const int64_t date = http_date_read(request.header("If-Modified-Since"));
+               date >= 0 && exists && reading) {
         if (modified <= date)
             return 304;
     }
     return 0;
 }
 
-namespace {
-// A connection that was answered before its request was read. Closing it with unread input would reset it, and the
-// answer could be lost on its way; so what arrives is thrown away until the peer has closed or the time is over.
-struct Lingering {
-    static constexpr unsigned SECONDS = 10;
-    GIOStream *stream;
-    GCancellable *cancellable = g_cancellable_new();
-    guint timer = 0;
-
-    void read_on()
-    {
-        g_input_stream_skip_async(g_io_stream_get_input_stream(stream), 1 << 20, G_PRIORITY_LOW, cancellable, skipped,
-                                  this);
-    }
-    static void skipped(GObject *source, GAsyncResult *result, gpointer data)
-    {
-        auto *self = static_cast<Lingering *>(data);
-        if (g_input_stream_skip_finish(G_INPUT_STREAM(source), result, nullptr) > 0)
-            return self->read_on();
-        if (self->timer)
-            g_source_remove(self->timer);
-        g_io_stream_close(self->stream, nullptr, nullptr);
-        g_object_unref(self->cancellable);
-        g_object_unref(self->stream);
-        delete self;
-    }
-    static gboolean time_over(gpointer data)
-    {
-        auto *self = static_cast<Lingering *>(data);
-        self->timer = 0;
-        g_cancellable_cancel(self->cancellable);
-        return G_SOURCE_REMOVE;
-    }
-};
-} // namespace
-
 void refuse(Request &request, int status)
 {
     request.answer(status);
     put_drop(request);
-    SoupMessageHeaders *headers = soup_server_message_get_request_headers(request.message);
-    const SoupEncoding encoding = soup_message_headers_get_encoding(headers);
-    const bool little =
-        encoding == SOUP_ENCODING_NONE ||
-        (encoding == SOUP_ENCODING_CONTENT_LENGTH && soup_message_headers_get_content_length(headers) <= WORTH_READING);
-    // A client that expects "100 Continue" sends nothing once it has read another status.
-    if (little || soup_message_headers_get_expectations(headers) & SOUP_EXPECTATION_CONTINUE)
-        return;
-    std::string text = "HTTP/1.1 " + std::to_string(status) + " " + soup_status_get_phrase(static_cast<guint>(status)) +
-                       "\r\nConnection: close\r\n"
-                       "Content-Length: 0\r\n";
-    SoupMessageHeadersIter iterator;
-    const char *name, *value;
-    soup_message_headers_iter_init(&iterator, soup_server_message_get_response_headers(request.message));
-    while (soup_message_headers_iter_next(&iterator, &name, &value))
-        text += std::string(name) + ": " + value + "\r\n";
-    text += "Date: " + http_date(static_cast<int64_t>(time(nullptr)) * 1000000000) + "\r\n\r\n";
-    GSocket *socket = soup_server_message_get_socket(request.message);
-    g_object_ref(socket);
-    auto *lingering = new Lingering{soup_server_message_steal_connection(request.message)};
-    g_socket_send(socket, text.data(), text.size(), nullptr, nullptr);
-    g_socket_shutdown(socket, FALSE, TRUE, nullptr);
-    g_object_unref(socket);
-    lingering->timer = g_timeout_add_seconds(Lingering::SECONDS, Lingering::time_over, lingering);
-    lingering->read_on();
 }
 
 void in_thread(Request &request, std::function<void()> work, std::function<void()> done, Workers *workers)
 {
     request.jobs++;
-    soup_server_message_pause(request.message);
-    // The message, and the request with it, outlives its connection until the job is done.
-    g_object_ref(request.message);
+    request.pause();
     Workers &those = workers ? *workers : request.service->workers;
-    those.run(std::move(work), [&request, done = std::move(done)] {
-        SoupServerMessage *message = request.message;
+    // The request outlives its connection until the job is done.
+    those.run(std::move(work), [&request, kept = request.shared_from_this(), done = std::move(done)] {
         request.jobs--;
         done();
-        if (request.jobs == 0)
-            soup_server_message_unpause(message);
-        g_object_unref(message);
+        request.unpause();
     });
 }
 
@@ -203,7 +124,7 @@ void dav_options(Request &request)
 
 static void account_info(Request &request)
 {
-    if (std::strcmp(request.method(), "GET") != 0 && std::strcmp(request.method(), "HEAD") != 0) {
+    if (!request.is("GET") && !request.is("HEAD")) {
         request.set_header("Allow", "GET, HEAD");
         return request.answer(405);
     }
@@ -255,105 +176,99 @@ static void handle_dav(Request &request)
     request.answer(405);
 }
 
-static void handle(Request &request)
+Request::~Request()
 {
-    switch (request.area) {
+    put_drop(*this);
+}
+
+void Request::ended()
+{
+    put_drop(*this);
+}
+
+void Request::got_body(const char *bytes, size_t size)
+{
+    if (upload)
+        return put_chunk(*this, bytes, size);
+    body.append(bytes, size);
+    if (body.size() > BODY_AT_MOST)
+        refuse(*this, 413);
+}
+
+void Request::got_request()
+{
+    switch (area) {
     case Area::DAV:
-        return handle_dav(request);
+        return handle_dav(*this);
     case Area::ACCOUNT_INFO:
-        return account_info(request);
+        return account_info(*this);
     case Area::MEDIA_ADDRESS:
-        return media_address(request);
+        return media_address(*this);
     case Area::MEDIA:
-        return media_get(request);
+        return media_get(*this);
     case Area::THUMBNAIL:
-        return thumbnail(request);
+        return thumbnail(*this);
     }
-}
-
-static Request &request_of(SoupServerMessage *message)
-{
-    return *static_cast<Request *>(g_object_get_data(G_OBJECT(message), "request"));
-}
-
-static void got_chunk(SoupServerMessage *message, GBytes *chunk, gpointer)
-{
-    Request &request = request_of(message);
-    if (soup_server_message_get_status(message) >= 200)
-        return; // refused: the rest is only read
-    if (request.upload)
-        return put_chunk(request, chunk);
-    request.body_bytes += static_cast<int64_t>(g_bytes_get_size(chunk));
-    if (request.body_bytes > BODY_AT_MOST)
-        refuse(request, 413);
-}
-
-static void free_request(gpointer data)
-{
-    auto *request = static_cast<Request *>(data);
-    put_drop(*request);
-    delete request;
 }
 
 // The headers are there, the body is not: who asks, for what, and may it be sent?
-static void on_headers(SoupServer *, SoupServerMessage *message, const char *, GHashTable *, gpointer data)
+void Request::got_headers()
 {
-    auto *request = new Request;
-    request->service = static_cast<Service *>(data);
-    request->message = message;
-    g_object_set_data_full(G_OBJECT(message), "request", request, free_request);
-    g_signal_connect(message, "got-chunk", G_CALLBACK(got_chunk), nullptr);
-    // Of a connection that broke the message may live on for a while, but its upload must not.
-    g_signal_connect(message, "finished", G_CALLBACK(+[](SoupServerMessage *m, gpointer) { put_drop(request_of(m)); }),
-                     nullptr);
-
-    // A peer that vanished without a word keeps its connection, and the room of its upload, for two minutes at most.
-    GSocket *socket = soup_server_message_get_socket(message);
-    g_socket_set_keepalive(socket, TRUE);
-    g_socket_set_option(socket, IPPROTO_TCP, TCP_KEEPIDLE, 60, nullptr);
-    g_socket_set_option(socket, IPPROTO_TCP, TCP_KEEPINTVL, 15, nullptr);
-    g_socket_set_option(socket, IPPROTO_TCP, TCP_KEEPCNT, 4, nullptr);
-
-    const char *path = g_uri_get_path(soup_server_message_get_uri(message));
-    request->area = area_of(path);
-    const bool is_dav = request->area == Area::DAV;
-    const int wrong = is_dav ? parse_path(path, request->path) : 0;
-    if (g_uri_get_fragment(soup_server_message_get_uri(message)))
-        return refuse(*request, 400);
-    if (wrong == 404)
-        return refuse(*request, 404);
-    if (request->area == Area::MEDIA) {
-        request->account = media_account(*request);
-        if (!request->account)
-            refuse(*request, 403);
-        return;
-    }
-    request->account = request->service->accounts.authorize(request->header("Authorization"));
-    if (!request->account) {
-        soup_message_headers_append(soup_server_message_get_response_headers(message), "WWW-Authenticate",
-                                    "Bearer realm=\"velora-cloud\"");
-        soup_message_headers_append(soup_server_message_get_response_headers(message), "WWW-Authenticate",
-                                    "Basic realm=\"velora-cloud\", charset=\"UTF-8\"");
-        return refuse(*request, 401);
-    }
-    if (wrong)
-        return refuse(*request, wrong);
-    if (const int status = is_dav ? check_if_header(*request) : 0)
-        return refuse(*request, status);
-    if (is_dav && std::strcmp(request->method(), "PUT") == 0)
-        return put_begin(*request);
-    if (soup_message_headers_get_content_length(soup_server_message_get_request_headers(message)) > BODY_AT_MOST)
-        refuse(*request, 413);
+    area = area_of(target_path().c_str());
+    if (has_fragment())
+        return refuse(*this, 400);
+    if (area == Area::DAV && parse_path(target_path().c_str(), path) == 404)
+        return refuse(*this, 404);
+    if (area != Area::MEDIA)
+        return authorize();
+    account = media_account(*this);
+    if (!account)
+        refuse(*this, 403);
 }
 
-static void on_request(SoupServer *, SoupServerMessage *message, const char *, GHashTable *, gpointer)
+static void ask_for_credentials(Request &request)
 {
-    if (soup_server_message_get_status(message) < 200)
-        handle(request_of(message));
+    request.add_header("WWW-Authenticate", "Bearer realm=\"velora-cloud\"");
+    request.add_header("WWW-Authenticate", "Basic realm=\"velora-cloud\", charset=\"UTF-8\"");
+    refuse(request, 401);
 }
 
-void serve(SoupServer *server, Service *service)
+void Request::authorize()
 {
-    soup_server_add_early_handler(server, nullptr, on_headers, service, nullptr);
-    soup_server_add_handler(server, nullptr, on_request, service, nullptr);
+    auto check = std::make_shared<PasswordCheck>();
+    account = service->accounts.authorize(header("Authorization"), *check);
+    if (account)
+        return authorized();
+    if (check->password.empty())
+        return ask_for_credentials(*this);
+    // Whether there is such an account makes no difference to anybody who tries.
+    const std::string who = "account " + check->email, where = "address " + peer();
+    if (const int seconds = service->attempts.begin(who, where)) {
+        set_header("Retry-After", std::to_string(seconds));
+        return refuse(*this, 429);
+    }
+    in_thread(
+        *this, [check] { check->run(); },
+        [this, check, who, where] {
+            account = service->accounts.settle(*check);
+            if (!account)
+                return ask_for_credentials(*this);
+            service->attempts.succeeded(who, where);
+            authorized();
+        },
+        &service->hashers);
+}
+
+void Request::authorized()
+{
+    const bool is_dav = area == Area::DAV;
+    Path again;
+    if (const int wrong = is_dav ? parse_path(target_path().c_str(), again) : 0)
+        return refuse(*this, wrong);
+    if (const int status = is_dav ? check_if_header(*this) : 0)
+        return refuse(*this, status);
+    if (is_dav && is("PUT"))
+        return put_begin(*this);
+    if (body_length() > static_cast<int64_t>(BODY_AT_MOST))
+        refuse(*this, 413);
 }

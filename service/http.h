@@ -1,11 +1,13 @@
 #pragma once
 // What the handlers of requests share. All of it runs on the main loop.
+#include "attempts.h"
+#include "http_date.h"
 #include "locks.h"
 #include "metadata.h"
+#include "server.h"
 #include "workers.h"
 #include <ctime>
 #include <functional>
-#include <libsoup/soup.h>
 
 // Disturbances that tests ask for; see README.md.
 struct Faults {
@@ -25,6 +27,8 @@ struct Service {
     Faults faults;
     Workers workers{4};
     Workers painters{2}; // of thumbnails: bounds their memory, and leaves time for others
+    Workers hashers{2};  // of passwords
+    Attempts attempts;   // at passwords
 };
 
 struct Upload;
@@ -32,51 +36,45 @@ struct Upload;
 // What an address belongs to. MEDIA proves by its signature who allowed it, all others by credentials.
 enum class Area { DAV, ACCOUNT_INFO, MEDIA_ADDRESS, MEDIA, THUMBNAIL };
 
-struct Request {
+struct Request : Message {
     Service *service = nullptr;
-    SoupServerMessage *message = nullptr; // borrowed: the request lives as long as the message
-    Account *account = nullptr;           // borrowed
-    Path path;                            // of the file or folder; empty until the address or the body has named it
+    Account *account = nullptr; // borrowed
+    Path path;                  // of the file or folder; empty until the address or the body has named it
     Area area = Area::DAV;
     std::vector<std::string> tokens; // of locks, that the request has named
     Upload *upload = nullptr;        // owned; of a PUT whose body is being received
     int jobs = 0;                    // on other threads, for this request
-    int64_t body_bytes = 0;          // received so far, of methods other than PUT
+    std::string body;                // of methods other than PUT, as far as it has come
 
-    const char *method() const
+    ~Request() override;
+    void got_headers() override;
+    void got_body(const char *bytes, size_t size) override;
+    void got_request() override;
+    void ended() override;
+
+    bool is(const char *wanted_method) const
     {
-        return soup_server_message_get_method(message);
+        return verb_is(wanted_method);
     }
-    // The value of a header of the request, or null.
-    const char *header(const char *name) const
-    {
-        return soup_message_headers_get_one(soup_server_message_get_request_headers(message), name);
-    }
-    void set_header(const char *name, const std::string &value) const
-    {
-        soup_message_headers_replace(soup_server_message_get_response_headers(message), name, value.c_str());
-    }
-    // Answers with the status and no body, or with a body that `type` describes.
-    void answer(int status) const
-    {
-        soup_server_message_set_status(message, static_cast<guint>(status), nullptr);
-    }
-    void answer(int status, const char *type, const std::string &body) const;
     // The folder that holds path.name(), empty and errno when it cannot be opened. The path is not the root.
     Fd parent() const
     {
         return open_folder(account->folder.fd, path, path.parts.size() - 1);
     }
-    // The whole body; not of an upload.
-    std::string body() const;
     // What is at the path; kind NONE when nothing is.
     Entry look_up() const;
+    // The value of a field of the query (application/x-www-form-urlencoded), or "".
+    std::string query_field(const char *name) const;
+
+  private:
+    void authorize();
+    void authorized();
 };
 
-// Sends every request below `server` to the handlers. The service is borrowed for the server's life.
-void serve(SoupServer *server, Service *service);
-// Ends a request whose body is still arriving: at once when much of it may be left, else with the end of the body.
+// Answers a request whose body is still to come, and lets go of its upload.
 void refuse(Request &request, int status);
+// The address of a header (RFC 4918, 8.3: absolute, or a path) as the request means it; null when it is none.
+std::unique_ptr<GUri, decltype(&g_uri_unref)> read_address(const Request &request, const char *text);
 // The status that the If-Match, If-None-Match and If-(Un)Modified-Since headers demand for a resource (RFC 9110, 13): 0
 // to go on, 412, or 304 for GET and HEAD. An entry of kind NONE is a resource that does not exist.
 int check_conditions(const Request &request, const Entry &entry);
@@ -91,7 +89,6 @@ bool may_change(Request &request, const Path &path, Reach reach);
 // again. Both run also when the client has gone meanwhile. `work` must touch nothing that the main loop uses.
 // `workers` null: those of the service.
 void in_thread(Request &request, std::function<void()> work, std::function<void()> done, Workers *workers = nullptr);
-std::string http_date(int64_t nanoseconds);
 // The value of a Repr-Digest header (RFC 9530) for 64 hexadecimal digits.
 std::string repr_digest(const std::string &sha256_hex);
 std::string content_type(const std::string &name);
@@ -109,7 +106,7 @@ void dav_unlock(Request &request);
 // PUT: begin when the headers are there, chunk by chunk, finish with the end of the body; dropped when the connection
 // broke before that.
 void put_begin(Request &request);
-void put_chunk(Request &request, GBytes *chunk);
+void put_chunk(Request &request, const char *bytes, size_t size);
 void put_finish(Request &request);
 void put_drop(Request &request);
 

@@ -28,7 +28,7 @@ static std::string signature_of(const Service &service, const std::string &accou
 
 void media_address(Request &request)
 {
-    if (std::strcmp(request.method(), "POST") != 0) {
+    if (!request.is("POST")) {
         request.set_header("Allow", "POST");
         return request.answer(405);
     }
@@ -36,7 +36,7 @@ void media_address(Request &request)
                 "SELECT json_extract(body, '$.path'), json_extract(body, '$.minutes') FROM (SELECT ?1 AS body) "
                 "WHERE json_valid(body) AND json_type(body, '$.path') = 'text' AND json_type(body, '$.minutes') = "
                 "'integer'");
-    const std::string body = request.body();
+    const std::string &body = request.body;
     if (body.find('\0') != std::string::npos || !wanted.bind(1, body).row())
         return request.answer(400);
     if (const int wrong = parse_plain_path(wanted.text(0), request.path))
@@ -60,19 +60,12 @@ void media_address(Request &request)
 
 Account *media_account(Request &request)
 {
-    GUri *uri = soup_server_message_get_uri(request.message);
-    const char *query = g_uri_get_query(uri);
-    const std::string path = std::string("/dav") + (g_uri_get_path(uri) + std::strlen("/1/media"));
-    if (!query || parse_path(path.c_str(), request.path) != 0)
+    const std::string path = "/dav" + request.target_path().substr(std::strlen("/1/media"));
+    if (!request.query() || parse_path(path.c_str(), request.path) != 0)
         return nullptr;
-    const std::unique_ptr<GHashTable, decltype(&g_hash_table_unref)> fields(soup_form_decode(query),
-                                                                            g_hash_table_unref);
-    const auto field = [&](const char *name) {
-        const auto *value = static_cast<const char *>(g_hash_table_lookup(fields.get(), name));
-        return std::string(value ? value : "");
-    };
-    const std::string account = field("account"), expires = field("expires");
-    if (!equal_in_constant_time(signature_of(*request.service, account, expires, request.path), field("signature")))
+    const std::string account = request.query_field("account"), expires = request.query_field("expires");
+    if (!equal_in_constant_time(signature_of(*request.service, account, expires, request.path),
+                                request.query_field("signature")))
         return nullptr;
     if (g_ascii_strtoll(expires.c_str(), nullptr, 10) < static_cast<gint64>(time(nullptr)))
         return nullptr;
@@ -81,8 +74,7 @@ Account *media_account(Request &request)
 
 void media_get(Request &request)
 {
-    const std::string method = request.method();
-    if (method != "GET" && method != "HEAD") {
+    if (!request.is("GET") && !request.is("HEAD")) {
         request.set_header("Allow", "GET, HEAD");
         return request.answer(405);
     }

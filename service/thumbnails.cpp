@@ -118,7 +118,7 @@ static void keep(int folder, const std::string &name, const std::string &tempora
         unlinkat(folder, temporary.c_str(), 0);
 }
 
-static void answer_picture(const Request &request, const std::string &bytes)
+static void answer_picture(Request &request, const std::string &bytes)
 {
     if (bytes.empty())
         return request.answer(415);
@@ -137,18 +137,13 @@ struct Making {
 
 void thumbnail(Request &request)
 {
-    const std::string method = request.method();
-    if (method != "GET" && method != "HEAD") {
+    if (!request.is("GET") && !request.is("HEAD")) {
         request.set_header("Allow", "GET, HEAD");
         return request.answer(405);
     }
-    const char *query = g_uri_get_query(soup_server_message_get_uri(request.message));
-    const std::unique_ptr<GHashTable, decltype(&g_hash_table_unref)> fields(soup_form_decode(query ? query : ""),
-                                                                            g_hash_table_unref);
-    const auto *path = static_cast<const char *>(g_hash_table_lookup(fields.get(), "path"));
-    const auto *size = static_cast<const char *>(g_hash_table_lookup(fields.get(), "size"));
+    const std::string path = request.query_field("path"), size = request.query_field("size");
     guint64 box = 0;
-    if (!path || !size || !g_ascii_string_to_unsigned(size, 10, SIZE_LEAST, SIZE_MOST, &box, nullptr))
+    if (path.empty() || !g_ascii_string_to_unsigned(size.c_str(), 10, SIZE_LEAST, SIZE_MOST, &box, nullptr))
         return request.answer(400);
     if (const int wrong = parse_plain_path(path, request.path))
         return request.answer(wrong);

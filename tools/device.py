@@ -173,8 +173,10 @@ class Device:
     def start_service(self, *options):
         """Starts velora-cloud, a second time at the port that it had."""
         cloud = self.start([self.program("service/velora-cloud"), "--root", self.data, "--listen",
-                            f"127.0.0.1:{self.port}", "--add-account", f"{EMAIL}:{PASSWORD}", *options],
-                           stdout=subprocess.PIPE)
+                            f"127.0.0.1:{self.port}", "--add-account", EMAIL, *options],
+                           stdin=subprocess.PIPE, stdout=subprocess.PIPE)
+        cloud.stdin.write(PASSWORD.encode() + b"\n")
+        cloud.stdin.close()
         for line in cloud.stdout:
             found = re.match(r"listening on (http://\S+)", line.decode())
             if found:

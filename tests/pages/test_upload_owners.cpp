@@ -209,6 +209,7 @@ TEST_F(Owners, TheWaitStaysUntilItsRefreshHasEnded)
         fake_cloud_hold(false);
         ASSERT_TRUE(wait_for(is_browsing));
         EXPECT_EQ(__waiting_count(), 1);
+        EXPECT_TRUE(shows("b.txt · 1\u00a0KB")) << driver::read_texts(window());
     });
 }
 

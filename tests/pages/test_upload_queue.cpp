@@ -47,17 +47,23 @@ class Queue : public UploadPage {
 
 TEST_F(Queue, RunsInOrderAndCounts)
 {
+    const Texts paths = locals({"three.txt", "one.jpg", "two.txt"});
+    for (const std::string &path : paths) // 1 KB each
+        std::ofstream(path, std::ios::app) << std::string(1 << 10, ' ').substr(path.size() - path.rfind('/') - 1);
     run([&] {
-        share({"three.txt", "one.jpg", "two.txt"});
+        request({.operation = APP_CONTROL_OPERATION_MULTI_SHARE, .paths = paths});
         fake_cloud_hold(true);
         ASSERT_TRUE(press_done());
         ASSERT_TRUE(wait_for([] { return !fake_cloud_upload_log().empty(); }));
         EXPECT_EQ(rows(), (Texts{"queued three.txt", "queued one(1).jpg", "queued two.txt"}));
         EXPECT_EQ(notifications(), Texts{"Velora: 0 / 3"});
         EXPECT_TRUE(shows("one(1).jpg")) << driver::read_texts(window());
+        EXPECT_TRUE(shows("0 of 3 · 0\u00a0KB of 3\u00a0KB")) << driver::read_texts(window());
         for (int ended = 1; ended <= 2; ended++) {
             ASSERT_TRUE(finish_file());
-            EXPECT_TRUE(wait_for([&] { return ongoing() == std::to_string(ended) + " / 3"; })) << ongoing();
+            const std::string count = std::to_string(ended);
+            EXPECT_TRUE(wait_for([&] { return ongoing() == count + " / 3"; })) << ongoing();
+            EXPECT_TRUE(shows(count + " of 3 · " + count + "\u00a0KB of 3\u00a0KB")) << driver::read_texts(window());
         }
         EXPECT_TRUE(wait_for([] {
             return rows() == Texts{"uploaded three.txt", "uploaded one(1).jpg", "queued two.txt"};
@@ -69,7 +75,8 @@ TEST_F(Queue, RunsInOrderAndCounts)
         press_back();
         EXPECT_TRUE(wait_for_exit());
     });
-    EXPECT_EQ(uploaded("/three.txt") + uploaded("/one(1).jpg") + uploaded("/two.txt"), "three.txtone.jpgtwo.txt");
+    EXPECT_EQ(uploaded("/three.txt") + uploaded("/one(1).jpg") + uploaded("/two.txt"),
+              read_file(paths[0]) + read_file(paths[1]) + read_file(paths[2]));
     EXPECT_EQ(uploaded("/one.jpg"), "was there before");
     EXPECT_EQ(notifications().size(), 1u) << "the result outlives the application";
     EXPECT_TRUE(is_answered());

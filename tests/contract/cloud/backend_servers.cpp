@@ -47,7 +47,7 @@ static Backend introduce(const std::string &url)
 
 static Backend start_velora_cloud()
 {
-    const auto service = std::make_shared<Cloud>(Headers{"--add-account", std::string(USER) + ":" + PASSWORD});
+    const auto service = std::make_shared<Cloud>(Headers{"--add-account", USER}, std::string(PASSWORD) + "\n");
     Backend backend = introduce(service->url);
     backend.taboo = {"new\nline.txt", "\xff\xfe.bin"};
     backend.media_url = service->url;

@@ -42,7 +42,7 @@ int free_port()
     return ntohs(address.sin_port);
 }
 
-pid_t spawn(std::vector<std::string> words, const fs::path &out, const fs::path &err, unsigned user)
+pid_t spawn(std::vector<std::string> words, const fs::path &out, const fs::path &err, unsigned user, const fs::path &in)
 {
     std::vector<char *> argv;
     for (std::string &word : words)
@@ -54,7 +54,8 @@ pid_t spawn(std::vector<std::string> words, const fs::path &out, const fs::path 
     if (user && (setgid(user) != 0 || setuid(user) != 0))
         _exit(126);
     prctl(PR_SET_PDEATHSIG, SIGKILL); // also when the test crashes; a change of user would clear it
-    if ((out.empty() || freopen(out.c_str(), "w", stdout)) && (err.empty() || freopen(err.c_str(), "w", stderr)))
+    if (freopen(in.c_str(), "r", stdin) && (out.empty() || freopen(out.c_str(), "w", stdout)) &&
+        (err.empty() || freopen(err.c_str(), "w", stderr)))
         execv(argv[0], argv.data());
     _exit(127);
 }
@@ -66,16 +67,16 @@ int end_of(pid_t pid)
     return WIFEXITED(state) ? WEXITSTATUS(state) : -1;
 }
 
-Run run_cloud(std::vector<std::string> arguments)
+Run run_cloud(std::vector<std::string> arguments, const std::string &input)
 {
     const TempFolder folder;
     std::replace(arguments.begin(), arguments.end(), std::string("ROOT"), folder.path + "/root");
     arguments.insert(arguments.begin(), std::getenv("VELORA_CLOUD"));
-    const int code = end_of(spawn(arguments, folder / "out", folder / "err"));
+    const int code = end_of(spawn(arguments, folder / "out", folder / "err", 0, folder.file("in", input)));
     return {code, read_file(folder / "out"), read_file(folder / "err")};
 }
 
-Cloud::Cloud(Headers more) : options(std::move(more))
+Cloud::Cloud(Headers more, std::string passwords) : options(std::move(more)), input("secret\n" + passwords)
 {
     start();
 }
@@ -90,11 +91,11 @@ Cloud::~Cloud()
 void Cloud::start()
 {
     std::vector<std::string> words{std::getenv("VELORA_CLOUD"), "--root",   root,         "--add-account",
-                                   "ann@example.org:secret",    "--listen", "127.0.0.1:0"};
+                                   "ann@example.org",           "--listen", "127.0.0.1:0"};
     words.insert(words.end(), options.begin(), options.end());
     const fs::path out = place / "out";
     write_file(out, "");
-    pid = spawn(words, out, {});
+    pid = spawn(words, out, {}, 0, place.file("in", input));
     const std::string before = "listening on ";
     comes_true([&] { return read_file(out).find(before) != std::string::npos && read_file(out).back() == '\n'; });
     const std::string text = read_file(out);

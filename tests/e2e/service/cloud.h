@@ -27,9 +27,9 @@ std::string basic_authorization(const std::string &user, const std::string &pass
 // A port of 127.0.0.1 that nobody has now.
 int free_port();
 
-// Runs a program whose output and messages go to files; gives its process.
+// Runs a program whose output and messages go to files, and whose input comes from one; gives its process.
 pid_t spawn(std::vector<std::string> words, const std::filesystem::path &out, const std::filesystem::path &err,
-            unsigned user = 0);
+            unsigned user = 0, const std::filesystem::path &in = "/dev/null");
 // Waits for its end: the exit code, or -1 when a signal killed it.
 int end_of(pid_t pid);
 
@@ -38,12 +38,13 @@ struct Run {
     std::string out, err;
 };
 // Runs velora-cloud to its end. Arguments may name the folder "ROOT".
-Run run_cloud(std::vector<std::string> arguments);
+Run run_cloud(std::vector<std::string> arguments, const std::string &input = "");
 
-// Serves a folder of its own until the end of the test. Its account is "ann@example.org" with the password "secret".
+// Serves a folder of its own until the end of the test. Its account is "ann@example.org" with the password "secret";
+// the input has the passwords of further ones.
 class Cloud {
   public:
-    explicit Cloud(Headers options = {});
+    explicit Cloud(Headers options = {}, std::string input = "");
     ~Cloud();
     // Ends the service by the signal; the result is its exit code, or -1 when the signal killed it.
     int stop(int signal);
@@ -65,6 +66,7 @@ class Cloud {
 
   private:
     Headers options;
+    std::string input;
     pid_t pid = 0;
 };
 

@@ -2,8 +2,8 @@
 # The WebDAV conformance suites against a velora-cloud of its own. Fails when a test of any suite fails or is skipped.
 set -u
 work=$(mktemp -d)
-"$VELORA_CLOUD" --root "$work/root" --add-account litmus@example.org:secret --listen 127.0.0.1:0 >"$work/out" &
-server=$!
+echo secret | "$VELORA_CLOUD" --root "$work/root" --add-account litmus@example.org --listen 127.0.0.1:0 >"$work/out" &
+server=$! # the last of the pipe
 trap 'kill $server 2>/dev/null; rm -rf "$work"' EXIT
 tries=0
 until grep -q '^listening on ' "$work/out"; do

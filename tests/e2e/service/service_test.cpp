@@ -26,9 +26,9 @@ TEST(Service, AsksForCredentials)
     Cloud cloud;
     const std::string root = cloud.root;
     const auto tool = [&](const std::string &option, const std::string &value) {
-        return run_cloud({"--root", root, option, value});
+        return run_cloud({"--root", root, option, value}, "word\n");
     };
-    EXPECT_EQ(tool("--add-account", "Bob@example.org:word").out, "account Bob@example.org\n");
+    EXPECT_EQ(tool("--add-account", "Bob@example.org").out, "account Bob@example.org\n");
     const std::string ann = tool("--token", "ann@example.org").out, bob = tool("--token", "bob@example.org").out;
     ASSERT_EQ(ann.size(), 65u);
     EXPECT_NE(ann, tool("--token", "ann@example.org").out);

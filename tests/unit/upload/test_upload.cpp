@@ -4,6 +4,7 @@
 #include "temp_home.h"
 #include "velora_upload_file/upload_names.h"
 #include "velora_upload_file/upload_notification.h"
+#include "velora_upload_file/upload_text.h"
 #include "velora_upload_file/upload_types.h"
 #include <gtest/gtest.h>
 
@@ -106,6 +107,15 @@ TEST(Types, FollowTheExtensionAlone)
         EXPECT_EQ(__get_file_type(c.name), c.type);
         EXPECT_EQ(taken(__get_file_ext_name(c.name)), c.ext ? c.ext : "(null)");
     }
+}
+
+TEST(Sizes, AreShortInAList)
+{
+    const std::pair<gint64, const char *> cases[] = {{0, "0\u00a0KB"},           {1, "1\u00a0KB"},
+                                                     {600 << 10, "600\u00a0KB"}, {1500 << 10, "1.5\u00a0MB"},
+                                                     {12 << 20, "12\u00a0MB"},   {1023 << 10, "1.0\u00a0MB"}};
+    for (const auto &[bytes, text] : cases)
+        EXPECT_EQ(__short_size(bytes), text) << bytes;
 }
 
 TEST(Sizes, HaveTwoDecimalsAndTheFittingUnit)
