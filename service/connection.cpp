@@ -469,20 +469,28 @@ bool Connection::go_on_with_body()
     return true;
 }
 
-// Whether fields that have to be alone are, and say what the parser has understood.
-static bool are_sound(const std::function<int(const char *)> &count, bool is_chunked, bool is_old)
+// Whether fields that have to be alone are, and nothing frames the body in a way that others on the way to us may have
+// understood differently.
+bool Connection::is_sound() const
 {
-    return count("Content-Length") <= 1 && count("Host") <= 1 && count("Authorization") <= 1 &&
-           (is_old || count("Host") == 1) && (is_chunked || count("Transfer-Encoding") == 0);
+    int lengths = 0, codings = 0, hosts = 0, credentials = 0;
+    for (const Message::Field &field : message->request_fields) {
+        const auto is = [&field](const char *name) { return g_ascii_strcasecmp(field.name.c_str(), name) == 0; };
+        lengths += is("Content-Length");
+        codings += is("Transfer-Encoding");
+        hosts += is("Host");
+        credentials += is("Authorization");
+        if (is("Content-Length") && field.value.find_first_not_of("0123456789") != std::string::npos)
+            return false;
+        // Others than this one would have to be undone.
+        if (is("Transfer-Encoding") && g_ascii_strcasecmp(field.value.c_str(), "chunked") != 0)
+            return false;
+    }
+    return lengths <= 1 && codings <= 1 && hosts <= 1 && credentials <= 1 && (parser->is_old || hosts == 1);
 }
 
 void Connection::headers_are_there()
 {
-    const auto count = [this](const char *name) {
-        return static_cast<int>(
-            std::count_if(message->request_fields.begin(), message->request_fields.end(),
-                          [name](const auto &field) { return g_ascii_strcasecmp(field.name.c_str(), name) == 0; }));
-    };
     closes = !parser->keep_alive() || server.is_stopping;
     const auto length = parser->content_length();
     message->length = parser->chunked() ? -1
@@ -501,7 +509,7 @@ void Connection::headers_are_there()
     message->target = target.substr(0, std::min(message->query_at, target.find('#')));
     if (message->query_at != std::string::npos)
         message->query_at++;
-    if (target.front() != '/' || !are_sound(count, parser->chunked(), parser->is_old))
+    if (target.front() != '/' || !is_sound())
         return answer_malformed(400);
     const char *expect = message->header("Expect");
     owes_continue = expect && g_ascii_strcasecmp(expect, "100-continue") == 0;

@@ -59,6 +59,7 @@ class Connection : public std::enable_shared_from_this<Connection> {
     void begin_message();
     bool parse();
     void headers_are_there();
+    bool is_sound() const;
     bool go_on_with_body();
     void answer_malformed(int status);
     void begin_answer();
