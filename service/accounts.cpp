@@ -16,6 +16,18 @@ static const char SCHEMA[] =
     "CREATE TABLE IF NOT EXISTS tokens(hash TEXT PRIMARY KEY, account INTEGER NOT NULL REFERENCES accounts(id) ON "
     "DELETE CASCADE, issued INTEGER NOT NULL);";
 
+namespace {
+// Lets go of what a statement that is kept has read.
+struct Reset {
+    Stmt &statement;
+
+    ~Reset()
+    {
+        statement.reset();
+    }
+};
+} // namespace
+
 bool Accounts::open(Db &database, int files)
 {
     db = &database;
@@ -88,21 +100,25 @@ std::string Accounts::issue_token(const std::string &email)
 
 Account *Accounts::find(long long id)
 {
-    Stmt row(*db, "SELECT email, display_name, quota FROM accounts WHERE id = ?");
-    if (!row.bind(1, id).row())
+    if (!by_id)
+        by_id.emplace(*db, "SELECT email, display_name, quota FROM accounts WHERE id = ?");
+    const Reset reset{*by_id};
+    if (!by_id->bind(1, id).row())
         return nullptr;
     Account &account = loaded[id];
-    account.quota = row.integer(2);
+    account.quota = by_id->integer(2);
     if (account.folder)
         return &account;
     account.id = id;
-    account.email = row.text(0);
-    account.display_name = row.text(1);
+    account.email = by_id->text(0);
+    account.display_name = by_id->text(1);
     mkdirat(root, account.email.c_str(), 0777);
     account.folder = Fd(openat(root, account.email.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
     if (!account.folder)
         return nullptr;
     account.used = tree_size(account.folder.fd, "");
+    Stmt properties(*db, "SELECT bytes FROM property_sizes WHERE account = ?");
+    account.properties = properties.bind(1, id).row() ? properties.integer(0) : 0;
     return &account;
 }
 
@@ -151,9 +167,11 @@ Account *Accounts::authorize(const char *header, PasswordCheck &check)
         return nullptr;
     check.email = folded(pair.substr(0, colon));
     check.password = pair.substr(colon + 1);
-    Stmt row(*db, "SELECT id, password FROM accounts WHERE email = ?");
-    if (!row.bind(1, check.email).row())
+    if (!by_email)
+        by_email.emplace(*db, "SELECT id, password FROM accounts WHERE email = ?");
+    const Reset reset{*by_email};
+    if (!by_email->bind(1, check.email).row())
         return nullptr;
-    check.hash = row.text(1);
-    return proved.count(proof(check.password, check.hash)) ? find(row.integer(0)) : nullptr;
+    check.hash = by_email->text(1);
+    return proved.count(proof(check.password, check.hash)) ? find(by_email->integer(0)) : nullptr;
 }

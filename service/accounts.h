@@ -3,25 +3,31 @@
 #include "base/base.h"
 #include "tree.h"
 #include <map>
+#include <optional>
 #include <set>
 
 struct Account {
     long long id = 0;
     std::string email, display_name;
-    int64_t quota = 0;    // bytes
-    int64_t used = 0;     // bytes of the regular files in the folder
-    int64_t reserved = 0; // bytes that uploads under way may still add
-    Fd folder;            // the account's root folder
+    int64_t quota = 0;      // bytes
+    int64_t used = 0;       // bytes of the regular files in the folder
+    int64_t reserved = 0;   // bytes that uploads under way may still add
+    int64_t properties = 0; // bytes of the properties that clients stored
+    Fd folder;              // the account's root folder
 
     // Counts bytes that came (or went). What people do to the tree by hand is only seen by the next start's recount.
     void count(int64_t bytes)
     {
         used = std::max<int64_t>(0, used + bytes);
     }
+    int64_t stored() const
+    {
+        return used + properties;
+    }
     // Bytes that may still be stored.
     int64_t left() const
     {
-        return std::max<int64_t>(0, quota - used - reserved);
+        return std::max<int64_t>(0, quota - used - reserved - properties);
     }
 };
 
@@ -58,6 +64,7 @@ class Accounts {
     std::string proof(const std::string &password, const std::string &hash) const;
 
     Db *db = nullptr;
+    std::optional<Stmt> by_id, by_email; // kept, for every request needs them
     int root = -1;
     std::map<long long, Account> loaded;
     // Passwords that were right before, so that not every request of a Basic client pays for the slow hash: a keyed

@@ -121,7 +121,7 @@ void dav_lock(Request &request)
             request.service->locks.remove(token);
             return request.answer(status_of_errno(errno));
         }
-        request.service->metadata.forget(*request.account, request.path);
+        request.service->metadata.forget_file(*request.account, request.path);
     }
     request.set_header("Lock-Token", "<" + token + ">");
     answer_lock(request, is_new ? 201 : 200);

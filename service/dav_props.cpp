@@ -3,10 +3,17 @@
 #include "xml.h"
 #include <cerrno>
 #include <cstring>
+#include <sys/stat.h>
 #include <sys/statvfs.h>
 
 // Folders within folders that one answer may go down to.
-static const int LEVELS = 256;
+static const size_t LEVELS = 256;
+static const size_t NAMES_AT_MOST = 256;       // of properties, in one request
+static const size_t ANSWER_AT_MOST = 64 << 20; // bytes
+static const size_t LARGE_ANSWER = 1 << 20;    // bytes
+static const int LARGE_AT_ONCE = 8;
+static const gint64 TURN = 10000;           // microseconds
+static const off_t LARGE_FOLDER = 64 << 10; // bytes of the folder itself
 static const char *const LOCKABLE =
     "<D:lockentry><D:lockscope><D:exclusive/></D:lockscope><D:locktype><D:write/></D:locktype></D:lockentry>"
     "<D:lockentry><D:lockscope><D:shared/></D:lockscope><D:locktype><D:write/></D:locktype></D:lockentry>";
@@ -62,10 +69,11 @@ struct Wanted {
     const LiveName *live;
 };
 
-// One PROPFIND.
-class Propfind {
+// One PROPFIND. It holds the request, works for a while at a time, and then lets others have their turn.
+class Propfind : public std::enable_shared_from_this<Propfind> {
   public:
-    Propfind(Request &asked, const PropfindBody &asked_body) : request(asked), body(asked_body)
+    Propfind(Request &asked, PropfindBody asked_body, int asked_depth)
+        : request(asked), kept(asked.shared_from_this()), body(std::move(asked_body)), depth(asked_depth)
     {
         for (const DeadProperty &property : body.properties) {
             wanted.push_back({property, find_live(property)});
@@ -81,7 +89,7 @@ class Propfind {
                 std::min(quota_left, static_cast<int64_t>(disk.f_bavail) * static_cast<int64_t>(disk.f_frsize));
     }
 
-    std::string answer(const Entry &entry, int depth)
+    void begin(const Entry &entry)
     {
         out = XML_HEAD;
         const bool folder = entry.kind == Entry::FOLDER;
@@ -90,43 +98,118 @@ class Propfind {
                 need_dead ? request.service->metadata.properties(*request.account, request.path) : DeadProperties(),
                 need_digest ? request.service->metadata.digest(*request.account, request.path, entry) : "");
         if (folder && depth > 0)
-            if (const Fd open = open_folder(request.account->folder.fd, request.path, request.path.parts.size()); open)
-                list(open.fd, request.path, depth, LEVELS);
-        out += "</D:multistatus>\n";
-        return std::move(out);
+            if (Fd open = open_folder(request.account->folder.fd, request.path, request.path.parts.size()); open)
+                enter(std::move(open), request.path);
+        request.pause();
+        go_on();
     }
 
   private:
-    void list(int folder, const Path &path, int depth, int levels)
+    // A folder whose entries are being told.
+    struct Level {
+        Fd folder;
+        Path path;
+        std::vector<Entry> entries;
+        size_t next = 0;
+        std::unordered_map<std::string, Digest> digests;
+        std::unordered_map<std::string, DeadProperties> properties;
+    };
+
+    void enter(Fd folder, const Path &path)
     {
         Metadata &metadata = request.service->metadata;
-        std::vector<Entry> entries;
-        if (!list_folder(folder, entries))
+        Level level{std::move(folder), path, {}, 0, {}, {}};
+        struct stat info;
+        is_waiting = fstat(level.folder.fd, &info) == 0 && info.st_size > LARGE_FOLDER;
+        if (!is_waiting && !list_folder(level.folder.fd, level.entries))
             return;
-        const auto digests =
-            need_digest ? metadata.digests_in(*request.account, path) : std::unordered_map<std::string, Digest>();
-        const auto properties = need_dead ? metadata.properties_in(*request.account, path)
-                                          : std::unordered_map<std::string, DeadProperties>();
-        const std::string base = path.href(true);
-        const DeadProperties none;
-        for (const Entry &entry : entries) {
-            const auto digest = digests.find(entry.name);
-            const auto dead = properties.find(entry.name);
-            std::string href = base;
-            append_encoded(href, entry.name);
-            if (entry.kind == Entry::FOLDER)
-                href += '/';
-            Path below = path;
-            below.parts.push_back(entry.name);
-            read_locks(below);
-            respond(entry, href, dead == properties.end() ? none : dead->second,
-                    digest != digests.end() && digest->second.valid_for(entry) ? digest->second.sha256 : "");
-            if (entry.kind != Entry::FOLDER || depth == 1 || levels == 0)
-                continue;
-            const Path one{{entry.name}, false};
-            if (const Fd open = open_folder(folder, one, 1); open)
-                list(open.fd, below, depth, levels - 1);
-        }
+        if (need_digest)
+            level.digests = metadata.digests_in(*request.account, path);
+        if (need_dead)
+            level.properties = metadata.properties_in(*request.account, path);
+        levels.push_back(std::move(level));
+    }
+
+    // Only so many large answers are made and sent at a time.
+    bool take_part()
+    {
+        Service &service = *request.service;
+        if (request.large_answer || service.large_answers >= LARGE_AT_ONCE)
+            return request.large_answer != nullptr;
+        service.large_answers++;
+        request.large_answer =
+            std::shared_ptr<void>(&service, [](void *data) { static_cast<Service *>(data)->large_answers--; });
+        return true;
+    }
+
+    void refuse_for_now()
+    {
+        request.set_header("Retry-After", "5");
+        request.answer(503);
+    }
+
+    // A large folder is read on another thread.
+    void read_large_folder()
+    {
+        const auto self = shared_from_this();
+        const auto entries = std::make_shared<std::vector<Entry>>();
+        in_thread(
+            request, [self, entries] { list_folder(self->levels.back().folder.fd, *entries); },
+            [self, entries] {
+                self->levels.back().entries = std::move(*entries);
+                self->is_waiting = false;
+                self->go_on();
+            });
+    }
+
+    void go_on()
+    {
+        const gint64 end = g_get_monotonic_time() + TURN;
+        while (!levels.empty() && !is_waiting && out.size() <= ANSWER_AT_MOST && g_get_monotonic_time() < end)
+            tell_next();
+        if (request.has_ended())
+            return request.unpause(); // nobody waits for it
+        if (is_waiting)
+            return read_large_folder();
+        if (out.size() > ANSWER_AT_MOST)
+            request.answer(507);
+        else if (out.size() > LARGE_ANSWER && !take_part())
+            refuse_for_now();
+        else if (levels.empty())
+            request.answer(207, XML_TYPE, std::move(out += "</D:multistatus>\n"));
+        if (request.is_answered())
+            return request.unpause();
+        g_idle_add(
+            [](gpointer data) -> gboolean {
+                const std::unique_ptr<std::shared_ptr<Propfind>> self(static_cast<std::shared_ptr<Propfind> *>(data));
+                (*self)->go_on();
+                return G_SOURCE_REMOVE;
+            },
+            new std::shared_ptr<Propfind>(shared_from_this()));
+    }
+
+    void tell_next()
+    {
+        Level &level = levels.back();
+        if (level.next == level.entries.size())
+            return levels.pop_back();
+        const Entry entry = std::move(level.entries[level.next++]);
+        const auto digest = level.digests.find(entry.name);
+        const auto dead = level.properties.find(entry.name);
+        static const DeadProperties none;
+        std::string href = level.path.href(true);
+        append_encoded(href, entry.name);
+        if (entry.kind == Entry::FOLDER)
+            href += '/';
+        Path below = level.path;
+        below.parts.push_back(entry.name);
+        read_locks(below);
+        respond(entry, href, dead == level.properties.end() ? none : dead->second,
+                digest != level.digests.end() && digest->second.valid_for(entry) ? digest->second.sha256 : "");
+        if (entry.kind != Entry::FOLDER || depth == 1 || levels.size() > LEVELS)
+            return;
+        if (Fd open = open_folder(level.folder.fd, Path{{entry.name}, false}, 1); open)
+            enter(std::move(open), below);
     }
 
     void respond(const Entry &entry, const std::string &href, const DeadProperties &dead, const std::string &digest)
@@ -208,7 +291,7 @@ class Propfind {
             value = std::to_string(quota_left);
             return !file;
         case Live::QUOTA_USED:
-            value = std::to_string(request.account->used);
+            value = std::to_string(request.account->stored());
             return !file;
         case Live::SHA256:
             value = digest;
@@ -247,7 +330,11 @@ class Propfind {
     }
 
     Request &request;
-    const PropfindBody &body;
+    const std::shared_ptr<Message> kept;
+    const PropfindBody body;
+    const int depth; // 0, 1 or more
+    std::vector<Level> levels;
+    bool is_waiting = false; // for the entries of the last level
     std::vector<Wanted> wanted;
     bool need_digest = false, need_dead = false;
     int64_t quota_left = 0;
@@ -266,11 +353,12 @@ void dav_propfind(Request &request)
     PropfindBody body;
     if (!read_propfind(request.body, body))
         return request.answer(400);
+    if (body.properties.size() > NAMES_AT_MOST)
+        return request.answer(413);
     const Entry entry = request.look_up();
     if (entry.kind != Entry::FILE && entry.kind != Entry::FOLDER)
         return request.answer(404);
-    Propfind propfind(request, body);
-    request.answer(207, XML_TYPE, propfind.answer(entry, depth == "0" ? 0 : depth == "1" ? 1 : 2));
+    std::make_shared<Propfind>(request, std::move(body), depth == "0" ? 0 : depth == "1" ? 1 : 2)->begin(entry);
 }
 
 void dav_proppatch(Request &request)
@@ -278,6 +366,8 @@ void dav_proppatch(Request &request)
     std::vector<PropertyUpdate> updates;
     if (!read_proppatch(request.body, updates))
         return request.answer(400);
+    if (updates.size() > NAMES_AT_MOST)
+        return request.answer(413);
     const Entry entry = request.look_up();
     if (entry.kind != Entry::FILE && entry.kind != Entry::FOLDER)
         return request.answer(404);

@@ -14,7 +14,7 @@ struct Upload {
     Service *service = nullptr;
     Account *account = nullptr;
     std::string temporary;
-    Fd file;
+    Fd file, folder; // the folder that it goes to, in the end
     Sha256 sha256;
     std::string wanted_digest; // hexadecimal, of the client's Repr-Digest; or empty
     bool only_new = false;     // If-None-Match: *
@@ -162,7 +162,7 @@ void put_chunk(Request &request, const char *bytes, size_t size)
     }
 }
 
-// Puts the whole file to its name. The result is 201, 204 or the status of what went wrong.
+// Puts the whole file to its name, not yet for good. The result is 201, 204 or the status of what went wrong.
 static int store(Request &request)
 {
     Upload &upload = *request.upload;
@@ -176,46 +176,50 @@ static int store(Request &request)
         return status_of_errno(upload.sync_error);
     // Much may have happened while the body arrived.
     Entry old;
-    const Fd folder = request.parent();
-    if (const int status = check_target(request, folder, old))
+    upload.folder = request.parent();
+    if (const int status = check_target(request, upload.folder, old))
         return status;
     int64_t freed = 0;
     std::string aside; // stays empty: no folder is replaced
     const int status =
-        move_entry(service.temporary.fd, upload.temporary, folder.fd, request.path.name(),
+        move_entry(service.temporary.fd, upload.temporary, upload.folder.fd, request.path.name(),
                    upload.only_new ? Overwrite::NO : Overwrite::YES, service.temporary.fd, &freed, &aside);
     if (status >= 300)
         return status;
     upload.file = Fd();
-    fsync(folder.fd);
     request.account->count(upload.received - freed);
     if (status == 201)
-        service.metadata.forget(*request.account, request.path);
-    const Entry entry = look(folder.fd, request.path.name());
+        service.metadata.forget_file(*request.account, request.path);
+    const Entry entry = look(upload.folder.fd, request.path.name());
     service.metadata.set_digest(*request.account, request.path.folder(), entry, digest);
     request.set_header("ETag", entry.etag());
     request.set_header("Repr-Digest", repr_digest(digest));
     return status;
 }
 
-static void store_and_answer(Request &request)
+static void finish(Request &request, int status)
 {
-    const int status = store(request);
     put_drop(request);
     request.answer(status);
     if (status < 300 && request.service->faults.lose_reply > 0 && --request.service->faults.lose_reply == 0)
         request.cut();
 }
 
+// The content and then its name are on the disk before the answer is given. Both wait on threads of their own, so that
+// the uploads of several connections wait at the same time: file systems take such waits together.
 void put_finish(Request &request)
 {
     if (!request.upload)
         return request.answer(500);
     Upload *upload = request.upload;
-    if (upload->received < FLUSH_STEP) {
-        upload->sync();
-        return store_and_answer(request);
-    }
+    const auto sync_name = [&request, upload] {
+        const int status = store(request);
+        if (status >= 300)
+            return finish(request, status);
+        in_thread(
+            request, [upload] { fsync(upload->folder.fd); }, [&request, status] { finish(request, status); },
+            &request.service->syncers);
+    };
     in_thread(
-        request, [upload] { upload->sync(); }, [&request] { store_and_answer(request); });
+        request, [upload] { upload->sync(); }, sync_name, &request.service->syncers);
 }

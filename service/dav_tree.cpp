@@ -149,7 +149,8 @@ static void start_copy(Request &request, Fd from, const Fd &to, const Path &targ
 {
     const Entry source = look(from.fd, request.path.name()), old = look(to.fd, target.name());
     const int64_t size = deep || source.kind == Entry::FILE ? tree_size(from.fd, request.path.name()) : 0;
-    const int64_t more = size - (old.kind == Entry::NONE ? 0 : tree_size(to.fd, target.name()));
+    const int64_t properties = request.service->metadata.properties_size(*request.account, request.path, deep);
+    const int64_t more = size + properties - (old.kind == Entry::NONE ? 0 : tree_size(to.fd, target.name()));
     if (overwrite == Overwrite::NO && old.kind != Entry::NONE)
         return request.answer(412);
     if (more > request.account->left())

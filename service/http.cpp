@@ -131,7 +131,7 @@ static void account_info(Request &request)
     const Account &account = *request.account;
     Stmt json(request.service->db, "SELECT json_object('email', ?, 'display_name', ?, 'used', ?, 'total', ?)");
     json.bind(1, account.email).bind(2, account.display_name);
-    json.bind(3, static_cast<long long>(account.used)).bind(4, static_cast<long long>(account.quota));
+    json.bind(3, static_cast<long long>(account.stored())).bind(4, static_cast<long long>(account.quota));
     if (!json.row())
         return request.answer(500);
     request.set_header("Cache-Control", "no-store");
@@ -184,6 +184,7 @@ Request::~Request()
 void Request::ended()
 {
     put_drop(*this);
+    large_answer.reset();
 }
 
 void Request::got_body(const char *bytes, size_t size)

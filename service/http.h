@@ -26,9 +26,11 @@ struct Service {
     std::string media_secret; // of the signatures of addresses
     Faults faults;
     Workers workers{4};
-    Workers painters{2}; // of thumbnails: bounds their memory, and leaves time for others
-    Workers hashers{2};  // of passwords
-    Attempts attempts;   // at passwords
+    Workers painters{2};   // of thumbnails: bounds their memory, and leaves time for others
+    Workers hashers{2};    // of passwords
+    Workers syncers{16};   // of finished uploads: they only wait for the disk
+    Attempts attempts;     // at passwords
+    int large_answers = 0; // being made or sent
 };
 
 struct Upload;
@@ -41,10 +43,11 @@ struct Request : Message {
     Account *account = nullptr; // borrowed
     Path path;                  // of the file or folder; empty until the address or the body has named it
     Area area = Area::DAV;
-    std::vector<std::string> tokens; // of locks, that the request has named
-    Upload *upload = nullptr;        // owned; of a PUT whose body is being received
-    int jobs = 0;                    // on other threads, for this request
-    std::string body;                // of methods other than PUT, as far as it has come
+    std::vector<std::string> tokens;    // of locks, that the request has named
+    Upload *upload = nullptr;           // owned; of a PUT whose body is being received
+    int jobs = 0;                       // on other threads, for this request
+    std::string body;                   // of methods other than PUT, as far as it has come
+    std::shared_ptr<void> large_answer; // counted in the service while it lives
 
     ~Request() override;
     void got_headers() override;

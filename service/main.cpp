@@ -53,6 +53,16 @@ static void remove_temporary_files(const Service &service)
     }
 }
 
+// Tells of each statement when it is first run.
+static int log_statement(unsigned, void *, void *statement, void *)
+{
+    static std::set<std::string> known;
+    const char *text = sqlite3_sql(static_cast<sqlite3_stmt *>(statement));
+    if (text && known.insert(text).second)
+        std::fprintf(stderr, "sql: %s\n", text);
+    return 0;
+}
+
 namespace {
 struct Running {
     Service &service;
@@ -152,7 +162,7 @@ static int run(Service &service, const Fd &root_folder, const Options &options)
         for (const guint source : signals)
             g_source_remove(source);
     }
-    while (service.workers.busy() || service.painters.busy() || service.hashers.busy())
+    while (service.workers.busy() || service.painters.busy() || service.hashers.busy() || service.syncers.busy())
         g_main_context_iteration(nullptr, TRUE);
     remove_temporary_files(service);
     return 0;
@@ -169,6 +179,8 @@ int main(int argc, char **argv)
     std::string reason;
     if (!open_service(options.root, service, root, reason))
         return complain(EXIT_TROUBLE, reason);
+    if (options.logs_sql)
+        sqlite3_trace_v2(service.db.handle.get(), SQLITE_TRACE_STMT, log_statement, nullptr);
     for (const std::string &email : options.accounts) {
         std::string password;
         if (!read_password(email, password))

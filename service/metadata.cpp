@@ -9,14 +9,34 @@ static const char SCHEMA[] =
     "NOT NULL, property TEXT NOT NULL, xml TEXT NOT NULL, PRIMARY KEY(account, folder, name, ns, property)) WITHOUT "
     "ROWID;";
 
-// Rows of ?1's paths below ?4; '0' is the character after '/'.
-#define BELOW "account = ?1 AND (folder = ?4 OR (folder > ?4 || '/' AND folder < ?4 || '0'))"
+// What lies below a path ?4 is in it, or in a folder below it ('0' is the character after '/'). These are two
+// conditions for two statements: with an OR between them SQLite reads all rows of the account.
+#define IN_IT "account = ?1 AND folder = ?4"
+#define DEEPER "account = ?1 AND folder > ?4 || '/' AND folder < ?4 || '0'"
 #define ITSELF "account = ?1 AND folder = ?2 AND name = ?3"
+
+// The bytes of all properties of an account, kept by triggers. They count as stored.
+#define SIZE_OF(row) "length(CAST(" row ".ns || " row ".property || " row ".xml AS BLOB))"
+static const char SIZES_SCHEMA[] =
+    "CREATE TABLE IF NOT EXISTS property_sizes(account INTEGER PRIMARY KEY, bytes INTEGER NOT NULL);"
+    "INSERT OR IGNORE INTO property_sizes SELECT account, sum(" SIZE_OF(
+        "properties") ") FROM properties GROUP BY account;"
+                      "CREATE TRIGGER IF NOT EXISTS property_added AFTER INSERT ON properties BEGIN "
+                      "INSERT INTO property_sizes VALUES(new.account, " SIZE_OF(
+                          "new") ") ON CONFLICT(account) DO UPDATE SET bytes = bytes + "
+                                 "excluded.bytes; END;"
+                                 "CREATE TRIGGER IF NOT EXISTS property_removed AFTER DELETE ON properties BEGIN "
+                                 "UPDATE property_sizes SET bytes = bytes - " SIZE_OF(
+                                     "old") " WHERE account = old.account; END;"
+                                            "CREATE TRIGGER IF NOT EXISTS property_changed AFTER UPDATE OF xml ON "
+                                            "properties BEGIN "
+                                            "UPDATE property_sizes SET bytes = bytes + " SIZE_OF("new") " - " SIZE_OF(
+                                                "old") " WHERE account = new.account; END;";
 
 bool Metadata::open(Db &database)
 {
     db = &database;
-    return db->run(SCHEMA);
+    return db->run(SCHEMA) && db->run(SIZES_SCHEMA);
 }
 
 static Stmt &bind_path(Stmt &statement, const Account &account, const Path &path)
@@ -77,9 +97,28 @@ std::unordered_map<std::string, DeadProperties> Metadata::properties_in(const Ac
     return found;
 }
 
-bool Metadata::change_properties(const Account &account, const Path &path, const DeadProperties &changes)
+int64_t Metadata::properties_size(const Account &account)
 {
-    Stmt set(*db, "INSERT OR REPLACE INTO properties VALUES(?, ?, ?, ?, ?, ?)");
+    Stmt row(*db, "SELECT bytes FROM property_sizes WHERE account = ?");
+    return row.bind(1, account.id).row() ? row.integer(0) : 0;
+}
+
+int64_t Metadata::properties_size(const Account &account, const Path &path, bool deep)
+{
+    int64_t bytes = 0;
+    Stmt itself(*db, "SELECT total(" SIZE_OF("properties") ") FROM properties WHERE " ITSELF);
+    bytes += bind_path(itself, account, path).row() ? itself.integer(0) : 0;
+    for (const char *sql : {"SELECT total(" SIZE_OF("properties") ") FROM properties WHERE " IN_IT,
+                            "SELECT total(" SIZE_OF("properties") ") FROM properties WHERE " DEEPER}) {
+        Stmt below(*db, sql);
+        bytes += deep && below.bind(1, account.id).bind(4, path.whole()).row() ? below.integer(0) : 0;
+    }
+    return bytes;
+}
+
+bool Metadata::change_properties(Account &account, const Path &path, const DeadProperties &changes)
+{
+    Stmt set(*db, "INSERT INTO properties VALUES(?, ?, ?, ?, ?, ?) ON CONFLICT DO UPDATE SET xml = excluded.xml");
     Stmt remove(*db, "DELETE FROM properties WHERE " ITSELF " AND ns = ?4 AND property = ?5");
     bool changed = db->run("BEGIN IMMEDIATE");
     for (const DeadProperty &change : changes) {
@@ -90,22 +129,34 @@ bool Metadata::change_properties(const Account &account, const Path &path, const
         changed = changed && statement.done();
         statement.reset();
     }
-    return db->run(changed ? "COMMIT" : "ROLLBACK") && changed;
+    const int64_t more = properties_size(account) - account.properties;
+    changed = changed && (more <= 0 || more <= account.left());
+    changed = db->run(changed ? "COMMIT" : "ROLLBACK") && changed;
+    account.properties = properties_size(account);
+    return changed;
 }
 
-void Metadata::forget(const Account &account, const Path &path)
+void Metadata::forget_file(Account &account, const Path &path)
 {
     for (const char *sql : {"DELETE FROM digests WHERE " ITSELF, "DELETE FROM properties WHERE " ITSELF}) {
         Stmt row(*db, sql);
         bind_path(row, account, path).done();
     }
-    for (const char *sql : {"DELETE FROM digests WHERE " BELOW, "DELETE FROM properties WHERE " BELOW}) {
+    account.properties = properties_size(account);
+}
+
+void Metadata::forget(Account &account, const Path &path)
+{
+    forget_file(account, path);
+    for (const char *sql : {"DELETE FROM digests WHERE " IN_IT, "DELETE FROM digests WHERE " DEEPER,
+                            "DELETE FROM properties WHERE " IN_IT, "DELETE FROM properties WHERE " DEEPER}) {
         Stmt row(*db, sql);
         row.bind(1, account.id).bind(4, path.whole()).done();
     }
+    account.properties = properties_size(account);
 }
 
-void Metadata::moved(const Account &account, const Path &from, const Path &to)
+void Metadata::moved(Account &account, const Path &from, const Path &to)
 {
     db->run("BEGIN IMMEDIATE");
     forget(account, to);
@@ -114,25 +165,30 @@ void Metadata::moved(const Account &account, const Path &from, const Path &to)
         Stmt row(*db, sql);
         bind_path(row, account, from).bind(5, to.folder()).bind(6, to.name()).done();
     }
-    for (const char *sql : {"UPDATE digests SET folder = ?5 || substr(folder, length(?4) + 1) WHERE " BELOW,
-                            "UPDATE properties SET folder = ?5 || substr(folder, length(?4) + 1) WHERE " BELOW}) {
+    for (const char *sql :
+         {"UPDATE digests SET folder = ?5 || substr(folder, length(?4) + 1) WHERE " DEEPER,
+          "UPDATE properties SET folder = ?5 || substr(folder, length(?4) + 1) WHERE " DEEPER,
+          "UPDATE digests SET folder = ?5 WHERE " IN_IT, "UPDATE properties SET folder = ?5 WHERE " IN_IT}) {
         Stmt row(*db, sql);
         row.bind(1, account.id).bind(4, from.whole()).bind(5, to.whole()).done();
     }
     db->run("COMMIT");
 }
 
-void Metadata::copied(const Account &account, const Path &from, const Path &to, bool deep,
+void Metadata::copied(Account &account, const Path &from, const Path &to, bool deep,
                       const std::vector<CopiedFile> &files)
 {
     db->run("BEGIN IMMEDIATE");
     forget(account, to);
     Stmt itself(*db, "INSERT INTO properties SELECT account, ?5, ?6, ns, property, xml FROM properties WHERE " ITSELF);
     bind_path(itself, account, from).bind(5, to.folder()).bind(6, to.name()).done();
-    if (deep) {
-        Stmt below(*db, "INSERT INTO properties SELECT account, ?5 || substr(folder, length(?4) + 1), name, ns, "
-                        "property, xml FROM properties WHERE " BELOW);
-        below.bind(1, account.id).bind(4, from.whole()).bind(5, to.whole()).done();
+    for (const char *sql :
+         {"INSERT INTO properties SELECT account, ?5 || substr(folder, length(?4) + 1), name, ns, "
+          "property, xml FROM properties WHERE " DEEPER,
+          "INSERT INTO properties SELECT account, ?5, name, ns, property, xml FROM properties WHERE " IN_IT}) {
+        Stmt below(*db, sql);
+        if (deep)
+            below.bind(1, account.id).bind(4, from.whole()).bind(5, to.whole()).done();
     }
     for (const CopiedFile &file : files) {
         Path old_path = from, new_path = to;

@@ -34,14 +34,19 @@ class Metadata {
     DeadProperties properties(const Account &account, const Path &path);
     // The dead properties of what is in a folder, by name.
     std::unordered_map<std::string, DeadProperties> properties_in(const Account &account, const Path &folder);
-    // Sets the properties that have an `xml` and removes those without, all or none.
-    bool change_properties(const Account &account, const Path &path, const DeadProperties &changes);
+    // Sets the properties that have an `xml` and removes those without, all or none: none when the account's quota does
+    // not allow it. This and the changes below keep account.properties.
+    bool change_properties(Account &account, const Path &path, const DeadProperties &changes);
+    // Bytes of the account's properties; of those of a path, and of what is below it if `deep`.
+    int64_t properties_size(const Account &account);
+    int64_t properties_size(const Account &account, const Path &path, bool deep);
 
+    // Of a path below which there is nothing.
+    void forget_file(Account &account, const Path &path);
     // All of these act on a path and what is below it; the path is never the root.
-    void forget(const Account &account, const Path &path);
-    void moved(const Account &account, const Path &from, const Path &to);
-    void copied(const Account &account, const Path &from, const Path &to, bool deep,
-                const std::vector<CopiedFile> &files);
+    void forget(Account &account, const Path &path);
+    void moved(Account &account, const Path &from, const Path &to);
+    void copied(Account &account, const Path &from, const Path &to, bool deep, const std::vector<CopiedFile> &files);
 
   private:
     Db *db = nullptr;

@@ -7,7 +7,7 @@ struct Options {
     std::vector<std::string> accounts, tokens; // addresses
     int64_t quota = -1;                        // bytes; -1: not given
     Faults faults;
-    bool is_serving = false, logs = false;
+    bool is_serving = false, logs = false, logs_sql = false;
 };
 
 // 0, or the exit code of a wrong command line, of which standard error has been told.

@@ -74,6 +74,11 @@ class Message : public std::enable_shared_from_this<Message> {
     void answer(int code, const char *type, std::string content);
     // `bytes` of the file from `start` on. Of HEAD only the length is told.
     void answer_file(int code, Fd file, int64_t start, int64_t bytes);
+    // Its connection is no longer there.
+    bool has_ended() const
+    {
+        return connection == nullptr;
+    }
     bool is_answered() const
     {
         return answer_status != 0;

@@ -1,13 +1,15 @@
 #include "tree.h"
 #include <algorithm>
+#include <atomic>
 #include <cerrno>
 #include <cstdio>
 #include <dirent.h>
 #include <fcntl.h>
+#include <functional>
 #include <memory>
 #include <sys/stat.h>
 
-// Deeper trees would use up the file descriptors: one is open per level.
+// Deeper trees are not copied: they would use up the file descriptors, of which two are open per level.
 static const int LEVELS = 512;
 static const size_t COPY_STEP = 64 << 20;
 
@@ -113,50 +115,76 @@ static Fd enter(int folder, const std::string &name)
     return Fd(openat(folder, name.empty() ? "." : name.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
 }
 
-static int64_t size_below(int folder, const Entry &entry, int level)
+static uint64_t inode_of(int folder)
 {
-    if (entry.kind != Entry::FOLDER)
-        return entry.size;
-    int64_t sum = 0;
-    std::vector<Entry> entries;
-    const Fd inner = level < LEVELS ? enter(folder, entry.name) : Fd();
-    if (inner && list_all(inner.fd, entries))
-        for (const Entry &item : entries)
-            sum += size_below(inner.fd, item, level + 1);
-    return sum;
+    struct stat st;
+    return fstat(folder, &st) == 0 ? st.st_ino : 0;
+}
+
+// Calls `leave` for the entry and all below it, each after what it holds, with the open folder that it is in. One
+// folder is open at a time, however deep the tree. False when `leave` says so, or somebody moves a folder away
+// meanwhile.
+static bool walk(int folder, const Entry &root, const std::function<bool(int folder, const Entry &entry)> &leave)
+{
+    struct Level {
+        Entry self;
+        uint64_t parent; // the inode of the folder around it
+        std::vector<Entry> entries;
+        size_t next = 0;
+    };
+    std::vector<Level> levels;
+    Fd here = enter(folder, "");
+    const auto go_down = [&](const Entry &entry) {
+        Fd inner = entry.kind == Entry::FOLDER ? enter(here.fd, entry.name) : Fd();
+        Level level{entry, inode_of(here.fd), {}};
+        if (!inner || !list_all(inner.fd, level.entries))
+            return leave(here.fd, entry);
+        levels.push_back(std::move(level));
+        here = std::move(inner);
+        return true;
+    };
+    if (!here || !go_down(root))
+        return false;
+    while (!levels.empty()) {
+        Level &level = levels.back();
+        if (level.next < level.entries.size()) {
+            const Entry entry = std::move(level.entries[level.next++]);
+            if (!go_down(entry))
+                return false;
+            continue;
+        }
+        const Level done = std::move(level);
+        levels.pop_back();
+        here = levels.empty() ? enter(folder, "") : Fd(openat(here.fd, "..", O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+        if (!here || inode_of(here.fd) != done.parent) {
+            errno = ENOENT;
+            return false;
+        }
+        if (!leave(here.fd, done.self))
+            return false;
+    }
+    return true;
 }
 
 int64_t tree_size(int folder, const std::string &name)
 {
-    return size_below(folder, look(folder, name), 0);
-}
-
-static bool remove_below(int folder, const Entry &entry, int64_t &bytes, int level)
-{
-    if (entry.kind != Entry::FOLDER) {
-        if (unlinkat(folder, entry.name.c_str(), 0) != 0)
-            return false;
-        bytes += entry.size;
+    int64_t sum = 0;
+    walk(folder, look(folder, name), [&](int, const Entry &entry) {
+        sum += entry.size;
         return true;
-    }
-    if (level == LEVELS) {
-        errno = EMFILE;
-        return false;
-    }
-    std::vector<Entry> entries;
-    const Fd inner = enter(folder, entry.name);
-    if (!inner || !list_all(inner.fd, entries))
-        return false;
-    for (const Entry &item : entries)
-        if (!remove_below(inner.fd, item, bytes, level + 1))
-            return false;
-    return unlinkat(folder, entry.name.c_str(), AT_REMOVEDIR) == 0;
+    });
+    return sum;
 }
 
 bool remove_tree(int folder, const std::string &name, int64_t *bytes)
 {
     int64_t removed = 0;
-    const bool whole = remove_below(folder, look(folder, name), removed, 0);
+    const bool whole = walk(folder, look(folder, name), [&](int inside, const Entry &entry) {
+        if (unlinkat(inside, entry.name.c_str(), entry.kind == Entry::FOLDER ? AT_REMOVEDIR : 0) != 0)
+            return false;
+        removed += entry.size;
+        return true;
+    });
     if (bytes)
         *bytes += removed;
     return whole;
@@ -266,6 +294,6 @@ int move_entry(int from, const std::string &from_name, int to, const std::string
 
 std::string temporary_name(const char *kind)
 {
-    static unsigned long long count = 0;
+    static std::atomic<unsigned long long> count = 0;
     return kind + std::string("-") + std::to_string(getpid()) + "-" + std::to_string(++count);
 }

@@ -1,4 +1,5 @@
 #include "xml.h"
+#include "base/xml_guard.h"
 #include <cstring>
 #include <libxml/parser.h>
 #include <libxml/tree.h>
@@ -16,9 +17,12 @@ using Doc = std::unique_ptr<xmlDoc, FreeDoc>;
 // Entities have no place in these bodies: a document type declaration is refused.
 static Doc parse(const std::string &body)
 {
+    XmlGuard guard;
+    if (!guard.feed(body.data(), body.size()))
+        return nullptr;
     xmlParserCtxt *context = xmlNewParserCtxt();
     Doc doc(xmlCtxtReadMemory(context, body.data(), static_cast<int>(body.size()), nullptr, nullptr,
-                              XML_PARSE_NONET | XML_PARSE_NOERROR | XML_PARSE_NOWARNING));
+                              XML_PARSE_NONET | XML_PARSE_IGNORE_ENC | XML_PARSE_NOERROR | XML_PARSE_NOWARNING));
     if (!context->wellFormed || !context->nsWellFormed || (doc && doc->intSubset))
         doc.reset();
     xmlFreeParserCtxt(context);

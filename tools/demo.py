@@ -186,13 +186,14 @@ def main():
     # However it is ended, nothing stays behind.
     for number in (signal.SIGTERM, signal.SIGHUP):
         signal.signal(number, lambda *_: sys.exit(1))
-    device = Device(os.path.abspath(options.build), options.data, keep_display=not options.headless)
+    device = Device(os.path.abspath(options.build), options.data, keep_display=not options.headless,
+                    secure=True)
     try:
         if not options.headless and not device.has_display():
             say("no window can be opened on this display; using a virtual one")
             device.end()
             options.headless = True
-            device = Device(os.path.abspath(options.build), options.data)
+            device = Device(os.path.abspath(options.build), options.data, secure=True)
         prepare(device, folder, options.headless)
         files = [os.path.abspath(file) for file in options.files] or sample_pictures(device)
         before = device.all_files()

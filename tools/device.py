@@ -7,6 +7,7 @@ import os
 import re
 import shutil
 import signal
+import ssl
 import subprocess
 import tempfile
 import threading
@@ -37,12 +38,13 @@ def wait_for(what, condition, seconds=20.0, pause=0.05):
 
 class Device:
     def __init__(self, build, data=None, size="480x800", language=None, scale=None, dark=False,
-                 keep_display=False, maximized=True):
-        self.build, self.size, self.maximized = build, size, maximized
+                 keep_display=False, maximized=True, secure=False):
+        self.build, self.size, self.maximized, self.secure = build, size, maximized, secure
         self.home = tempfile.mkdtemp(prefix="velora-")
         self.data = data or os.path.join(self.home, "cloud")
         self.processes = []
         self.port = 0
+        self.authority = None  # the certificate that this device trusts, and no other
         self.env = dict(os.environ)
         runtime = os.path.join(self.home, "run")
         os.makedirs(runtime, mode=0o700)
@@ -170,15 +172,32 @@ class Device:
 
     # the service and the account
 
+    def make_authority(self):
+        """A certificate authority of this device's own, whose key is gone at once, and a certificate of the service."""
+        def at(name):
+            return os.path.join(self.home, name)
+        new_key = ("-newkey", "ec", "-pkeyopt", "ec_paramgen_curve:P-256", "-noenc", "-days", "365")
+        self.run("openssl", "req", "-x509", *new_key, "-keyout", at("authority.key"), "-out", at("authority.pem"),
+                 "-subj", "/CN=Velora demo authority", "-addext", "keyUsage=critical,keyCertSign")
+        self.run("openssl", "req", "-x509", *new_key, "-keyout", at("service.key"), "-out", at("service.pem"),
+                 "-CA", at("authority.pem"), "-CAkey", at("authority.key"), "-subj", "/CN=velora-cloud",
+                 "-addext", "basicConstraints=critical,CA:FALSE", "-addext", "subjectAltName=IP:127.0.0.1")
+        os.unlink(at("authority.key"))
+        return at("authority.pem"), at("service.pem"), at("service.key")
+
     def start_service(self, *options):
         """Starts velora-cloud, a second time at the port that it had."""
+        if self.secure and not self.authority:
+            self.authority, self.certificate, self.key_file = self.make_authority()
+        if self.secure:
+            options += ("--tls-certificate", self.certificate, "--tls-key", self.key_file)
         cloud = self.start([self.program("service/velora-cloud"), "--root", self.data, "--listen",
                             f"127.0.0.1:{self.port}", "--add-account", EMAIL, *options],
                            stdin=subprocess.PIPE, stdout=subprocess.PIPE)
         cloud.stdin.write(PASSWORD.encode() + b"\n")
         cloud.stdin.close()
         for line in cloud.stdout:
-            found = re.match(r"listening on (http://\S+)", line.decode())
+            found = re.match(r"listening on (https?://\S+)", line.decode())
             if found:
                 break
         else:
@@ -188,6 +207,8 @@ class Device:
         self.port = urllib.parse.urlsplit(self.web).port
         with open(os.path.join(self.env["CLOUD_SERVICES_DIR"], "Velora.conf"), "w", encoding="utf-8") as file:
             file.write(f"[Service]\nWeb={self.web}/\nApi={self.web}/\nStorage={self.web}/dav/\n")
+            if self.authority:
+                file.write(f"CAFile={self.authority}\n")
         return cloud
 
     def hurry(self):
@@ -210,7 +231,8 @@ class Device:
                                          data=body, method=method, headers=headers or {})
         secret = base64.b64encode(f"{EMAIL}:{PASSWORD}".encode()).decode()
         request.add_header("Authorization", "Basic " + secret)
-        return urllib.request.urlopen(request, timeout=60)
+        trusted = ssl.create_default_context(cafile=self.authority) if self.authority else None
+        return urllib.request.urlopen(request, timeout=60, context=trusted)
 
     def make_folder(self, path):
         """Makes a cloud folder and those above it."""

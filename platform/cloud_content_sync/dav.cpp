@@ -1,4 +1,5 @@
 #include "cloud_content_sync/dav.h"
+#include "base/xml_guard.h"
 #include "cloud_content_sync/names.h"
 #include <cstring>
 #include <curl/curl.h>
@@ -36,6 +37,7 @@ struct MultistatusReader::State {
         }
     };
     std::unique_ptr<xmlParserCtxt, Close> parser;
+    XmlGuard guard;
     std::string root;
     std::vector<DavEntry> &entries;
     size_t received = 0;
@@ -196,7 +198,7 @@ MultistatusReader::MultistatusReader(std::string root) : state(std::make_unique<
     state->parser.reset(xmlCreatePushParserCtxt(&handler, state.get(), nullptr, 0, nullptr));
     if (!state->parser)
         abort();
-    xmlCtxtUseOptions(state->parser.get(), XML_PARSE_NONET);
+    xmlCtxtUseOptions(state->parser.get(), XML_PARSE_NONET | XML_PARSE_IGNORE_ENC);
 }
 
 MultistatusReader::~MultistatusReader() = default;
@@ -204,7 +206,7 @@ MultistatusReader::~MultistatusReader() = default;
 bool MultistatusReader::feed(const char *data, size_t size)
 {
     state->received += size;
-    if (state->received > ANSWER_BYTES_MAX)
+    if (state->received > ANSWER_BYTES_MAX || !state->guard.feed(data, size))
         state->refused = true;
     if (!state->refused && xmlParseChunk(state->parser.get(), data, static_cast<int>(size), 0) != XML_ERR_OK)
         state->refused = true;

@@ -131,8 +131,10 @@ Transfer *Http::start(std::unique_ptr<Transfer> owned, const Credentials &creden
     curl_easy_setopt(easy, CURLOPT_WRITEDATA, &transfer);
     curl_easy_setopt(easy, CURLOPT_HEADERFUNCTION, header_cb);
     curl_easy_setopt(easy, CURLOPT_HEADERDATA, &transfer);
-    if (!service.ca_file.empty())
+    if (!service.ca_file.empty()) { // these and no others
         curl_easy_setopt(easy, CURLOPT_CAINFO, service.ca_file.c_str());
+        curl_easy_setopt(easy, CURLOPT_CAPATH, nullptr);
+    }
     set_credentials(easy, credentials);
     set_body(easy, transfer);
 

@@ -19,6 +19,17 @@ TEST_F(Scripted, refused_lists_change_nothing)
     bomb += "]><d:multistatus xmlns:d=\"DAV:\">" + self + file("/r%20t/&j;") + "</d:multistatus>";
     const std::string outside = "<!DOCTYPE d SYSTEM \"" + server->url +
                                 "/fetched.dtd\"><d:multistatus xmlns:d=\"DAV:\">" + self + "</d:multistatus>";
+    std::string attributes = "<d:multistatus xmlns:d=\"DAV:\"><d:response", levels = "<d:multistatus xmlns:d=\"DAV:\">";
+    for (int i = 0; i < 400'000; i++) { // they kept a parser busy for a minute and a half
+        attributes += " a" + std::to_string(i) + "='<!--'";
+        levels += "<d>";
+    }
+    attributes += "/>" + self + "</d:multistatus>";
+    g_autofree char *wide = nullptr;
+    gsize wide_size = 0;
+    const std::string narrow = "<d:multistatus xmlns:d=\"DAV:\">" + self + "</d:multistatus>";
+    wide =
+        g_convert(narrow.data(), static_cast<gssize>(narrow.size()), "UTF-16", "UTF-8", nullptr, &wide_size, nullptr);
     struct Row {
         const char *what;
         std::string reply;
@@ -33,6 +44,11 @@ TEST_F(Scripted, refused_lists_change_nothing)
         {"another tree", multistatus(folder("/other/") + file("/r%20tail/x"))},
         {"entity bomb", answer("207 Multi-Status", bomb)},
         {"external subset", answer("207 Multi-Status", outside)},
+        {"attributes", answer("207 Multi-Status", attributes)},
+        {"levels", answer("207 Multi-Status", levels)},
+        {"a wide encoding", answer("207 Multi-Status", std::string(wide, wide_size))},
+        {"an encoding that hides",
+         answer("207 Multi-Status", "<?xml version='1.0' encoding='UTF-7'?>+ADw-d:multistatus/+AD4-")},
         {"no list", answer("200 OK", "fine")},
         {"redirect to itself", answer("301 Moved", "", "Location: " + server->url + "/r%20t/\r\n")},
         {"not found", answer("404 Not Found")},

@@ -213,14 +213,16 @@ inline Names names_in(const std::string &folder)
     return names;
 }
 
-// Bytes that are the same for the same seed.
+// Bytes that are the same for the same seed: a random block again and again, each time with its number.
 inline std::string some_bytes(size_t size, unsigned seed)
 {
     std::mt19937_64 random(seed);
+    std::vector<uint64_t> block(8 << 10);
+    for (uint64_t &word : block)
+        word = random();
     std::string bytes(size, '\0');
-    for (size_t at = 0; at < size; at += sizeof(uint64_t)) {
-        const uint64_t word = random();
-        std::memcpy(bytes.data() + at, &word, std::min(sizeof word, size - at));
-    }
+    const size_t step = block.size() * sizeof block[0];
+    for (size_t at = 0; at < size; at += step, block[0]++)
+        std::memcpy(bytes.data() + at, block.data(), std::min(step, size - at));
     return bytes;
 }

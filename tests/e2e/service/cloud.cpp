@@ -42,7 +42,8 @@ int free_port()
     return ntohs(address.sin_port);
 }
 
-pid_t spawn(std::vector<std::string> words, const fs::path &out, const fs::path &err, unsigned user, const fs::path &in)
+pid_t spawn(std::vector<std::string> words, const fs::path &out, const fs::path &err, unsigned user, const fs::path &in,
+            const std::function<void()> &before)
 {
     std::vector<char *> argv;
     for (std::string &word : words)
@@ -53,6 +54,8 @@ pid_t spawn(std::vector<std::string> words, const fs::path &out, const fs::path 
         return pid;
     if (user && (setgid(user) != 0 || setuid(user) != 0))
         _exit(126);
+    if (before)
+        before();
     prctl(PR_SET_PDEATHSIG, SIGKILL); // also when the test crashes; a change of user would clear it
     if (freopen(in.c_str(), "r", stdin) && (out.empty() || freopen(out.c_str(), "w", stdout)) &&
         (err.empty() || freopen(err.c_str(), "w", stderr)))
@@ -76,7 +79,8 @@ Run run_cloud(std::vector<std::string> arguments, const std::string &input)
     return {code, read_file(folder / "out"), read_file(folder / "err")};
 }
 
-Cloud::Cloud(Headers more, std::string passwords) : options(std::move(more)), input("secret\n" + passwords)
+Cloud::Cloud(Headers more, std::string passwords, std::function<void()> first)
+    : options(std::move(more)), input("secret\n" + passwords), before_start(std::move(first))
 {
     start();
 }
@@ -84,7 +88,7 @@ Cloud::Cloud(Headers more, std::string passwords) : options(std::move(more)), in
 Cloud::~Cloud()
 {
     if (pid) {
-        EXPECT_EQ(stop(SIGTERM), 0); // also what a sanitizer has found
+        EXPECT_EQ(stop(SIGTERM), 0) << read_file(place / "err"); // also what a sanitizer has found
     }
 }
 
@@ -95,11 +99,11 @@ void Cloud::start()
     words.insert(words.end(), options.begin(), options.end());
     const fs::path out = place / "out";
     write_file(out, "");
-    pid = spawn(words, out, {}, 0, place.file("in", input));
-    const std::string before = "listening on ";
-    comes_true([&] { return read_file(out).find(before) != std::string::npos && read_file(out).back() == '\n'; });
+    pid = spawn(words, out, place / "err", 0, place.file("in", input), before_start);
+    const std::string line = "listening on ";
+    comes_true([&] { return read_file(out).find(line) != std::string::npos && read_file(out).back() == '\n'; });
     const std::string text = read_file(out);
-    url = text.substr(text.find(before) + before.size());
+    url = text.substr(text.find(line) + line.size());
     url.resize(url.find_last_of('/'));
     port = std::stoi(url.substr(url.rfind(':') + 1));
 }
@@ -144,6 +148,8 @@ Answer ask_url(const std::string &method, const std::string &url, Headers header
     for (const std::string &header : headers)
         list = curl_slist_append(list, header.c_str());
     curl_easy_setopt(curl, CURLOPT_URL, url.c_str());
+    if (const char *authority = getenv("CLOUD_TEST_CA"))
+        curl_easy_setopt(curl, CURLOPT_CAINFO, authority);
     curl_easy_setopt(curl, CURLOPT_PATH_AS_IS, 1L);
     curl_easy_setopt(curl, CURLOPT_TIMEOUT, 20L);
     curl_easy_setopt(curl, CURLOPT_CUSTOMREQUEST, method.c_str());
@@ -193,6 +199,11 @@ size_t Cloud::temporary_files() const
     return static_cast<size_t>(std::distance(fs::directory_iterator(root / "tmp"), {}));
 }
 
+size_t Cloud::descriptors() const
+{
+    return static_cast<size_t>(std::distance(fs::directory_iterator("/proc/" + std::to_string(pid) + "/fd"), {}));
+}
+
 static int connected(int fd, int port)
 {
     const sockaddr_in address = local_address(port);
@@ -229,4 +240,13 @@ int Connection::status() const
     for (ssize_t count; text.find("\r\n") == std::string::npos && (count = recv(fd, block, sizeof block, 0)) > 0;)
         text.append(block, static_cast<size_t>(count));
     return text.starts_with("HTTP/1.1 ") ? std::stoi(text.substr(9, 3)) : 0;
+}
+
+std::string Connection::all() const
+{
+    std::string text;
+    char block[4096];
+    for (ssize_t count; (count = recv(fd, block, sizeof block, 0)) > 0;)
+        text.append(block, static_cast<size_t>(count));
+    return text;
 }

@@ -1,6 +1,7 @@
 #pragma once
 // Servers of a test's own, velora-cloud above all, and requests to them.
 #include "temp_home.h"
+#include <functional>
 #include <map>
 #include <sys/types.h>
 #include <vector>
@@ -27,9 +28,10 @@ std::string basic_authorization(const std::string &user, const std::string &pass
 // A port of 127.0.0.1 that nobody has now.
 int free_port();
 
-// Runs a program whose output and messages go to files, and whose input comes from one; gives its process.
+// Runs a program whose output and messages go to files, and whose input comes from one; gives its process, in which
+// `before` was called first.
 pid_t spawn(std::vector<std::string> words, const std::filesystem::path &out, const std::filesystem::path &err,
-            unsigned user = 0, const std::filesystem::path &in = "/dev/null");
+            unsigned user = 0, const std::filesystem::path &in = "/dev/null", const std::function<void()> &before = {});
 // Waits for its end: the exit code, or -1 when a signal killed it.
 int end_of(pid_t pid);
 
@@ -44,7 +46,7 @@ Run run_cloud(std::vector<std::string> arguments, const std::string &input = "")
 // the input has the passwords of further ones.
 class Cloud {
   public:
-    explicit Cloud(Headers options = {}, std::string input = "");
+    explicit Cloud(Headers options = {}, std::string input = "", std::function<void()> before = {});
     ~Cloud();
     // Ends the service by the signal; the result is its exit code, or -1 when the signal killed it.
     int stop(int signal);
@@ -58,6 +60,8 @@ class Cloud {
     // Files of the account's folder, and of the folder for temporary files.
     std::filesystem::path file(const std::string &name) const;
     size_t temporary_files() const;
+    // How many the service has open.
+    size_t descriptors() const;
 
     TempFolder place;
     std::filesystem::path root = place / "root";
@@ -67,6 +71,7 @@ class Cloud {
   private:
     Headers options;
     std::string input;
+    std::function<void()> before_start;
     pid_t pid = 0;
 };
 
@@ -85,6 +90,8 @@ class Connection {
     void send(const std::string &bytes) const;
     // The status of the answer; 0 when the connection ends without one.
     int status() const;
+    // All that comes until its end.
+    std::string all() const;
 
   private:
     const int fd;
