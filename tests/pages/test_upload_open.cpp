@@ -124,7 +124,7 @@ TEST_F(Opening, AnswersWhenNothingCanBeOpened)
             fake_cloud_fail_content(CLOUD_CONTENT_SYNC_ERROR_NETWORK);
             ASSERT_TRUE(driver::click_row(row(0)));
             EXPECT_TRUE(wait_for([&] { return log.has(c.message); }));
-            EXPECT_EQ(s_vd->ad->popup, nullptr) << "no wait for what will not come";
+            EXPECT_TRUE(wait_for([] { return !s_vd->ad->popup; })) << "no wait for what will not come";
             EXPECT_EQ(told(), "");
         });
     }
