@@ -147,6 +147,7 @@ static int run(Service &service, const Fd &root_folder, const Options &options)
             request->service = &service;
             return request;
         });
+        server.patience = options.patience;
         if (options.logs)
             server.log = [](const std::string &line) { std::fprintf(stderr, "%s\n", line.c_str()); };
         if (const int code = start_listening(options, server))

@@ -82,7 +82,7 @@ namespace {
 struct Words {
     char *root = nullptr, *listen = nullptr, *quota = nullptr, *fail = nullptr, *certificate = nullptr, *key = nullptr;
     char **accounts = nullptr, **tokens = nullptr;
-    int delay = 0, lose_reply = 0;
+    int delay = 0, lose_reply = 0, patience = 0;
     gboolean logs = FALSE, logs_sql = FALSE, plain = FALSE;
 
     ~Words()
@@ -115,6 +115,8 @@ static bool parse(int &argc, char **&argv, Words &words, std::string &reason)
         {"token", 0, 0, G_OPTION_ARG_STRING_ARRAY, &words.tokens,
          "Print a new bearer token of the account; serves only when --listen is given too", "EMAIL"},
         {"log", 0, 0, G_OPTION_ARG_NONE, &words.logs, "Write a line per request to standard error", nullptr},
+        {"patience", 0, 0, G_OPTION_ARG_INT, &words.patience,
+         "For tests: end connections after so long without headers, a request or bytes of a body", "SECONDS"},
         {"log-sql", 0, 0, G_OPTION_ARG_NONE, &words.logs_sql,
          "For tests: write each statement for the database once to standard error", nullptr},
         {"fail", 0, 0, G_OPTION_ARG_STRING, &words.fail, "For tests: answer the next COUNT uploads with STATUS",
@@ -160,6 +162,8 @@ int read_options(int argc, char **argv, Options &options)
     options.listen = words.listen ? words.listen : options.listen;
     options.certificate = text_of(words.certificate);
     options.key = text_of(words.key);
+    if (words.patience > 0)
+        options.patience = {words.patience, words.patience, words.patience, words.patience};
     options.logs = words.logs;
     options.logs_sql = words.logs_sql;
     options.is_serving = words.listen || (!words.accounts && !words.tokens);

@@ -7,6 +7,7 @@ struct Options {
     std::vector<std::string> accounts, tokens; // addresses
     int64_t quota = -1;                        // bytes; -1: not given
     Faults faults;
+    Patience patience;
     bool is_serving = false, logs = false, logs_sql = false;
 };
 

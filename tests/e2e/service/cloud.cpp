@@ -7,6 +7,7 @@
 #include <gtest/gtest.h>
 #include <sstream>
 #include <sys/prctl.h>
+#include <sys/resource.h>
 #include <sys/socket.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -99,7 +100,15 @@ void Cloud::start()
     words.insert(words.end(), options.begin(), options.end());
     const fs::path out = place / "out";
     write_file(out, "");
-    pid = spawn(words, out, place / "err", 0, place.file("in", input), before_start);
+    const bool is_sanitized = getenv("ASAN_OPTIONS") || getenv("TSAN_OPTIONS");
+    const auto limit = [this, is_sanitized] {
+        const rlimit memory = {2LL << 30, 2LL << 30};
+        if (!is_sanitized)
+            setrlimit(RLIMIT_AS, &memory);
+        if (before_start)
+            before_start();
+    };
+    pid = spawn(words, out, place / "err", 0, place.file("in", input), limit);
     const std::string line = "listening on ";
     comes_true([&] { return read_file(out).find(line) != std::string::npos && read_file(out).back() == '\n'; });
     const std::string text = read_file(out);
@@ -240,6 +249,15 @@ int Connection::status() const
     for (ssize_t count; text.find("\r\n") == std::string::npos && (count = recv(fd, block, sizeof block, 0)) > 0;)
         text.append(block, static_cast<size_t>(count));
     return text.starts_with("HTTP/1.1 ") ? std::stoi(text.substr(9, 3)) : 0;
+}
+
+bool Connection::has_ended() const
+{
+    char block[4096];
+    ssize_t count = 0;
+    while ((count = recv(fd, block, sizeof block, MSG_DONTWAIT)) > 0)
+        continue;
+    return count == 0 || errno != EAGAIN;
 }
 
 std::string Connection::all() const

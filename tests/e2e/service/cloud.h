@@ -42,8 +42,8 @@ struct Run {
 // Runs velora-cloud to its end. Arguments may name the folder "ROOT".
 Run run_cloud(std::vector<std::string> arguments, const std::string &input = "");
 
-// Serves a folder of its own until the end of the test. Its account is "ann@example.org" with the password "secret";
-// the input has the passwords of further ones.
+// Serves a folder of its own until the end of the test, with 2 GiB of address space unless a sanitizer needs more. Its
+// account is "ann@example.org" with the password "secret"; the input has the passwords of further ones.
 class Cloud {
   public:
     explicit Cloud(Headers options = {}, std::string input = "", std::function<void()> before = {});
@@ -90,6 +90,8 @@ class Connection {
     void send(const std::string &bytes) const;
     // The status of the answer; 0 when the connection ends without one.
     int status() const;
+    // Whether the other side has closed it; what has come before is lost.
+    bool has_ended() const;
     // All that comes until its end.
     std::string all() const;
 
