@@ -158,7 +158,8 @@ void put_chunk(Request &request, const char *bytes, size_t size)
     const unsigned delay = request.service->faults.delay;
     if (delay && before / DELAY_STEP != upload.received / DELAY_STEP && !upload.pause_timer) {
         request.pause();
-        upload.pause_timer = g_timeout_add(delay, go_on, &request);
+        const auto steps = static_cast<unsigned>(upload.received / DELAY_STEP - before / DELAY_STEP);
+        upload.pause_timer = g_timeout_add(delay * steps, go_on, &request);
     }
 }
 

@@ -40,12 +40,14 @@ static char *__ud_genlist_file_text_get(void *data, Evas_Object *, const char *p
         return __name_markup(record->name.c_str());
     if (!__is_part(part, "elm.text.sub.left.bottom"))
         return nullptr;
+    // One line, so that the row keeps its height: why, or where nobody knows what to do about it. The line above the
+    // list says that of all, when they can be tapped.
     std::string text = __text("IDS_CLOUD_POP_UPLOAD_FAILED");
     const int error = record->item ? record->item->error.load() : 0;
     const char *why = error != 0 ? __failure_text(error) : nullptr;
-    if (why && text != why) // the words for a failure of no known kind say no more
-        text = text + " · " + why;
-    text = text + " · " + __text("IDS_VELORA_BODY_TAP_TO_RETRY");
+    if (!why || text == why) // the words for a failure of no known kind say no more
+        why = __text("IDS_VELORA_BODY_TAP_TO_RETRY");
+    text = text + " · " + why;
     return elm_entry_utf8_to_markup(text.c_str());
 }
 
