@@ -15,7 +15,7 @@ import time
 
 from person import FOLDER, Person, check, wait_for
 
-GONE = "Upload failed · File not readable"
+GONE = "Upload failed · Not readable"
 
 
 def hostile_names(person):
@@ -24,7 +24,7 @@ def hostile_names(person):
     paths = [person.file(name, size={b"empty.dat": 0, b"large.bin": 5_000_000}.get(name)) for name in names]
     person.upload(person.file(b"bad \xff\xfe bytes.txt"), *paths)  # no service of text names can store that one
     person.finished("bytes.txt", "Upload failed")
-    person.sees("bytes.txt", "Upload failed · Name not allowed", "<b>&amp; €.txt", "two␊lines.txt")
+    person.sees("bytes.txt", "Upload failed · Name refused", "<b>&amp; €.txt", "two␊lines.txt")
     check("SUCCEEDED" in person.leave(), "a share is answered")
     person.has_stored(dict(zip(names, paths)))
 

@@ -226,6 +226,47 @@ TEST(Service, KnowsDigests)
     EXPECT_EQ(count_of(properties("/dav/four"), ABC_HEX), 0u);
 }
 
+TEST(Service, GivesPartsOfAFileAndOfWhatIsKnown)
+{
+    Cloud cloud;
+    cloud.ask("PUT", "/dav/f", {}, "0123456789");
+    const std::string etag = cloud.ask("HEAD", "/dav/f").header("etag");
+    const struct {
+        std::string header;
+        int status;
+        const char *body, *range;
+    } rows[] = {
+        {"Range: bytes=2-4", 206, "234", "bytes 2-4/10"},
+        {"Range: bytes=7-", 206, "789", "bytes 7-9/10"},
+        {"Range: bytes=-3", 206, "789", "bytes 7-9/10"},
+        {"Range: bytes=-30", 206, "0123456789", "bytes 0-9/10"},
+        {"Range: bytes=8-99", 206, "89", "bytes 8-9/10"},
+        {"Range: bytes=10-", 416, "", "bytes */10"},
+        {"Range: bytes=-0", 416, "", "bytes */10"},
+        {"Range: bytes=1-2,4-5", 200, "0123456789", ""},
+        {"Range: bytes=-", 200, "0123456789", ""},
+        {"If-None-Match: \"other\", " + etag, 304, "", ""},
+        {"If-None-Match: W/" + etag, 200, "0123456789", ""},
+        {"If-Match: \"other\"", 412, "", ""},
+        {"If-Match: *", 200, "0123456789", ""},
+        {"If-Modified-Since: Sunday, 06-Nov-94 08:49:37 GMT", 200, "0123456789", ""},
+        {"If-Unmodified-Since: Sun Nov  6 08:49:37 1994", 412, "", ""},
+    };
+    for (const auto &row : rows) {
+        const Answer answer = cloud.ask("GET", "/dav/f", {row.header});
+        EXPECT_EQ(answer.status, row.status) << row.header;
+        EXPECT_EQ(answer.body, row.body) << row.header;
+        EXPECT_EQ(answer.header("content-range"), row.range) << row.header;
+    }
+    const std::string wanted =
+        "<propfind xmlns='DAV:'><prop><getcontentlength/><none xmlns='urn:t'/><sha256 xmlns='urn:velora:dav'/></prop>"
+        "</propfind>";
+    const std::string list = cloud.ask("PROPFIND", "/dav/", {"Depth: 1"}, wanted).body;
+    EXPECT_EQ(count_of(list, "<x:none xmlns:x=\"urn:t\"/>"), 2u) << list;
+    EXPECT_EQ(count_of(list, "<V:sha256>84d89877f0d4041efb6bf91a16f0248f2fd573e6af05c19f96bedb9f882f7882<"), 1u)
+        << list;
+}
+
 TEST(Service, AnAddressExpires)
 {
     Cloud cloud;

@@ -172,6 +172,7 @@ TEST(Strain, OneRequestDoesNotStarveTheOthers)
         {"PROPFIND", many("<propfind xmlns='DAV:' ", " a", 95'000, "><allprop/></propfind>"), 400},
         {"PROPFIND", many(propfind, "<d", 10'000, end), 400},
         {"PROPFIND", propfind + "<" + std::string(900'000, 'n') + "/>" + end, 400},
+        {"PROPFIND", propfind + "<n a='" + std::string(900'000, 'n') + "'/>" + end, 400},
         {"PROPPATCH",
          many("<propertyupdate xmlns='DAV:'><remove><prop>", "<p", 60'000, "</prop></remove></propertyupdate>"), 413},
         {"LOCK", many("<lockinfo xmlns='DAV:' ", " a", 95'000, "/>"), 400},
