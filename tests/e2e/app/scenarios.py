@@ -5,6 +5,7 @@ Every scenario has a device of its own. Prints a test per scenario in the Test A
 usage: scenarios.py BUILD [PATTERN]"""
 
 import concurrent.futures
+import ctypes
 import os
 import re
 import signal
@@ -46,6 +47,25 @@ def bad_files(person):
     person.finished("missing.txt", "Upload complete")
     person.leave()
     person.has_stored({"good.txt": good[0], "last.txt": good[1], "missing.txt": found})
+
+
+def callers_window(person):
+    """The window belongs to that of the application that shared."""
+    x11 = ctypes.CDLL("libX11.so.6")
+    x11.XOpenDisplay.restype = ctypes.c_void_p
+    display = ctypes.c_void_p(x11.XOpenDisplay(person.env["DISPLAY"].encode()))
+    x11.XDefaultRootWindow.restype = x11.XCreateSimpleWindow.restype = ctypes.c_ulong
+    root = ctypes.c_ulong(x11.XDefaultRootWindow(display))
+    caller = x11.XCreateSimpleWindow(display, root, 0, 0, 9, 9, 0, ctypes.c_ulong(0), ctypes.c_ulong(0))
+    x11.XSync(display, 0)
+    person.env["WINDOWID"] = str(caller)
+    person.share(person.file("one.txt"))
+    wait_for("the window", person.raise_window)
+    ours = person.run("xdotool", "search", "--onlyvisible", "--name", "^velora$").split()[-1]
+    owner = ctypes.c_ulong(0)
+    x11.XGetTransientForHint(display, ctypes.c_ulong(int(ours)), ctypes.byref(owner))
+    x11.XCloseDisplay(display)
+    check(owner.value == caller, f"the window belongs to {owner.value:#x}, not to {caller:#x}")
 
 
 def no_account(person):
@@ -127,6 +147,7 @@ SCENARIOS = [  # the longest ones first
     ("the application is killed in the middle", application_killed, {"service": SLOW}),
     ("names that could be mistaken for something else", hostile_names, {}),
     ("files that cannot be read, between good ones", bad_files, {}),
+    ("the window of the caller", callers_window, {}),
     ("nobody is signed in", no_account, {"account": False}),
     ("names that are taken, also in the last moment", names_taken, {}),
     ("the window is closed in the middle", window_closed, {"service": SLOW}),
