@@ -29,11 +29,15 @@ static void __show_run(UploadViewData *vd)
 {
     const UploadRun &run = *vd->run;
     const RunReport &report = run.report;
-    gint64 sent = report.bytes_ended;
-    const int current = report.current;
-    if (current < run.total())
-        if (const RunFile &file = run.files[static_cast<size_t>(current)]; file.item->state == UPLOAD_STATE_UPLOADING)
+    // From the files themselves: the worker counts one only after its state has changed.
+    gint64 sent = 0;
+    for (const RunFile &file : run.files) {
+        const int state = file.item->state;
+        if (state == UPLOAD_STATE_DONE || state == UPLOAD_STATE_FAILED)
+            sent += file.size;
+        else if (state == UPLOAD_STATE_UPLOADING)
             sent += file.size / 100 * file.item->progress;
+    }
     const gint64 all = std::max<gint64>(run.bytes - report.bytes_canceled, 0);
     sent = std::clamp<gint64>(sent, 0, all);
     const int remaining = std::max(run.remaining(), 0);

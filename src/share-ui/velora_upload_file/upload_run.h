@@ -26,7 +26,6 @@ struct RunReport {
     std::atomic<int> success = 0;                  // worker
     std::atomic<int> fail = 0;                     // worker
     std::atomic<int> current = 0;                  // index of the file the worker is on
-    std::atomic<gint64> bytes_ended = 0;           // of files that are up or have failed; worker
     std::atomic<gint64> bytes_canceled = 0;        // main loop
     std::unique_ptr<std::atomic<bool>[]> selected; // one flag a file; main loop, and the worker when a file has ended
     std::atomic<int> callbacks = 0;                // of transfers that are running; client thread

@@ -133,13 +133,11 @@ static void __count_result(const RunFile &file, RunResult *result)
         if (result->uploaded.empty())
             result->first_uploaded = name;
         result->uploaded.push_back(item->path);
-        run.report.bytes_ended += file.size;
         run.report.success++;
     } else if (item->state == UPLOAD_STATE_FAILED) {
         if (result->failed.empty())
             result->first_failed = name;
         result->failed.push_back(item->path);
-        run.report.bytes_ended += file.size;
         run.report.fail++;
     }
 }
