@@ -169,6 +169,59 @@ int cloud_content_sync_cancel(cloud_content_sync_h handle, int req_id);
 int cloud_content_sync_credentials_set(const char *service_name, const char *email, const char *user,
                                        const char *secret);
 
+// Signing in, by a service that has pages for it. In this order:
+//
+//   1. get_request_token_info asks the service for a request token, which lives ten minutes.
+//   2. The person signs in on the service's pages, at an address that names the token, and allows this device in.
+//   3. get_email exchanges the token for an access token, and asks whose it is. What it gets is provisional: kept in
+//      the memory of this handle, and by nothing else. It is revoked at the service when the handle is destroyed, when
+//      it is deactivated, or when another request token is asked for, as far as the service can be reached.
+//   4. activate makes that account the device's: its credentials are stored, what was kept of another account goes, and
+//      the access token that was in use before is revoked.
+//
+// One of these requests, or a deactivation, runs at a time in a handle; a new one ends the one before as auth_cancel
+// does. All return at once, with NO_SERVICE when the service has no account interface (Api), or pages (Web) and
+// INVALID_PARAMETER for a null handle or callback; there is no callback then. Otherwise there is exactly one, on the
+// client's thread, unless auth_cancel or destroy comes first. What a request of step n lacks of step n - 1 is
+// NO_ACCOUNT. A request waits at most `AuthTimeout` seconds of the service's description, 180 when it says nothing:
+// then it is NETWORK.
+
+// status: DONE, with the token and the secret that belongs to it, both valid until the callback returns; or FAILED,
+// with null for both and an error: NETWORK, SERVER. The secret is the client's concern; it is not needed to go on.
+typedef void (*cloud_content_sync_request_token_cb)(int status, const char *request_token, const char *secret,
+                                                    int error, void *user_data);
+int cloud_content_sync_auth_get_request_token_info(cloud_content_sync_h handle, cloud_content_sync_request_token_cb cb,
+                                                   void *user_data);
+// email: the account's address, valid until the callback returns, with the error 0; or null and an error: UNAUTHORIZED
+// when the person has not allowed it, NO_ACCOUNT, NETWORK, SERVER. status: as above.
+typedef void (*cloud_content_sync_email_cb)(int status, const char *email, int error, void *user_data);
+int cloud_content_sync_auth_get_email(cloud_content_sync_h handle, cloud_content_sync_email_cb cb, void *user_data);
+// error: 0, or NO_ACCOUNT, DB_FAILED when the credentials cannot be stored: who was signed in before still is then.
+typedef void (*cloud_content_sync_status_cb)(int status, int error, void *user_data);
+int cloud_content_sync_activate(cloud_content_sync_h handle, cloud_content_sync_status_cb cb, void *user_data);
+// Signs out: ends every request of the handle (their last callbacks bring NO_ACCOUNT), revokes the provisional token,
+// or the one that is signed in where there is none, and empties credentials, database and caches of the account; a
+// provisional sign-in leaves the account that was there before as it is. What is on the device goes also when the
+// service cannot be reached: that is DONE, with the error NETWORK or SERVER; FAILED, with DB_FAILED, only when
+// something on the device could not be removed.
+int cloud_content_sync_deactivate(cloud_content_sync_h handle, cloud_content_sync_status_cb cb, void *user_data);
+// Ends the request of this section that runs, which then has no callback. No callback of it runs any more on return:
+// one that is running is waited for, unless this is called from within it. An activation that has stored its
+// credentials is not undone. NOT_FOUND when there is none.
+int cloud_content_sync_auth_cancel(cloud_content_sync_h handle);
+
+// Where the service's pages are (`Web`, without a final "/"), the address that they send the person to when she has
+// decided (`Callback`; where it is not given, web + "/auth_complete"), and the certificates to trust for them
+// (`CAFile`, "" for the system's). Each may be null when it is not wanted. NO_SERVICE when there is no such service, or
+// it has no pages.
+int cloud_content_sync_service_get_pages(const char *service_name, char **web, char **callback, char **ca_file);
+
+// How the tree is kept fresh: a setting of the account, as type_activation is. type: 1 to 3, of which
+// PERIODIC (3) means every `seconds`.
+enum cloud_content_sync_refresh_type_e { CLOUD_CONTENT_SYNC_REFRESH_TYPE_PERIODIC = 3 };
+int cloud_content_sync_setting_get_refresh_type(cloud_content_sync_h handle, int *type, int *seconds);
+int cloud_content_sync_setting_set_refresh_type(cloud_content_sync_h handle, int type, int seconds);
+
 // The last, and only, callback of a request about one file. state: DONE, or FAILED with an error that is not 0. text:
 // the path or address that was asked for when it is DONE, else null; valid until the callback returns. status: the HTTP
 // status (RFC 9110, 15) of the service's last answer, 0 when it was not asked or did not answer. Client thread.
