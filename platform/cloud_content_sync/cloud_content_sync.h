@@ -199,16 +199,20 @@ int cloud_content_sync_auth_get_email(cloud_content_sync_h handle, cloud_content
 // error: 0, or NO_ACCOUNT, DB_FAILED when the credentials cannot be stored: who was signed in before still is then.
 typedef void (*cloud_content_sync_status_cb)(int status, int error, void *user_data);
 int cloud_content_sync_activate(cloud_content_sync_h handle, cloud_content_sync_status_cb cb, void *user_data);
-// Signs out: ends every request of the handle (their last callbacks bring NO_ACCOUNT), revokes the provisional token,
-// or the one that is signed in where there is none, and empties credentials, database and caches of the account; a
-// provisional sign-in leaves the account that was there before as it is. What is on the device goes also when the
-// service cannot be reached: that is DONE, with the error NETWORK or SERVER; FAILED, with DB_FAILED, only when
-// something on the device could not be removed.
+// Ends a sign-in that is under way in this handle, from the call that asks for a request token to an activation that
+// has stored it: what is provisional is revoked and forgotten, and whoever is signed in stays so. With none under way
+// it signs out: every request of the handle ends (their last callbacks bring NO_ACCOUNT), the access token is revoked,
+// and credentials, database, caches and thumbnails of the account go; its settings stay for the next time. What is on
+// the device goes also when the service cannot be reached: that is DONE, with the error NETWORK or SERVER. FAILED, with
+// DB_FAILED, only when something on the device could not be removed.
 int cloud_content_sync_deactivate(cloud_content_sync_h handle, cloud_content_sync_status_cb cb, void *user_data);
 // Ends the request of this section that runs, which then has no callback. No callback of it runs any more on return:
 // one that is running is waited for, unless this is called from within it. An activation that has stored its
 // credentials is not undone. NOT_FOUND when there is none.
 int cloud_content_sync_auth_cancel(cloud_content_sync_h handle);
+
+// The address of the account that is signed in, "" where it is not known. NO_ACCOUNT when nobody is. Reads a file.
+int cloud_content_sync_account_get_email(const char *service_name, char **email);
 
 // Where the service's pages are (`Web`, without a final "/"), the address that they send the person to when she has
 // decided (`Callback`; where it is not given, web + "/auth_complete"), and the certificates to trust for them
