@@ -16,6 +16,7 @@ SHORT_HEADER = 20
 UPLOAD_VIEW = (
     "notification run text waiting",
     "record worker",
+    "signin",
     "names page path_bar row state",
     "meta progress thumbnails types",
     "cancel icon open",

@@ -67,6 +67,23 @@ void add_widget(const Walk &walk, const Evas_Object *obj, const Eina_Rectangle &
     }
 }
 
+// What an object that draws its widgets itself says of them: lines of kind, text, x, y, width and height with tabs in
+// between, in pixels from its corner.
+void add_own(const Walk &walk, const Evas_Object *obj, const Eina_Rectangle &place)
+{
+    const auto *list = static_cast<const char *>(evas_object_data_get(obj, "inspect,list"));
+    char **lines = g_strsplit(list ? list : "", "\n", -1);
+    for (char **line = lines; *line; line++) {
+        char **fields = g_strsplit(*line, "\t", -1);
+        if (g_strv_length(fields) == 6)
+            add(walk, fields[0], fields[1],
+                {place.x + std::atoi(fields[2]), place.y + std::atoi(fields[3]), std::atoi(fields[4]),
+                 std::atoi(fields[5])});
+        g_strfreev(fields);
+    }
+    g_strfreev(lines);
+}
+
 void visit(Walk &walk, Evas_Object *obj)
 {
     Eina_Rectangle place = {};
@@ -83,6 +100,8 @@ void visit(Walk &walk, Evas_Object *obj)
         add_markup(walk, "text", evas_object_textblock_text_markup_get(obj), place);
     else if (is_seen && elm_object_widget_check(obj))
         add_widget(walk, obj, place);
+    if (is_seen)
+        add_own(walk, obj, place);
     for (const char *leaf : {"rectangle", "image", "text", "textblock", "line", "polygon", "vectors", "textgrid"})
         if (std::strcmp(type, leaf) == 0)
             return;

@@ -49,6 +49,10 @@ void ea_theme_changeable_ui_enabled_set(bool enabled);
 // the caller's; null may be freed.
 ea_theme_color_table_h ea_theme_color_table_new(const char *path);
 void ea_theme_color_table_free(ea_theme_color_table_h table);
+// What the person chose, for what has colours and sizes of its own: see the two functions that apply tables.
+bool ea_theme_is_dark();
+// In percent, 50 to 200.
+int ea_theme_text_percent();
 // Sets the table's classes for the whole process. Style 0 is what the person chose: $ORVANT_THEME ("dark" or "light"),
 // else the key "db/setting/theme_dark" of the settings store, else light. Style 1 is dark. Outline and shadow of a
 // class get the same colour.

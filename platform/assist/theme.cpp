@@ -163,6 +163,16 @@ int chosen_text_percent()
 }
 } // namespace
 
+bool ea_theme_is_dark()
+{
+    return dark_chosen();
+}
+
+int ea_theme_text_percent()
+{
+    return chosen_text_percent();
+}
+
 void ea_theme_changeable_ui_enabled_set(bool on)
 {
     enabled = on;

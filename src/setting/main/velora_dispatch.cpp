@@ -2,6 +2,8 @@
 #include "account/account.h"
 #include "main/velora_pending_pages.h"
 #include "main/velora_shell.h"
+#include "velora_add_account_content_sync/velora_signin.h"
+#include "velora_common/velora_account.h"
 #include "velora_common/velora_log.h"
 #include "velora_common/velora_network.h"
 #include "velora_common/velora_pages.h"
@@ -57,6 +59,7 @@ static bool __velora_account_exists_cb(account_h account, void *)
 
 static int __velora_account_exists()
 {
+    _velora_common_account_settle();
     if (account_connect() != ACCOUNT_ERROR_NONE)
         return -1;
     const int result = account_query_account_by_package_name(__velora_account_exists_cb, VELORA_PACKAGE, nullptr);
@@ -135,6 +138,7 @@ static bool __dispatch_share(AppData *ad)
         _velora_pending_page_end(ad);
         _velora_upload_view_create(ad);
     } else {
+        _velora_pending_page_end(ad);
         _velora_signin_create(ad, 1);
     }
     return true;

@@ -10,6 +10,7 @@
 #include "velora_common/velora_pipe.h"
 #include "velora_common/velora_requests.h"
 #include "velora_common/velora_rotation.h"
+#include "velora_common/velora_signout.h"
 #include "velora_common/velora_upload_item.h"
 #include "velora_upload_file/velora_upload_view.h"
 #include <cstdlib>
@@ -58,6 +59,7 @@ void _velora_app_exit(AppData *ad)
     }
     _velora_requests_answer_all(ad);
     _velora_pages_end();
+    _velora_common_signout_end(ad);
 
     __delete_object(&ad->popup);
     _velora_common_client_release(ad);
@@ -176,6 +178,7 @@ static void __velora_app_reset(app_control_h request, void *data)
     __set_theme(ad);
     _velora_request_add(ad, request);
     __velora_update_landscape_mode(ad);
+    evas_object_show(ad->win_main); // a sign-in that was given up may have hidden it
     elm_win_activate(ad->win_main);
     __velora_join_caller_window(ad, request);
 

@@ -128,6 +128,23 @@ void __velora_account_info_free(AccountInfo *info)
     delete info;
 }
 
+void _velora_common_account_settle()
+{
+    char *email = nullptr;
+    const int signed_in = cloud_content_sync_account_get_email(VELORA_SERVICE, &email);
+    AccountInfo *info = nullptr;
+    const bool is_recorded = __velora_check_account_exist(VELORA_PACKAGE, &info) == 0;
+    if (signed_in == CLOUD_CONTENT_SYNC_ERROR_NO_ACCOUNT && is_recorded) {
+        VELORA_LOGI("the record of an account that is not signed in goes");
+        _velora_common_account_remove_info_from_db();
+    } else if (signed_in == 0 && *email && (!is_recorded || g_strcmp0(info->user_name, email) != 0)) {
+        VELORA_LOGI("the account that is signed in gets its record");
+        _velora_common_account_insert(nullptr, email);
+    }
+    std::free(email);
+    __velora_account_info_free(info);
+}
+
 int _velora_common_account_remove_info_from_db()
 {
     if (account_connect() != ACCOUNT_ERROR_NONE)

@@ -17,5 +17,10 @@ int _velora_common_account_insert(CloudSyncHandle handle, const char *email);
 int __velora_check_account_exist(const char *package_name, AccountInfo **out);
 void __velora_account_info_free(AccountInfo *info);
 
+// The device's record and the cloud client's credentials tell of one account or of none: the credentials decide. A
+// record without them goes, and credentials without a record get one: what was broken off is brought to its end. With
+// a service that is not known nothing is changed. Main loop only.
+void _velora_common_account_settle();
+
 // Deletes the record; the account service's result, or -1 when it cannot be reached. Main loop only.
 int _velora_common_account_remove_info_from_db();

@@ -5,6 +5,7 @@
 #include "velora_upload_file/upload_open.h"
 #include "velora_upload_file/upload_path_bar.h"
 #include "velora_upload_file/upload_progress.h"
+#include "velora_upload_file/upload_signin.h"
 #include "velora_upload_file/upload_text.h"
 #include "velora_upload_file/upload_waiting.h"
 #include <cstdlib>
@@ -180,13 +181,16 @@ void __folder_show(UploadViewData *vd)
     const bool was_focused = elm_object_focus_get(vd->genlist);
     remove_genlist_item(vd->genlist);
     // What is there before the first refresh may be half a tree, or another account's.
-    const bool is_known = vd->ad->is_meta_refreshed;
+    const ViewState unreachable = __meta_state(vd);
+    const bool is_signed_out = unreachable == VIEW_STATE_SIGNED_OUT;
+    const bool is_known = vd->ad->is_meta_refreshed && !is_signed_out;
     const Enumeration list = is_known ? __folder_enumerate(vd, true) : Enumeration{};
     s_listing = list.listing;
     if (Elm_Object_Item *first = elm_genlist_first_item_get(vd->genlist); was_focused && first)
         elm_object_item_focus_set(first, EINA_TRUE);
-    const ViewState unreachable = __meta_state(vd);
-    if (!is_known)
+    if (is_signed_out)
+        __state_show(vd, unreachable, __signin_open_cb);
+    else if (!is_known)
         __state_show(vd, VIEW_STATE_LOADING);
     else if (list.count > 0)
         __state_show(vd, VIEW_STATE_NONE);

@@ -10,10 +10,12 @@
 #include "velora_upload_file/upload_progress.h"
 #include "velora_upload_file/upload_select.h"
 #include "velora_upload_file/upload_share.h"
+#include "velora_upload_file/upload_signin.h"
 #include "velora_upload_file/upload_state.h"
 #include "velora_upload_file/upload_text.h"
 #include "velora_upload_file/upload_thumbnails.h"
 #include "velora_upload_file/upload_worker.h"
+#include <algorithm>
 #include <cstdlib>
 
 // A text, taken apart: "update.3.7" is a verb, a number and a run; "end.7" has no number. A text without a run means
@@ -71,7 +73,7 @@ static void __storage_full(UploadViewData *vd)
 static void __run_ended(UploadViewData *vd)
 {
     VELORA_LOGI("All are done");
-    __run_close(vd);
+    const RunHold run = __run_close(vd);
     if (vd->phase == PHASE_UPLOADING)
         vd->phase = PHASE_ENDED;
     if (__next_share_begin(vd)) {
@@ -81,6 +83,11 @@ static void __run_ended(UploadViewData *vd)
     if (!elm_genlist_first_item_get(vd->genlist) && vd->phase == PHASE_ENDED)
         __state_show(vd, VIEW_STATE_STOPPED);
     __progress_line_update(vd);
+    const auto is_failed_so = [](const RunFile &file) {
+        return file.item->state == UPLOAD_STATE_FAILED && __is_signed_out(file.item->error);
+    };
+    if (vd->phase == PHASE_ENDED && std::ranges::any_of(run->files, is_failed_so))
+        __signin_ask(vd);
 }
 
 static void __row_store(UploadViewData *vd, const RunFile &file)

@@ -2,6 +2,7 @@
 #include "velora_common/velora_log.h"
 #include "velora_common/velora_network.h"
 #include "velora_common/velora_pipe.h"
+#include "velora_upload_file/upload_signin.h"
 
 // What the client's thread leaves of the last refresh; the view that started it may be gone.
 static std::atomic<int> s_error = 0;
@@ -41,10 +42,7 @@ ViewState __meta_state(const UploadViewData *vd)
         return VIEW_STATE_NONE;
     case CLOUD_CONTENT_SYNC_ERROR_NETWORK: // of the device, or of the service
         return _velora_common_check_network_without_popup(vd->ad) ? VIEW_STATE_ERROR : VIEW_STATE_OFFLINE;
-    case CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED:
-    case CLOUD_CONTENT_SYNC_ERROR_NO_ACCOUNT:
-        return VIEW_STATE_SIGNED_OUT;
     default:
-        return VIEW_STATE_ERROR;
+        return __is_signed_out(s_error) ? VIEW_STATE_SIGNED_OUT : VIEW_STATE_ERROR;
     }
 }

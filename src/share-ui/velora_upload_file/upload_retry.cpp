@@ -5,6 +5,7 @@
 #include "velora_upload_file/upload_list.h"
 #include "velora_upload_file/upload_progress.h"
 #include "velora_upload_file/upload_select.h"
+#include "velora_upload_file/upload_signin.h"
 #include "velora_upload_file/upload_start.h"
 #include "velora_upload_file/upload_text.h"
 
@@ -36,6 +37,25 @@ static Eina_Bool __idler_uploading_cb(void *data)
     return ECORE_CALLBACK_CANCEL;
 }
 
+// A run of files that have rows.
+static void __retry_begin(UploadViewData *vd, std::vector<UploadItemHold> items)
+{
+    vd->ad->exit_on_pause = 0; // a result that is only looked at may go, not one that is tried again
+    const char *path = items.front()->server_path;
+    const std::string folder = __folder_of(path ? path : "/");
+    std::vector<Elm_Object_Item *> rows;
+    for (const UploadItemHold &item : items)
+        rows.push_back(item->gen_it);
+    __run_create(vd, std::move(items), folder);
+    vd->phase = PHASE_UPLOADING;
+    for (Elm_Object_Item *row : rows) {
+        elm_genlist_item_selected_set(row, EINA_FALSE);
+        __upload_row_restyle(vd, row, ITEM_TYPE_UPLOADING);
+    }
+    __progress_line_update(vd);
+    ecore_idler_add(__idler_uploading_cb, vd);
+}
+
 static void __upload_again_fail_popup(void *data, Evas_Object *, void *)
 {
     auto *vd = static_cast<UploadViewData *>(data);
@@ -45,19 +65,27 @@ static void __upload_again_fail_popup(void *data, Evas_Object *, void *)
         return;
     }
     __retry_popup_end(vd); // first: it gives the focus back to the row
-    Elm_Object_Item *row = item->gen_it;
-    if (vd->run || !row)
+    if (vd->run || !item->gen_it)
         return;
-    vd->ad->exit_on_pause = 0; // a result that is only looked at may go, not one that is tried again
-    const std::string folder = __folder_of(item->server_path ? item->server_path : "/");
     std::vector<UploadItemHold> items;
     items.push_back(std::move(item));
-    __run_create(vd, std::move(items), folder);
-    vd->phase = PHASE_UPLOADING;
-    elm_genlist_item_selected_set(row, EINA_FALSE);
-    __upload_row_restyle(vd, row, ITEM_TYPE_UPLOADING);
-    __progress_line_update(vd);
-    ecore_idler_add(__idler_uploading_cb, vd);
+    __retry_begin(vd, std::move(items));
+}
+
+bool __retry_signed_out(UploadViewData *vd)
+{
+    if (vd->run || (vd->phase != PHASE_ENDED && vd->phase != PHASE_RESULT))
+        return false;
+    std::vector<UploadItemHold> items;
+    for (Elm_Object_Item *row = elm_genlist_first_item_get(vd->genlist); row; row = elm_genlist_item_next_get(row))
+        if (const ItemData *record = __row_record(row);
+            record->type == ITEM_TYPE_FAILED && record->item && __is_signed_out(record->item->error))
+            items.emplace_back(_velora_upload_item_ref(record->item.get()));
+    if (items.empty())
+        return false;
+    __retry_popup_end(vd);
+    __retry_begin(vd, std::move(items));
+    return true;
 }
 
 static void __retry_popup_show(UploadViewData *vd, UploadItem *item)
@@ -88,6 +116,8 @@ void __velora_uploading_item_selected(void *data, Evas_Object *, void *event_inf
         elm_genlist_item_selected_set(row, EINA_FALSE);
         record->gen_it = row;
     }
-    if (!vd->run && record->item)
+    if (!vd->run && record->item && __is_signed_out(record->item->error))
+        __signin_ask(vd);
+    else if (!vd->run && record->item)
         __retry_popup_show(vd, record->item.get());
 }

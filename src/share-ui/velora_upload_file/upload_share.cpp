@@ -118,6 +118,14 @@ void __share_joins(UploadViewData *vd)
     }
 }
 
+void __share_begin_anew(UploadViewData *vd)
+{
+    while (!__path_bar_is_at_root())
+        __path_bar_remove_last();
+    __meta_refresh_start(vd);
+    __folder_jump(vd, nullptr);
+}
+
 void __share_meta_done(UploadViewData *vd)
 {
     _velora_popup_take_away(vd->ad, {vd, s_wait});

@@ -10,6 +10,8 @@ void __browse_begin(UploadViewData *vd);
 bool __next_share_begin(UploadViewData *vd);
 // More files came: they go along, follow, or are next.
 void __share_joins(UploadViewData *vd);
+// Somebody has signed in, perhaps somebody else: the choice of a folder begins at the root.
+void __share_begin_anew(UploadViewData *vd);
 // The first refresh of the folder tree has ended.
 void __share_meta_done(UploadViewData *vd);
 // A later refresh has ended: the rows change where they are no longer true, the place in the list does not.

@@ -52,7 +52,9 @@ void __state_show(UploadViewData *vd, ViewState state, Evas_Smart_Cb again)
         elm_object_domain_translatable_part_text_set(look, "velora.text", VELORA_SHARE_DOMAIN, looks[state].text);
     if (again) {
         Evas_Object *button = elm_button_add(look);
-        elm_object_domain_translatable_text_set(button, VELORA_SHARE_DOMAIN, "IDS_VELORA_BUTTON_RETRY");
+        elm_object_domain_translatable_text_set(button, VELORA_SHARE_DOMAIN,
+                                                state == VIEW_STATE_SIGNED_OUT ? "IDS_VELORA_BUTTON_SIGN_IN"
+                                                                               : "IDS_VELORA_BUTTON_RETRY");
         evas_object_smart_callback_add(button, "clicked", again, vd);
         elm_object_part_content_set(look, "velora.swallow.action", button);
     }

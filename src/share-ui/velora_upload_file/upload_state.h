@@ -13,6 +13,7 @@ enum ViewState {
     VIEW_STATE_FULL     // a result without files: there was no room for any
 };
 
-// Puts a look in the place of the list, or the list back. Some looks have a button "Try again", which calls `again`.
+// Puts a look in the place of the list, or the list back. Some looks have a button, "Try again" or "Sign in", which
+// calls `again`.
 void __state_show(UploadViewData *vd, ViewState state, Evas_Smart_Cb again = nullptr);
 ViewState __state_shown(const UploadViewData *vd);

@@ -168,6 +168,15 @@ void _velora_upload_view_create(AppData *ad)
     }
 }
 
+void _velora_upload_view_signed_in(AppData *)
+{
+    UploadViewData *vd = s_vd;
+    if (vd && vd->phase == PHASE_BROWSING)
+        __share_begin_anew(vd);
+    else if (vd)
+        __retry_signed_out(vd);
+}
+
 void _velora_upload_view_update()
 {
     UploadViewData *vd = s_vd;

@@ -1,0 +1,59 @@
+#pragma once
+// The record of the sign-in page, and what its two files know of each other. Main loop only, but for `request_token`.
+#include "velora_common/velora_app_data.h"
+#include <string>
+
+struct SigninViewData {
+    AppData *ad = nullptr;
+    Evas_Object *web_view = nullptr; // null until the page has been on screen for a moment
+    Evas_Object *focus_btn = nullptr;
+    char *request_token = nullptr; // the client's thread writes it, before its message
+    Ecore_Pipe *pipe = nullptr;
+    Ecore_Timer *timeout_timer = nullptr;
+    bool is_signin = false;
+
+    ClientHold client;
+    Elm_Object_Item *nf_item = nullptr;
+    Ecore_Timer *build_timer = nullptr;  // until the web view is made
+    GList *files = nullptr;              // of UploadItem: shared, and waiting for the account
+    int launch_mode = LAUNCH_MODE_NONE;  // that the page was opened in
+    void (*done)(AppData *ad) = nullptr; // of a page that lies over another one
+    std::string web, callback, ca_file;  // the service's addresses
+    bool is_approved = false;            // the person has allowed the device in
+    bool is_over = false;                // declined, failed or given up: all that is left is to leave
+};
+
+namespace signin {
+// The one page, or null. In a namespace, for every page calls its record so.
+extern SigninViewData *s_vd;
+} // namespace signin
+
+// What a popup of the page is about.
+inline constexpr char s_wait_topic[] = "wait", s_error_topic[] = "error";
+
+// signin_flow.cpp
+
+void __velora_signin_webview_cb(void *data, Evas_Object *obj, void *event_info);
+// Cancel of every popup about a failure, and back on a wait: gives the sign-in up.
+void __popup_cancel_cb(void *data, Evas_Object *obj, void *event_info);
+// The popup that says what went wrong, in the place of what is on screen; its OK gives up. `title` may be null.
+void __signin_fail(SigninViewData *vd, const char *text_id = "IDS_CLOUD_BODY_SERVER_ERROR_OCCURRED_TRY_LATER",
+                   const char *title_id = nullptr);
+// Asks for a request token, with the wait on screen. The page that belongs to it follows.
+void __signin_begin(SigninViewData *vd);
+// Loads the page that the token is for, once there are both a token and a web view.
+void __signin_page_load(SigninViewData *vd);
+// Ends a sign-in that has come to nothing, at the service as well; nobody waits for it.
+void __signin_forget(SigninViewData *vd);
+
+// signin_view.cpp
+
+// A text of the domain "velora" with a wheel; back calls back_cb.
+void __signin_wait_show(SigninViewData *vd, const char *text_id, Evas_Smart_Cb back_cb);
+// Builds the page and pushes it. The web view follows a moment later.
+void __signin_page_create(SigninViewData *vd);
+// Frees the record; the widgets stay.
+void __signin_view_destroy(SigninViewData *vd);
+// The end of the page, with its widgets, for the list of pages.
+void __signin_page_end(void *page);
+void __signin_page_abandon(void *page);

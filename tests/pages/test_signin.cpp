@@ -1,0 +1,165 @@
+// The sign-in page over a fake web view and a fake service: every step, what may go wrong at each, and what is left.
+#include "fake_ewk.h"
+#include "upload_page.h"
+#include "velora_add_account_content_sync/signin_record.h"
+#include "velora_common/velora_account.h"
+#include "velora_common/velora_pages.h"
+
+namespace {
+
+constexpr const char *web = "http://127.0.0.1:1";
+const std::string callback = std::string(web) + "/auth_complete";
+
+class Signin : public UploadPage {
+  protected:
+    void SetUp() override
+    {
+        UploadPage::SetUp();
+        forget_account();
+        fake_ewk_reset();
+        vconf_set_str("db/menu_widget/language", "de_DE.UTF-8");
+    }
+    void TearDown() override
+    {
+        EXPECT_EQ(signin::s_vd, nullptr);
+        EXPECT_EQ(fake_ewk_views(), 0);
+        UploadPage::TearDown();
+    }
+    static void forget_account()
+    {
+        cloud_content_sync_credentials_set("Velora", nullptr, nullptr, nullptr);
+        _velora_common_account_remove_info_from_db();
+    }
+    static void run(const std::function<void()> &script)
+    {
+        Application::run([&script] {
+            script();
+            if (app && app->win_main)
+                _velora_app_exit(app);
+            seen_run.reset();
+            driver::settle();
+        });
+    }
+    static void request(const Wish &wish)
+    {
+        Application::request(wish);
+        app = signin::s_vd ? signin::s_vd->ad : s_vd ? s_vd->ad : app;
+        driver::settle();
+    }
+    static void add()
+    {
+        request({.operation = APP_CONTROL_OPERATION_ACCOUNT_ADD, .sender = "settings"});
+    }
+    void share(const std::vector<std::string> &names)
+    {
+        request({.operation = APP_CONTROL_OPERATION_MULTI_SHARE, .paths = locals(names), .sender = "gallery"});
+    }
+    // The service's first page is on screen.
+    static bool is_page_there()
+    {
+        return wait_for([] { return signin::s_vd && !fake_ewk_url().empty() && !app->popup; });
+    }
+    static bool has_popup(const char *topic)
+    {
+        return wait_for([=] { return app->popup && std::string(app->popup_owner.topic) == topic; });
+    }
+    static bool popup_says(const std::string &words)
+    {
+        return driver::read_texts(app->popup).find(words) != std::string::npos;
+    }
+    static bool press(int number)
+    {
+        return app->popup && driver::click(elm_object_part_content_get(app->popup, ("button" + std::to_string(number)).c_str()));
+    }
+    static void approve()
+    {
+        fake_cloud_approve(true);
+        fake_ewk_navigate(callback + "?oauth_token=t&uid=1");
+    }
+    static bool is_left()
+    {
+        return wait_for([] { return !app->win_main; });
+    }
+    // What the device, its client and the service know of accounts: "record credentials tokens".
+    static std::string accounts()
+    {
+        AccountInfo *info = nullptr;
+        std::string all = __velora_check_account_exist(VELORA_PACKAGE, &info) == 0 ? info->user_name : "-";
+        __velora_account_info_free(info);
+        char *email = nullptr;
+        all += cloud_content_sync_account_get_email("Velora", &email) == 0 ? std::string(" ") + email : " -";
+        std::free(email);
+        return all + " " + std::to_string(fake_cloud_live_tokens());
+    }
+    static Texts answers()
+    {
+        Texts all;
+        for (const fake_app::Reply &reply : fake_app::replies())
+            all.push_back(reply.sender + (reply.result == APP_CONTROL_RESULT_SUCCEEDED ? " succeeded" : " canceled"));
+        std::ranges::sort(all);
+        return all;
+    }
+};
+
+const std::string nobody = "- - 0", somebody = "someone@example.org someone@example.org 1";
+
+} // namespace
+
+TEST_F(Signin, MakesAnAccountAndGoesOn)
+{
+    const struct {
+        const char *name;
+        Wish wish;
+        Texts files;
+        const char *next; // what is on screen then
+    } cases[] = {
+        {"settings", {.operation = APP_CONTROL_OPERATION_ACCOUNT_ADD}, {}, "To upload files"},
+        {"launch mode", {.launch_mode = "Velora_Signin"}, {}, "To upload files"},
+        {"icon", {}, {}, "To upload files"},
+        {"share", {.operation = APP_CONTROL_OPERATION_MULTI_SHARE}, {"a.txt", "b.txt"}, "Upload to"},
+    };
+    for (const auto &c : cases) {
+        SCOPED_TRACE(c.name);
+        forget_account();
+        fake_ewk_reset();
+        run([&] {
+            Wish wish = c.wish;
+            wish.paths = locals(c.files);
+            request(wish);
+            EXPECT_TRUE(popup_says("Loading"));
+            ASSERT_TRUE(is_page_there());
+            EXPECT_EQ(fake_ewk_cookies_cleared(), 1);
+            fake_ewk_navigate(std::string(web) + "/1/oauth/authorize"); // the form is sent
+            approve();
+            ASSERT_TRUE(wait_for([] { return !signin::s_vd; }));
+            driver::settle();
+            EXPECT_EQ(accounts(), somebody);
+            EXPECT_EQ(fake_ewk_views(), 0);
+            EXPECT_NE(driver::read_texts(app->win_main).find(c.next), std::string::npos);
+            ASSERT_EQ(s_vd != nullptr, !c.files.empty());
+            if (!s_vd)
+                return;
+            ASSERT_TRUE(press_done());
+            ASSERT_TRUE(wait_for(is_over));
+            EXPECT_EQ(rows(), (Texts{"uploaded a.txt", "uploaded b.txt"}));
+        });
+    }
+}
+
+TEST_F(Signin, OpensTheServicesPageInThePersonsLanguage)
+{
+    for (const auto &[language, locale] : std::map<std::string, std::string>{
+             {"de_DE.UTF-8", "de_DE"}, {"ko_KR", "ko_KR"}, {"", "en_US"}, {".UTF-8", ""}}) {
+        SCOPED_TRACE(language);
+        vconf_set_str("db/menu_widget/language", language.c_str());
+        for (const bool is_signin : {true, false}) {
+            run([&] {
+                app = nullptr;
+                request({});
+                _velora_app_exit(app);
+            });
+            static_cast<void>(is_signin);
+            (void)locale;
+        }
+    }
+}
