@@ -2,6 +2,7 @@
 #include "cloud_content_sync/cache.h"
 #include "cloud_content_sync/cloud_content_sync.h"
 #include "cloud_content_sync/names.h"
+#include "cloud_content_sync/secrets.h"
 #include <sys/stat.h>
 #include <unordered_set>
 
@@ -26,13 +27,22 @@ Account::Account(Service description) : service(std::move(description)) {}
 bool Account::open()
 {
     const std::string path = cloud_data_dir() + "/" + service.name + ".db";
-    std::scoped_lock lock(reading, writing);
-    return writer.open(path, SCHEMA) && chmod(path.c_str(), 0600) == 0 && reader.open(path, nullptr);
+    bool has_rows = false;
+    {
+        std::scoped_lock lock(reading, writing);
+        if (!writer.open(path, SCHEMA) || chmod(path.c_str(), 0600) != 0 || !reader.open(path, nullptr))
+            return false;
+        has_rows = Stmt(reader, "SELECT 1 FROM folder UNION ALL SELECT 1 FROM content LIMIT 1").row();
+    }
+    // What a process has left that was killed while it signed out.
+    if (has_rows && identity().empty())
+        while_signed_in("", [&] { return clear(); });
+    return true;
 }
 
 std::string Account::identity() const
 {
-    const auto credentials = credentials_load(service.name);
+    const auto credentials = credentials_known(service.name);
     return credentials ? account_identity(service, *credentials) : "";
 }
 
@@ -54,22 +64,49 @@ bool Account::while_signed_in(const std::string &who, const std::function<bool()
     return change([&] { return identity() == who && work(); });
 }
 
-bool Account::sign_in(const Credentials *credentials)
+// The credentials are what makes an account be there. They go last and come last, so a process that is killed leaves
+// the former account, at worst with an empty tree and empty caches, which a refresh fills; or the new one; or none.
+bool Account::replace_credentials(const Credentials *next, std::optional<Credentials> &former)
 {
-    const std::string next = credentials ? account_identity(service, *credentials) : "";
+    const std::string who = next ? account_identity(service, *next) : "";
     const std::string whose = complete_for();
-    const bool is_same = credentials && identity() == next && (whose.empty() || whose == next);
+    const bool is_same = next && identity() == who && (whose.empty() || whose == who);
     // Once before, so that a crash in the middle leaves no rows to somebody else.
     if (!is_same && !change([&] { return clear(); }))
         return false;
     return change([&] {
-        if (!is_same) {
-            if (!clear())
-                return false;
-            cache_clear(service.name);
-        }
-        return credentials_store(service.name, credentials);
+        former = credentials_known(service.name);
+        if (!is_same && !clear())
+            return false;
+        // Files of another account are never found by the next one.
+        if (!is_same && !cache_clear(service.name) && !next)
+            return false;
+        return credentials_store(service.name, next);
     });
+}
+
+bool Account::sign_in(const Credentials *credentials, std::optional<Credentials> *former)
+{
+    // The Secret Service may take its time, so it is not asked while others wait for the database. An item that no file
+    // names is nobody's.
+    const std::string file = credentials_file(service.name);
+    Credentials next = credentials ? *credentials : Credentials();
+    if (credentials) {
+        const std::string &name = !next.email.empty() ? next.email : next.user;
+        next.item = secret_store(file, service.name, name.empty() ? "token" : name, next.secret);
+        if (!next.item.empty() && name.empty())
+            next.identity = account_identity(service, next);
+    }
+    std::optional<Credentials> before;
+    const bool is_stored = replace_credentials(credentials ? &next : nullptr, before);
+    if (is_stored && former && before && before->secret.empty())
+        before->secret = secret_find(file, before->item);
+    const std::string unused = !is_stored ? next.item : before ? before->item : "";
+    if (!unused.empty() || (is_stored && !credentials))
+        secret_remove(file, is_stored && !credentials ? "" : unused);
+    if (former)
+        *former = before;
+    return is_stored;
 }
 
 bool Account::folder_exists(const std::string &path)

@@ -1,7 +1,7 @@
 #pragma once
 // The metadata database of one service: the account's folder tree as the last refresh and later uploads left it.
 #include "base/base.h"
-#include "cloud_content_sync/service.h"
+#include "cloud_content_sync/credentials.h"
 #include <functional>
 #include <mutex>
 #include <optional>
@@ -35,8 +35,9 @@ class Account {
     // account_identity() of who is signed in; empty when nobody is.
     std::string identity() const;
     // Stores the credentials; null: nobody is signed in any more. What is kept of another account goes, but for its
-    // settings. False when they cannot be stored.
-    bool sign_in(const Credentials *credentials);
+    // settings. False when they cannot be stored, or what is kept cannot be removed for null: whoever was signed in is
+    // so still. *former, which may be null, is who that was; its secret is empty when it is not to be had.
+    bool sign_in(const Credentials *credentials, std::optional<Credentials> *former = nullptr);
     // Does `work` while nobody can sign in or out, in a transaction of the database that its result ends. False, and
     // nothing done, when `who`, an identity, is not signed in.
     bool while_signed_in(const std::string &who, const std::function<bool()> &work);
@@ -66,6 +67,7 @@ class Account {
 
   private:
     bool change(const std::function<bool()> &work);
+    bool replace_credentials(const Credentials *next, std::optional<Credentials> &former);
     bool clear();
 
     std::mutex reading, writing;

@@ -90,11 +90,17 @@ void cache_trim(const std::string &folder, long long limit, const std::string &k
     }
 }
 
-void cache_clear(const std::string &service)
+bool cache_clear(const std::string &service)
 {
-    std::error_code ignored;
-    for (const Kept kind : {Kept::CONTENT, Kept::THUMBNAIL})
-        fs::remove_all(cache_folder(kind, service), ignored);
+    bool is_clear = true;
+    for (const Kept kind : {Kept::CONTENT, Kept::THUMBNAIL}) {
+        std::error_code error;
+        fs::remove_all(cache_folder(kind, service), error);
+        if (error) // another process may have begun a file meanwhile
+            fs::remove_all(cache_folder(kind, service), error);
+        is_clear = is_clear && !error;
+    }
+    return is_clear;
 }
 
 } // namespace cloud

@@ -18,8 +18,8 @@ bool cache_use(const std::string &file, long long size);
 // Removes the files that were used least recently until at most `limit` bytes are left, but never `keep`, and what a
 // crash has left behind.
 void cache_trim(const std::string &folder, long long limit, const std::string &keep);
-// Removes everything that is kept of a service.
-void cache_clear(const std::string &service);
+// Removes everything that is kept of a service; false when something is left.
+bool cache_clear(const std::string &service);
 
 // The entity tag without the mark of a weak one (RFC 9110, 8.8.3): some services call a tag weak for a second.
 std::string opaque_tag(const std::string &etag);

@@ -1,4 +1,5 @@
 #include "cloud_content_sync/client.h"
+#include "cloud_content_sync/auth.h"
 #include "cloud_content_sync/content.h"
 #include "cloud_content_sync/names.h"
 #include "cloud_content_sync/refresh.h"
@@ -12,8 +13,9 @@ namespace cloud {
 static constexpr auto TICK = std::chrono::milliseconds(1000); // how often stalled transfers are looked for
 
 Client::Client(Service description, std::shared_ptr<Account> database)
-    : contents(std::make_unique<Contents>(*this)), thumbnails(std::make_unique<Thumbnails>(*this)),
-      service(std::move(description)), account(std::move(database)), http(service)
+    : auth(std::make_unique<Auth>(*this)), contents(std::make_unique<Contents>(*this)),
+      thumbnails(std::make_unique<Thumbnails>(*this)), service(std::move(description)), account(std::move(database)),
+      http(service)
 {
 }
 
@@ -175,6 +177,27 @@ void Client::report_refreshed(const RefreshRequest &request, int error)
     http.wake();
 }
 
+void Client::end_requests(int error)
+{
+    std::deque<UploadRequest> uploads;
+    std::vector<RefreshRequest> refreshes;
+    {
+        std::scoped_lock lock(mutex);
+        uploads.swap(upload_queue);
+        refreshes.swap(refresh_queue);
+    }
+    thumbnails->end();
+    if (running_upload)
+        running_upload->end(error);
+    for (const UploadRequest &request : uploads)
+        report_failed(request, error);
+    if (running_refresh)
+        running_refresh->finish(error);
+    for (const RefreshRequest &request : refreshes)
+        report_refreshed(request, error);
+    contents->end(error);
+}
+
 // Uploads run one after the other, so that two of one name never race for it.
 void Client::step_upload()
 {
@@ -221,6 +244,7 @@ void Client::loop()
     sigfillset(&all);
     pthread_sigmask(SIG_BLOCK, &all, nullptr);
     while (!is_stopping()) {
+        auth->step();
         step_refresh();
         step_upload();
         contents->step();
@@ -230,8 +254,9 @@ void Client::loop()
     }
     running_upload.reset();
     running_refresh.reset();
-    contents->end();
+    contents->end(0);
     thumbnails->end();
+    auth->end();
 }
 
 } // namespace cloud

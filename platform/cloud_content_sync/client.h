@@ -17,6 +17,7 @@
 
 namespace cloud {
 
+class Auth;
 class Contents;
 class Refresh;
 class Thumbnails;
@@ -60,6 +61,7 @@ class Client : public std::enable_shared_from_this<Client> {
     {
         return std::this_thread::get_id() == thread_id;
     }
+    const std::unique_ptr<Auth> auth;
     const std::unique_ptr<Contents> contents;
     const std::unique_ptr<Thumbnails> thumbnails;
 
@@ -78,6 +80,8 @@ class Client : public std::enable_shared_from_this<Client> {
     bool report_done(const UploadRequest &request, const ContentRow &stored, const std::string &who);
     void report_failed(const UploadRequest &request, int error);
     void report_refreshed(const RefreshRequest &request, int error);
+    // Ends all requests but those of a sign-in; the error, not 0, is that of their last callbacks.
+    void end_requests(int error);
     // What uploads have stored since the running refresh began.
     std::vector<ContentRow> stored_meanwhile;
 

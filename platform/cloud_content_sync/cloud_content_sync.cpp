@@ -1,17 +1,13 @@
 #include "cloud_content_sync/cloud_content_sync.h"
 #include "cloud_content_sync/cache.h"
-#include "cloud_content_sync/client.h"
 #include "cloud_content_sync/content.h"
+#include "cloud_content_sync/handle.h"
 #include "cloud_content_sync/names.h"
 #include "cloud_content_sync/thumbnails.h"
-#include <algorithm>
 #include <cstring>
 
 using cloud::Account;
-
-struct cloud_content_sync_s {
-    std::shared_ptr<cloud::Client> client;
-};
+using cloud::give;
 
 // Folders and contents hold the account, so they outlive the client's handle.
 struct cloud_content_sync_folder_s {
@@ -29,15 +25,6 @@ struct cloud_content_sync_content_s {
 static constexpr int DONE = CLOUD_CONTENT_SYNC_ERROR_NONE;
 static constexpr int INVALID = CLOUD_CONTENT_SYNC_ERROR_INVALID_PARAMETER;
 static constexpr int NOT_FOUND = CLOUD_CONTENT_SYNC_ERROR_NOT_FOUND;
-
-static int give(const std::string &text, char **out)
-{
-    // Names come from file systems: they hold no NUL.
-    *out = strdup(text.c_str());
-    if (!*out)
-        std::abort();
-    return DONE;
-}
 
 int cloud_content_sync_create(const char *service_name, cloud_content_sync_h *handle)
 {
@@ -337,11 +324,6 @@ int cloud_content_sync_cancel(cloud_content_sync_h handle, int req_id)
     return handle->client->cancel(req_id) ? DONE : NOT_FOUND;
 }
 
-static bool has_control_characters(const std::string &text)
-{
-    return std::any_of(text.begin(), text.end(), [](unsigned char c) { return c < 0x20 || c == 0x7F; });
-}
-
 int cloud_content_sync_credentials_set(const char *service_name, const char *email, const char *user,
                                        const char *secret)
 {
@@ -352,9 +334,9 @@ int cloud_content_sync_credentials_set(const char *service_name, const char *ema
         return CLOUD_CONTENT_SYNC_ERROR_NO_SERVICE;
     const cloud::Credentials credentials{user ? user : "", secret ? secret : "", email ? email : ""};
     // A colon would end the user's name early (RFC 7617, 2).
-    const bool bad_user = user && (!*user || has_control_characters(credentials.user) || std::strchr(user, ':'));
-    const bool bad_email = email && (!*email || has_control_characters(credentials.email));
-    if (bad_user || bad_email || (secret && !*secret) || has_control_characters(credentials.secret))
+    const bool bad_user = user && (!*user || cloud::has_control_characters(credentials.user) || std::strchr(user, ':'));
+    const bool bad_email = email && !cloud::email_is_valid(credentials.email);
+    if (bad_user || bad_email || (secret && !*secret) || cloud::has_control_characters(credentials.secret))
         return INVALID;
     Account account(*service);
     return account.open() && account.sign_in(secret ? &credentials : nullptr) ? DONE

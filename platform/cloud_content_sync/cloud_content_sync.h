@@ -157,8 +157,9 @@ int cloud_content_sync_cancel(cloud_content_sync_h handle, int req_id);
 
 // The credentials by which the device's user is known to a service, as a sign-in or a set-up tool leaves them.
 // user null: bearer token in secret (RFC 6750); otherwise HTTP Basic (RFC 7617). secret null: nobody is signed in any
-// more. They are kept in a file that its owner alone can read, and sent to the service's storage alone. Requests that
-// begin later use them.
+// more. They are kept in a file that its owner alone can read, the secret in the session's Secret Service where there is
+// one that works without asking the person, and sent to the service's storage and account interface alone. Requests
+// that begin later use them. While the Secret Service that has the secret cannot be asked they fail with UNAUTHORIZED.
 //
 // email: the account's address, as the service gives it. The account is known by it, so a new token, or another way to
 // sign in, with the same address keeps the database and the caches; those of another account are removed. Null where it
@@ -175,16 +176,19 @@ int cloud_content_sync_credentials_set(const char *service_name, const char *ema
 //   2. The person signs in on the service's pages, at an address that names the token, and allows this device in.
 //   3. get_email exchanges the token for an access token, and asks whose it is. What it gets is provisional: kept in
 //      the memory of this handle, and by nothing else. It is revoked at the service when the handle is destroyed, when
-//      it is deactivated, or when another request token is asked for, as far as the service can be reached.
+//      it is deactivated, or when another request token is asked for, as far as the service can be reached. The
+//      exchange works once. A cancel does not end it: the next get_email gets what it brings. An answer that is lost
+//      leaves an access token at the service that nobody here knows; the person can revoke it there.
 //   4. activate makes that account the device's: its credentials are stored, what was kept of another account goes, and
 //      the access token that was in use before is revoked.
 //
 // One of these requests, or a deactivation, runs at a time in a handle; a new one ends the one before as auth_cancel
-// does. All return at once, with NO_SERVICE when the service has no account interface (Api), or pages (Web) and
-// INVALID_PARAMETER for a null handle or callback; there is no callback then. Otherwise there is exactly one, on the
-// client's thread, unless auth_cancel or destroy comes first. What a request of step n lacks of step n - 1 is
-// NO_ACCOUNT. A request waits at most `AuthTimeout` seconds of the service's description, 180 when it says nothing:
-// then it is NETWORK.
+// does. All return at once, with INVALID_PARAMETER for a null handle or callback and, but for a deactivation,
+// NO_SERVICE when the service has no account interface (Api), or no pages (Web); there is no callback then. Otherwise
+// there is exactly one, on the client's thread, unless auth_cancel or destroy comes first. What a request of step n
+// lacks of step n - 1 is NO_ACCOUNT. A request waits at most `AuthTimeout` seconds of the service's description, 180
+// when it says nothing: then it is NETWORK. Destroying a handle that has something to revoke takes at most 3 seconds
+// more than otherwise.
 
 // status: DONE, with the token and the secret that belongs to it, both valid until the callback returns; or FAILED,
 // with null for both and an error: NETWORK, SERVER. The secret is the client's concern; it is not needed to go on.
@@ -201,14 +205,17 @@ typedef void (*cloud_content_sync_status_cb)(int status, int error, void *user_d
 int cloud_content_sync_activate(cloud_content_sync_h handle, cloud_content_sync_status_cb cb, void *user_data);
 // Ends a sign-in that is under way in this handle, from the call that asks for a request token to an activation that
 // has stored it: what is provisional is revoked and forgotten, and whoever is signed in stays so. With none under way
-// it signs out: every request of the handle ends (their last callbacks bring NO_ACCOUNT), the access token is revoked,
-// and credentials, database, caches and thumbnails of the account go; its settings stay for the next time. What is on
-// the device goes also when the service cannot be reached: that is DONE, with the error NETWORK or SERVER. FAILED, with
-// DB_FAILED, only when something on the device could not be removed.
+// it signs out: every request of the handle ends (their last callbacks bring NO_ACCOUNT; what an upload has stored by
+// then stays), credentials, database, caches and thumbnails of the account go, and then the access token is revoked; a
+// password stays what it is. The account's settings stay for the next time. What is on the device goes also when the
+// service cannot be reached, or the token cannot be read: that is DONE, with the error NETWORK or SERVER. FAILED, with
+// DB_FAILED, only when something on the device could not be removed: then whoever was signed in still is. With nobody
+// signed in it is DONE.
 int cloud_content_sync_deactivate(cloud_content_sync_h handle, cloud_content_sync_status_cb cb, void *user_data);
 // Ends the request of this section that runs, which then has no callback. No callback of it runs any more on return:
 // one that is running is waited for, unless this is called from within it. An activation that has stored its
-// credentials is not undone. NOT_FOUND when there is none.
+// credentials is not undone, nor a deactivation that has begun. A sign-in that is under way stays so. NOT_FOUND when
+// there is none.
 int cloud_content_sync_auth_cancel(cloud_content_sync_h handle);
 
 // The address of the account that is signed in, "" where it is not known. NO_ACCOUNT when nobody is. Reads a file.
@@ -220,8 +227,9 @@ int cloud_content_sync_account_get_email(const char *service_name, char **email)
 // it has no pages.
 int cloud_content_sync_service_get_pages(const char *service_name, char **web, char **callback, char **ca_file);
 
-// How the tree is kept fresh: a setting of the account, as type_activation is. type: 1 to 3, of which
-// PERIODIC (3) means every `seconds`.
+// How the tree is kept fresh: a setting of the account, as type_activation is, on which whoever holds a handle may act;
+// this library refreshes when it is asked to alone. type: 1 to 3, of which PERIODIC (3) means every `seconds`, 1 at
+// least. At first, and with nobody signed in, it is 1 with 0 seconds. INVALID_PARAMETER, NO_ACCOUNT, DB_FAILED.
 enum cloud_content_sync_refresh_type_e { CLOUD_CONTENT_SYNC_REFRESH_TYPE_PERIODIC = 3 };
 int cloud_content_sync_setting_get_refresh_type(cloud_content_sync_h handle, int *type, int *seconds);
 int cloud_content_sync_setting_set_refresh_type(cloud_content_sync_h handle, int type, int seconds);

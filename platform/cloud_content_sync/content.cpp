@@ -7,6 +7,7 @@
 #include <glib.h>
 #include <limits>
 #include <sys/stat.h>
+#include <utility>
 
 namespace cloud {
 
@@ -28,6 +29,7 @@ class ContentTask {
 
     void start();
     void step();
+    void break_off(int error);
     bool has_ended() const
     {
         return ended;
@@ -56,10 +58,8 @@ class ContentTask {
 
 void ContentTask::start()
 {
-    const auto known = credentials_load(client.service.name);
-    if (!known)
-        return finish(CLOUD_CONTENT_SYNC_ERROR_NO_ACCOUNT, "", 0);
-    credentials = *known;
+    if (const int error = credentials_load(client.service.name, credentials))
+        return finish(error, "", 0);
     switch (wanted.kind) {
     case ContentRequest::CACHED_FILE:
         return look_into_cache();
@@ -78,6 +78,14 @@ void ContentTask::step()
     client.http.abort(asking);
     asking = nullptr;
     ended = true;
+}
+
+void ContentTask::break_off(int error)
+{
+    fetch.reset();
+    client.http.abort(asking);
+    asking = nullptr;
+    finish(error, "", 0);
 }
 
 void ContentTask::get(const std::string &folder, mode_t mode, void (ContentTask::*then)())
@@ -272,9 +280,17 @@ void Contents::step()
     }
 }
 
-void Contents::end()
+void Contents::end(int error)
 {
-    running.clear();
+    auto all = std::exchange(running, {});
+    {
+        std::scoped_lock lock(mutex);
+        for (; !waiting.empty(); waiting.pop_front())
+            all.push_back(std::make_unique<ContentTask>(client, std::move(waiting.front())));
+    }
+    for (const auto &task : all)
+        if (error && !task->has_ended())
+            task->break_off(error);
 }
 
 } // namespace cloud

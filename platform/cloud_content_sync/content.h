@@ -38,8 +38,8 @@ class Contents {
     {
         return running.empty();
     }
-    // Breaks off everything.
-    void end();
+    // Breaks off everything; with an error that is not 0 all are told.
+    void end(int error);
 
   private:
     Client &client;

@@ -78,6 +78,8 @@ Http::~Http()
 
 static void set_credentials(CURL *easy, const Credentials &credentials)
 {
+    if (credentials.secret.empty())
+        return;
     if (credentials.user.empty()) {
         curl_easy_setopt(easy, CURLOPT_HTTPAUTH, CURLAUTH_BEARER);
         curl_easy_setopt(easy, CURLOPT_XOAUTH2_BEARER, credentials.secret.c_str());
@@ -101,7 +103,7 @@ static void set_body(CURL *easy, Transfer &transfer)
         // Nothing has to be rewound to send an empty body twice, so libcurl would do it unasked on a dead connection.
         if (transfer.body_size == 0)
             curl_easy_setopt(easy, CURLOPT_FRESH_CONNECT, 1L);
-    } else if (!transfer.body.empty()) {
+    } else if (!transfer.body.empty() || transfer.method == "POST") {
         curl_easy_setopt(easy, CURLOPT_POSTFIELDSIZE, static_cast<long>(transfer.body.size()));
         curl_easy_setopt(easy, CURLOPT_POSTFIELDS, transfer.body.c_str());
     }
@@ -134,6 +136,12 @@ Transfer *Http::start(std::unique_ptr<Transfer> owned, const Credentials &creden
     if (!service.ca_file.empty()) { // these and no others
         curl_easy_setopt(easy, CURLOPT_CAINFO, service.ca_file.c_str());
         curl_easy_setopt(easy, CURLOPT_CAPATH, nullptr);
+    }
+    if (transfer.time_limit.count() > 0) {
+        transfer.stall_limit = transfer.time_limit;
+        curl_easy_setopt(easy, CURLOPT_TIMEOUT, static_cast<long>(transfer.time_limit.count()));
+        // On a kept connection that turns out dead libcurl would send it again.
+        curl_easy_setopt(easy, CURLOPT_FRESH_CONNECT, 1L);
     }
     set_credentials(easy, credentials);
     set_body(easy, transfer);

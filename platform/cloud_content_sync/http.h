@@ -1,7 +1,7 @@
 #pragma once
 // HTTP requests of one thread: a libcurl multi handle whose connections are kept alive between requests. Redirects are
 // never followed, so the credentials never leave the host of the service's description.
-#include "cloud_content_sync/service.h"
+#include "cloud_content_sync/credentials.h"
 #include <chrono>
 #include <curl/curl.h>
 #include <functional>
@@ -24,6 +24,8 @@ struct Transfer {
     std::string body;
     std::function<size_t(char *, size_t)> read; // instead of body: source of exactly body_size bytes, or READ_FAILED
     long long body_size = 0;
+    // Of the whole request, beside the limit for stalls; 0: none. With one the request is sent once alone.
+    std::chrono::seconds time_limit{0};
     std::function<bool(const char *, size_t)> write; // takes the answer's body when its status is 2xx; false ends it
     std::function<void(Transfer &)> done;            // called once, unless the transfer is aborted
 
@@ -61,6 +63,7 @@ class Http {
     Http &operator=(const Http &) = delete;
 
     // The transfer stays valid until its done() has returned, or until it is aborted.
+    // Without a secret it goes without credentials.
     Transfer *start(std::unique_ptr<Transfer> transfer, const Credentials &credentials);
     // Ends a transfer and closes its connection; done() is not called. Null is allowed.
     void abort(Transfer *transfer);

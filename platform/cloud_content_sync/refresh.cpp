@@ -19,10 +19,8 @@ Refresh::~Refresh()
 
 void Refresh::start()
 {
-    const auto known = credentials_load(client.service.name);
-    if (!known)
-        return finish(CLOUD_CONTENT_SYNC_ERROR_NO_ACCOUNT);
-    credentials = *known;
+    if (const int error = credentials_load(client.service.name, credentials))
+        return finish(error);
     waiting.push_back("/");
     list_next();
 }

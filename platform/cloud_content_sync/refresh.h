@@ -21,13 +21,14 @@ class Refresh {
     {
         return ended;
     }
+    // Breaks it off, if it has not ended, with this error.
+    void finish(int error);
 
   private:
     void list_next();
     void list(const std::string &folder);
     void listed(const std::string &folder, const Transfer &transfer, MultistatusReader &reader);
     bool take(const std::string &folder, MultistatusReader &reader);
-    void finish(int error);
 
     Client &client;
     const std::vector<RefreshRequest> requests;

@@ -1,5 +1,5 @@
 #pragma once
-// What is known about a cloud service and about the device's user there. Any thread.
+// What is known about a cloud service. Any thread.
 #include <optional>
 #include <string>
 
@@ -10,14 +10,11 @@ struct Service {
     std::string storage;   // root URL of the WebDAV tree, without a final "/"
     std::string api;       // base URL of the account interface, without a final "/"; empty when there is none
     std::string root_path; // path of that URL as a server path
+    std::string web;       // base URL of the service's pages, without a final "/"; empty when there are none
+    std::string callback;  // where they send the person who has decided; empty when there are no pages
     std::string ca_file;   // certificates to trust instead of the system's, or empty
     int stall_seconds = 60;
-};
-
-struct Credentials {
-    std::string user; // empty: bearer token
-    std::string secret;
-    std::string email; // the account's address; empty: not known
+    int auth_seconds = 180; // that a request of a sign-in may take
 };
 
 // Usable as a part of a file name.
@@ -27,12 +24,5 @@ std::optional<Service> service_find(const std::string &name);
 
 // platform_data_dir()/cloud, which is made when it is missing.
 std::string cloud_data_dir();
-// Nothing when nobody is signed in.
-std::optional<Credentials> credentials_load(const std::string &service_name);
-// Replaces the file of the service as a whole; it is readable by its owner alone. Null removes it.
-bool credentials_store(const std::string &service_name, const Credentials *credentials);
-// A digest that tells accounts of a storage apart: by the e-mail address, or by the user where none is known, or by the
-// token where neither is.
-std::string account_identity(const Service &service, const Credentials &credentials);
 
 } // namespace cloud

@@ -88,9 +88,9 @@ void Thumbnails::step(bool may_start)
 
 bool Thumbnails::start(Wish wish)
 {
-    const auto credentials = credentials_load(client.service.name);
+    Credentials credentials;
     // Somebody else may have signed in since it was asked for.
-    if (!credentials || file_of(wish.row) != wish.file)
+    if (file_of(wish.row) != wish.file || credentials_load(client.service.name, credentials))
         return false;
     auto one = std::make_unique<Running>();
     one->fetch =
@@ -100,7 +100,7 @@ bool Thumbnails::start(Wish wish)
     transfer->url = client.service.api + "/1/thumbnail?size=" + std::to_string(PIXELS) +
                     "&path=" + percent_encode(join(one->wish.row.parent, one->wish.row.name));
     Running &borrowed = *one;
-    if (!one->fetch->start(std::move(transfer), *credentials, [this, &borrowed] { fetched(borrowed); }))
+    if (!one->fetch->start(std::move(transfer), credentials, [this, &borrowed] { fetched(borrowed); }))
         return false;
     running.push_back(std::move(one));
     return true;
@@ -153,6 +153,10 @@ void Thumbnails::report(const ContentRow &row)
 void Thumbnails::end()
 {
     running.clear();
+    std::scoped_lock lock(mutex);
+    waiting.clear();
+    underway.clear();
+    failed.clear();
 }
 
 } // namespace cloud

@@ -34,6 +34,7 @@ class Thumbnails {
 
     // The client thread only.
     void step(bool may_start);
+    // Breaks off and forgets everything that was asked for.
     void end();
 
   private:

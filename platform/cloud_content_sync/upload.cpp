@@ -26,10 +26,8 @@ Upload::~Upload()
 
 void Upload::start()
 {
-    const auto known = credentials_load(client.service.name);
-    if (!known)
-        return finish(CLOUD_CONTENT_SYNC_ERROR_NO_ACCOUNT);
-    credentials = *known;
+    if (const int error = credentials_load(client.service.name, credentials))
+        return finish(error);
     target = wanted.server_path;
     if (!path_is_valid(target) || target == "/")
         return finish(CLOUD_CONTENT_SYNC_ERROR_BAD_NAME);
@@ -73,6 +71,14 @@ void Upload::step()
         percent = now;
         client.report_progress(wanted, percent);
     }
+}
+
+void Upload::end(int error)
+{
+    client.http.abort(transfer_now);
+    transfer_now = nullptr;
+    if (!ended)
+        finish(error);
 }
 
 size_t Upload::read(char *buffer, size_t size)

@@ -19,6 +19,8 @@ class Upload {
     // Reports progress and takes note of a cancel. It is called often, and never from within a libcurl callback, so
     // what it calls may do as it likes.
     void step();
+    // Breaks it off; what is stored by now stays. The error is that of the last callback.
+    void end(int error);
     bool has_ended() const
     {
         return ended;

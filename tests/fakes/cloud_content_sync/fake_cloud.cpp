@@ -56,10 +56,11 @@ void fake_cloud_reset()
     const std::string descriptions = cloud_data_dir() + "/services";
     std::filesystem::create_directory(descriptions);
     setenv("CLOUD_SERVICES_DIR", descriptions.c_str(), 1);
+    setenv("CLOUD_SECRETS", "file", 1);
     const Credentials credentials = {"someone@example.org", "secret", "someone@example.org"};
     for (const std::string name : {"Velora", "Test"}) {
         std::ofstream(descriptions + "/" + name + ".conf")
-            << "[Service]\nStorage=http://127.0.0.1:1/\nApi=http://127.0.0.1:1\n";
+            << "[Service]\nStorage=http://127.0.0.1:1/\nApi=http://127.0.0.1:1\nWeb=https://velora.example.org\n";
         credentials_store(name, &credentials);
     }
 }
@@ -146,6 +147,39 @@ void fake_cloud_fail_create(int error)
 void fake_cloud_fail_content(int error)
 {
     change([&](FakeState &state) { state.content_error = error; });
+}
+
+void fake_cloud_approve(const std::string &email)
+{
+    change([&](FakeState &state) { state.approver = email; });
+}
+
+void fake_cloud_sign_in(const std::string &email)
+{
+    Credentials credentials;
+    change([&](FakeState &state) {
+        credentials = {"", "access" + std::to_string(++state.tokens_made), email};
+        if (!email.empty())
+            state.access_tokens.insert(credentials.secret);
+    });
+    for (const char *name : {"Velora", "Test"})
+        credentials_store(name, email.empty() ? nullptr : &credentials);
+}
+
+void fake_cloud_revoke_tokens()
+{
+    change([](FakeState &state) { state.access_tokens.clear(); });
+}
+
+int fake_cloud_live_tokens()
+{
+    std::scoped_lock lock(fake().mutex);
+    return static_cast<int>(fake().access_tokens.size());
+}
+
+void fake_cloud_fail_auth(int nth, int error)
+{
+    change([&](FakeState &state) { state.auth_errors[state.auth_requests + nth] = error; });
 }
 
 void fake_cloud_set_delay(int milliseconds)

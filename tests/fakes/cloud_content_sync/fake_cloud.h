@@ -33,6 +33,20 @@ void fake_cloud_fail_refresh(int error);
 void fake_cloud_fail_create(int error);
 void fake_cloud_fail_content(int error);
 
+// Signing in and out. The service has pages, which nobody sees: the person's decision is made here. From now on the
+// account of this address allows every request token; "": they are not allowed, as in the beginning.
+void fake_cloud_approve(const std::string &email);
+// Makes this account the device's, with an access token that is alive at the service; "": nobody is signed in. What the
+// database holds stays. To be called while no request runs.
+void fake_cloud_sign_in(const std::string &email);
+// The person ends all access tokens at the service: requests with one are UNAUTHORIZED from now on.
+void fake_cloud_revoke_tokens();
+// Access tokens that were given out and not revoked.
+int fake_cloud_live_tokens();
+// The nth request of a sign-in or sign-out from now on (1: the next one) ends with this error. Counted are request
+// tokens, access tokens and revocations.
+void fake_cloud_fail_auth(int nth, int error);
+
 // A pause before each step of a request, in milliseconds. An upload takes three steps: half of its body, the rest
 // and the answer (more when it is large); a refresh one, and any other request one.
 void fake_cloud_set_delay(int milliseconds);

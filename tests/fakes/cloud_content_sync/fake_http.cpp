@@ -15,6 +15,35 @@ FakeCloud &fake()
     return state;
 }
 
+using cloud::Transfer;
+
+void answer_error(Transfer &transfer, int error)
+{
+    switch (error) {
+    case CLOUD_CONTENT_SYNC_ERROR_NETWORK:
+        transfer.result = CURLE_COULDNT_CONNECT;
+        return;
+    case CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED:
+        transfer.status = 401;
+        return;
+    case CLOUD_CONTENT_SYNC_ERROR_FORBIDDEN:
+        transfer.status = 403;
+        return;
+    case CLOUD_CONTENT_SYNC_ERROR_STORAGE_FULL:
+        transfer.status = 507;
+        return;
+    default:
+        transfer.status = 500;
+    }
+}
+
+void answer(Transfer &transfer, long status, const std::string &body)
+{
+    transfer.status = status;
+    if (status / 100 == 2 && transfer.write && !transfer.write(body.data(), body.size()))
+        transfer.result = CURLE_WRITE_ERROR;
+}
+
 namespace cloud {
 
 Http::Http(const Service &description) : service(description), multi(nullptr, curl_multi_cleanup)
@@ -30,13 +59,15 @@ Http::~Http()
     fake().changed.notify_all();
 }
 
-Transfer *Http::start(std::unique_ptr<Transfer> owned, const Credentials &)
+Transfer *Http::start(std::unique_ptr<Transfer> owned, const Credentials &credentials)
 {
     Transfer *transfer = owned.get();
     transfer->easy.reset(curl_easy_init()); // by which the transfers are kept
     transfers[transfer->easy.get()] = std::move(owned);
     std::scoped_lock lock(fake().mutex);
     fake().clients[this].requests.push_back(transfer);
+    if (credentials.user.empty())
+        fake().clients[this].bearers[transfer] = credentials.secret;
     return transfer;
 }
 
@@ -47,6 +78,7 @@ void Http::abort(Transfer *transfer)
     {
         std::scoped_lock lock(fake().mutex);
         std::erase(fake().clients[this].requests, transfer);
+        fake().clients[this].bearers.erase(transfer);
     }
     transfers.erase(transfer->easy.get());
 }
@@ -70,33 +102,6 @@ static bool is_counted(const Transfer &transfer)
 static bool may_step(const Transfer *transfer)
 {
     return !fake().held || fake().permits > 0 || !is_counted(*transfer);
-}
-
-static void answer_error(Transfer &transfer, int error)
-{
-    switch (error) {
-    case CLOUD_CONTENT_SYNC_ERROR_NETWORK:
-        transfer.result = CURLE_COULDNT_CONNECT;
-        return;
-    case CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED:
-        transfer.status = 401;
-        return;
-    case CLOUD_CONTENT_SYNC_ERROR_FORBIDDEN:
-        transfer.status = 403;
-        return;
-    case CLOUD_CONTENT_SYNC_ERROR_STORAGE_FULL:
-        transfer.status = 507;
-        return;
-    default:
-        transfer.status = 500;
-    }
-}
-
-static void answer(Transfer &transfer, long status, const std::string &body)
-{
-    transfer.status = status;
-    if (status / 100 == 2 && transfer.write && !transfer.write(body.data(), body.size()))
-        transfer.result = CURLE_WRITE_ERROR;
 }
 
 static std::string response(const std::string &path)
@@ -209,11 +214,15 @@ static bool put(Transfer &transfer)
 }
 
 // With the lock held. False when the request has ended.
-static bool step_once(Transfer &transfer)
+static bool step_once(Transfer &transfer, const std::string &bearer)
 {
     const bool is_content = transfer.method == "GET" || transfer.method == "POST";
     if (!fake().reachable)
         answer_error(transfer, CLOUD_CONTENT_SYNC_ERROR_NETWORK);
+    else if (is_auth(transfer))
+        answer_auth(transfer, bearer);
+    else if (!bearer.empty() && !fake().access_tokens.count(bearer))
+        answer(transfer, 401, "");
     else if (transfer.url.find("/1/thumbnail") != std::string::npos)
         answer(transfer, 404, "");
     else if (const int error = is_content ? std::exchange(fake().content_error, 0) : 0)
@@ -245,8 +254,9 @@ void Http::run(std::chrono::milliseconds wait)
         return;
     if (fake().held && is_counted(**one))
         fake().permits--;
-    if (step_once(**one))
+    if (step_once(**one, self.bearers[*one]))
         return;
+    self.bearers.erase(*one);
     const auto owned = transfers.extract((*one)->easy.get());
     self.requests.erase(one);
     lock.unlock();
