@@ -100,6 +100,9 @@ Transfer *Auth::post(const char *path, const std::string &body, const Credential
 // A text of a JSON object that may stand in a header field or an address; "" when there is none.
 static std::string text_in(const std::string &answer, const char *path)
 {
+    // SQLite's texts end at a NUL, whether it is written out or not.
+    if (answer.find('\0') != answer.npos || answer.find("\\u0000") != answer.npos)
+        return "";
     Db json;
     json.open(":memory:", nullptr);
     Stmt field(json, "SELECT json_extract(?1, ?2) WHERE json_valid(?1) AND json_type(?1, ?2) = 'text'");

@@ -139,11 +139,11 @@ TEST_P(SignIn, signing_out_without_the_service_ends_all_requests)
 TEST_P(SignIn, a_cancel_leaves_no_callback_and_everything_else_one)
 {
     ASSERT_TRUE(open());
-    for (int round = 0; round < 5; round++)
+    for (int round = 0; round < 3; round++)
         for (const Step step : ALL_STEPS) {
             Watch cancelled, replaced, last;
             begin(handle, step, cancelled);
-            std::this_thread::sleep_for(std::chrono::milliseconds(round * 2));
+            std::this_thread::sleep_for(std::chrono::milliseconds(round * 3));
             const bool was_there = cloud_content_sync_auth_cancel(handle) == 0;
             EXPECT_EQ(cancelled.count(), was_there ? 0 : 1);
             begin(handle, Step::EMAIL, replaced);
@@ -188,7 +188,8 @@ TEST_P(SignIn, many_rounds_leave_nothing_behind)
     ASSERT_TRUE(open());
     const auto count = [](const char *folder) { return names_in(folder).size(); };
     size_t files = 0, descriptors = 0, threads = 0;
-    for (int round = 0; round < 31; round++) {
+    const int rounds = backend->media_url.empty() ? 31 : 6; // a service limits how many may come from one address
+    for (int round = 0; round < rounds; round++) {
         come();
         ASSERT_EQ(run(handle, Step::ACTIVATE), 0);
         ASSERT_EQ(run(handle, Step::DEACTIVATE), 0);
