@@ -118,8 +118,10 @@ TEST_F(ScriptedSignIn, tokens_that_nobody_keeps_are_revoked)
     come();                                                     // a2: a1 goes
     EXPECT_EQ(run(handle, Step::ACTIVATE), 0);                  // "token", of before, goes
     come();                                                     // a3
-    cloud_content_sync_destroy(std::exchange(handle, nullptr)); // a3 goes, a2 is the account's
-    EXPECT_EQ(revoked(), (Names{"Bearer a1", "Bearer token", "Bearer a3"}));
+    EXPECT_EQ(run(handle, Step::DEACTIVATE), 0);                // a3 goes
+    come();                                                     // a4
+    cloud_content_sync_destroy(std::exchange(handle, nullptr)); // a4 goes, a2 is the account's
+    EXPECT_EQ(revoked(), (Names{"Bearer a1", "Bearer token", "Bearer a3", "Bearer a4"}));
     EXPECT_EQ(who(), "ann@example.org");
 
     // A revocation that fails, or is refused because the token is gone already, changes nothing on the device.
