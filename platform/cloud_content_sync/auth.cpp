@@ -57,7 +57,7 @@ void Auth::step()
         running.reset();
     }
     if (current && current->id != now)
-        end_sign_in([](int) {});
+        revoke_access(std::exchange(current, nullptr), [](int) {});
     if (!next || !client.is_wanted(next->id))
         return;
     running = next;
@@ -100,6 +100,9 @@ Transfer *Auth::post(const char *path, const std::string &body, const Credential
 // A text of a JSON object that may stand in a header field or an address; "" when there is none.
 static std::string text_in(const std::string &answer, const char *path)
 {
+    // SQLite's texts end at a NUL, whether it is written out or not.
+    if (answer.find('\0') != answer.npos || answer.find("\\u0000") != answer.npos)
+        return "";
     Db json;
     json.open(":memory:", nullptr);
     Stmt field(json, "SELECT json_extract(?1, ?2) WHERE json_valid(?1) AND json_type(?1, ?2) = 'text'");
@@ -237,8 +240,9 @@ void Auth::deactivate()
     const AuthRequest request = *running;
     const auto then = [this, id = request.id](int error) { finish(id, error); };
     if (request.sign_in) {
+        const std::shared_ptr<SignIn> one = current;
         forget_sign_in(request.sign_in);
-        return end_sign_in(then);
+        return revoke_access(one, then);
     }
     client.end_requests(CLOUD_CONTENT_SYNC_ERROR_NO_ACCOUNT);
     // What is on this device goes first: a process that is killed in between leaves a token that the person can still
@@ -251,10 +255,8 @@ void Auth::deactivate()
     revoke(former.value_or(Credentials()), then);
 }
 
-void Auth::end_sign_in(const std::function<void(int)> &then)
+void Auth::revoke_access(const std::shared_ptr<SignIn> &one, const std::function<void(int)> &then)
 {
-    const std::shared_ptr<SignIn> one = std::move(current);
-    current.reset();
     revoke(one && one->access ? *one->access : Credentials(), then);
 }
 
@@ -299,7 +301,7 @@ void Auth::end()
     running.reset();
     client.http.abort(asking);
     asking = nullptr;
-    end_sign_in([](int) {});
+    revoke_access(std::exchange(current, nullptr), [](int) {});
     const auto deadline = std::chrono::steady_clock::now() + LAST_WAIT;
     while (!background.empty() && std::chrono::steady_clock::now() < deadline)
         client.http.run(std::chrono::milliseconds(100));

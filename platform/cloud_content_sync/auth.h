@@ -60,7 +60,7 @@ class Auth {
     void take_access(const std::shared_ptr<SignIn> &one, int error, const std::string &answer);
     void activate();
     void deactivate();
-    void end_sign_in(const std::function<void(int)> &then);
+    void revoke_access(const std::shared_ptr<SignIn> &one, const std::function<void(int)> &then);
     void forget_sign_in(int id);
     void revoke(const Credentials &credentials, const std::function<void(int)> &then);
     Transfer *post(const char *path, const std::string &body, const Credentials &credentials, Answered then);

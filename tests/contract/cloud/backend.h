@@ -13,6 +13,9 @@ struct Backend {
     std::function<std::optional<std::string>(const std::string &path)> content = {};
     std::function<Names(const std::string &folder)> list = {}; // unsorted
     std::function<void()> go_down = {};                        // from now on the service cannot be reached
+    // Of a service with pages: USER signs in there and allows the request token; whether an access token is alive.
+    std::function<void(const std::string &token)> approve = {};
+    std::function<bool(const std::string &access)> is_alive = {};
     std::vector<std::shared_ptr<void>> owned = {};
 };
 
@@ -24,6 +27,8 @@ inline constexpr char USER[] = "someone@example.org", PASSWORD[] = "a secret: wi
 Names backend_names();
 // Those of them that are services on the network, for what the fake does not do.
 Names server_names();
+// Those that have pages to sign in.
+Names page_names();
 std::optional<Backend> start_backend(const std::string &name);
 
 // A backend and a client of it.
@@ -44,8 +49,9 @@ class OnBackend : public testing::TestWithParam<std::string> {
         return backend && handle;
     }
 
-    TempHome home;      // the client's
-    TempFolder scratch; // for local files
+    const int file_alone = setenv("CLOUD_SECRETS", "file", 1); // no keyring of whoever runs the tests
+    TempHome home;                                             // the client's
+    TempFolder scratch;                                        // for local files
     std::optional<Backend> backend;
     cloud_content_sync_h handle = nullptr;
 };

@@ -12,6 +12,11 @@ Names server_names()
     return {};
 }
 
+Names page_names()
+{
+    return backend_names();
+}
+
 std::optional<Backend> start_backend(const std::string &)
 {
     fake_cloud_reset();
@@ -21,5 +26,7 @@ std::optional<Backend> start_backend(const std::string &)
                    .store = fake_cloud_add_file,
                    .content = fake_cloud_content,
                    .list = fake_cloud_list,
-                   .go_down = [] { fake_cloud_set_reachable(false); }};
+                   .go_down = [] { fake_cloud_set_reachable(false); },
+                   .approve = [](const std::string &) { fake_cloud_approve(USER); },
+                   .is_alive = fake_cloud_token_is_alive};
 }

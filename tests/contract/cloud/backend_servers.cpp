@@ -4,7 +4,9 @@
 #include "cloud_content_sync/dav.h"
 #include "cloud_content_sync/names.h"
 #include <csignal>
+#include <cstring>
 #include <glib.h>
+#include <regex>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -12,7 +14,7 @@
 static Backend introduce(const std::string &url)
 {
     const auto descriptions = std::make_shared<TempFolder>();
-    descriptions->file("Test.conf", "[Service]\nStorage=" + url + "/dav/\nApi=" + url + "\n");
+    descriptions->file("Test.conf", "[Service]\nStorage=" + url + "/dav/\nApi=" + url + "\nWeb=" + url + "\n");
     setenv("CLOUD_SERVICES_DIR", descriptions->path.c_str(), 1);
     EXPECT_EQ(cloud_content_sync_credentials_set("Test", USER, USER, PASSWORD), 0);
     const auto ask = [url](const char *method, const std::string &path, const std::string &body = "") {
@@ -45,6 +47,67 @@ static Backend introduce(const std::string &url)
     return backend;
 }
 
+// What a tag's attribute says; "" when it has none of that name.
+static std::string attribute(const std::string &tag, const std::string &name)
+{
+    std::smatch found;
+    const bool is_there = std::regex_search(tag, found, std::regex("\\s" + name + "\\s*=\\s*\"([^\"]*)\""));
+    std::string value = is_there ? found[1].str() : "";
+    for (const auto &[entity, character] :
+         {std::pair("&quot;", "\""), std::pair("&#39;", "'"), std::pair("&#x27;", "'"), std::pair("&lt;", "<"),
+          std::pair("&gt;", ">"), std::pair("&amp;", "&")})
+        for (size_t at = 0; (at = value.find(entity, at)) != value.npos; at++)
+            value.replace(at, std::strlen(entity), character);
+    return value;
+}
+
+// What a browser sends for a form when its first button is pressed; the person knows her fields by their types.
+static std::string filled_in(const std::string &form)
+{
+    const std::regex field("<(input|button)[^>]*>");
+    std::string body;
+    bool is_pressed = false;
+    for (std::sregex_iterator one(form.begin(), form.end(), field), end; one != end; one++) {
+        const std::string tag = one->str(), name = attribute(tag, "name"), type = attribute(tag, "type");
+        const bool is_button = tag.starts_with("<button") || type == "submit";
+        if (name.empty() || (is_button && std::exchange(is_pressed, true)))
+            continue;
+        const std::string value = type == "password" ? PASSWORD : type == "email" ? USER : attribute(tag, "value");
+        body += (body.empty() ? "" : "&") + cloud::percent_encode(name) + "=" + cloud::percent_encode(value);
+    }
+    return body;
+}
+
+// What a person does at a service's pages, until she is sent to the callback.
+static void sign_in_at(const std::string &url, std::string address)
+{
+    const auto absolute = [&](const std::string &to) { return to.starts_with("/") ? url + to : to; };
+    std::string cookies, body;
+    for (int i = 0; i < 8; i++) {
+        Headers headers = {"Cookie: " + cookies, "Origin: " + url};
+        if (!body.empty())
+            headers.emplace_back("Content-Type: application/x-www-form-urlencoded");
+        const Answer answer = ask_url(body.empty() ? "GET" : "POST", address, headers, body);
+        for (auto [cookie, end] = answer.headers.equal_range("set-cookie"); cookie != end; cookie++)
+            cookies += (cookies.empty() ? "" : "; ") + cookie->second.substr(0, cookie->second.find(';'));
+        body.clear();
+        if (const std::string next = answer.header("location"); !next.empty()) {
+            if (next.find("/auth_complete") != next.npos && next.find("/authorize") == next.npos)
+                return;
+            address = absolute(next);
+            continue;
+        }
+        std::smatch form;
+        ASSERT_TRUE(std::regex_search(answer.body, form, std::regex("<form[^>]*>"))) << answer.status << answer.body;
+        if (const std::string action = attribute(form.str(), "action"); !action.empty())
+            address = absolute(action);
+        const std::string rest = form.suffix();
+        body = filled_in(rest.substr(0, rest.find("</form>")));
+        ASSERT_FALSE(body.empty());
+    }
+    FAIL() << "the pages do not end";
+}
+
 static Backend start_velora_cloud()
 {
     const auto service = std::make_shared<Cloud>(Headers{"--add-account", USER}, std::string(PASSWORD) + "\n");
@@ -52,6 +115,13 @@ static Backend start_velora_cloud()
     backend.taboo = {"new\nline.txt", "\xff\xfe.bin"};
     backend.media_url = service->url;
     backend.go_down = [service] { service->stop(SIGTERM); };
+    backend.approve = [url = service->url](const std::string &token) {
+        sign_in_at(url, url + "/1/oauth/authorize?oauth_token=" + token + "&oauth_callback=" + url +
+                            "/auth_complete&locale=en_US");
+    };
+    backend.is_alive = [url = service->url](const std::string &access) {
+        return ask_url("PROPFIND", url + "/dav/", {"Depth: 0", "Authorization: Bearer " + access}).status == 207;
+    };
     return backend;
 }
 
@@ -132,6 +202,11 @@ Names backend_names()
 Names server_names()
 {
     return backend_names();
+}
+
+Names page_names()
+{
+    return {};
 }
 
 std::optional<Backend> start_backend(const std::string &name)

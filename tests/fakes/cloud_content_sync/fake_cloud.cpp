@@ -171,6 +171,12 @@ void fake_cloud_revoke_tokens()
     change([](FakeState &state) { state.access_tokens.clear(); });
 }
 
+bool fake_cloud_token_is_alive(const std::string &token)
+{
+    std::scoped_lock lock(fake().mutex);
+    return fake().access_tokens.count(token) > 0;
+}
+
 int fake_cloud_live_tokens()
 {
     std::scoped_lock lock(fake().mutex);

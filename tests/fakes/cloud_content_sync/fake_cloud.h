@@ -43,6 +43,7 @@ void fake_cloud_sign_in(const std::string &email);
 void fake_cloud_revoke_tokens();
 // Access tokens that were given out and not revoked.
 int fake_cloud_live_tokens();
+bool fake_cloud_token_is_alive(const std::string &token);
 // The nth request of a sign-in or sign-out from now on (1: the next one) ends with this error. Counted are request
 // tokens, access tokens and revocations.
 void fake_cloud_fail_auth(int nth, int error);
