@@ -9,6 +9,8 @@
 
 static const int64_t DEFAULT_QUOTA = 50LL << 30;
 static const size_t PROVED_AT_MOST = 1000;
+static const int64_t USE_NOTED_AFTER = 300; // seconds; not every request is to write the database
+static const int DEVICES_AT_MOST = 100; // of an account; more sign out the one that is not used for the longest time
 
 static const char SCHEMA[] =
     "CREATE TABLE IF NOT EXISTS accounts(id INTEGER PRIMARY KEY, email TEXT NOT NULL UNIQUE, display_name TEXT NOT "
@@ -33,7 +35,23 @@ bool Accounts::open(Db &database, int files)
     db = &database;
     root = files;
     key = random_bytes(32);
-    return db->run(SCHEMA);
+    return db->run(SCHEMA) && add_device_columns() &&
+           db->run("CREATE INDEX IF NOT EXISTS tokens_of_account ON tokens(account)");
+}
+
+// Tokens were once without a device.
+bool Accounts::add_device_columns()
+{
+    if (!db->run("BEGIN IMMEDIATE"))
+        return false;
+    bool is_there = false;
+    {
+        Stmt column(*db, "SELECT 1 FROM pragma_table_info('tokens') WHERE name = 'device'");
+        is_there = column.row();
+    }
+    const bool done = is_there || db->run("ALTER TABLE tokens ADD COLUMN device TEXT NOT NULL DEFAULT '';"
+                                          "ALTER TABLE tokens ADD COLUMN used INTEGER NOT NULL DEFAULT 0;");
+    return db->run(done ? "COMMIT" : "ROLLBACK") && done;
 }
 
 // The address as accounts are looked up by it.
@@ -45,8 +63,7 @@ static std::string folded(const std::string &email)
     return text;
 }
 
-// The address names a folder and stands before ':' in credentials.
-static bool valid_email(const std::string &email)
+bool valid_email(const std::string &email)
 {
     const size_t at = email.find('@');
     if (at == 0 || at == std::string::npos || at + 1 == email.size() || email.find('@', at + 1) != std::string::npos ||
@@ -90,12 +107,69 @@ bool Accounts::add(const std::string &email, const std::string &password, int64_
     return false;
 }
 
-std::string Accounts::issue_token(const std::string &email)
+bool Accounts::exists(const std::string &email)
 {
-    const std::string token = hex(random_bytes(32));
-    Stmt insert(*db, "INSERT INTO tokens(hash, account, issued) SELECT ?1, id, ?2 FROM accounts WHERE email = ?3");
-    insert.bind(1, hex(sha256(token))).bind(2, static_cast<long long>(time(nullptr))).bind(3, folded(email));
-    return insert.done() && sqlite3_changes(db->handle.get()) == 1 ? token : "";
+    Stmt known(*db, "SELECT id FROM accounts WHERE email = ?");
+    return known.bind(1, folded(email)).row();
+}
+
+Account *Accounts::find(const std::string &email)
+{
+    Stmt known(*db, "SELECT id FROM accounts WHERE email = ?");
+    return known.bind(1, folded(email)).row() ? find(known.integer(0)) : nullptr;
+}
+
+Accounts::Made Accounts::make(const std::string &email, const std::string &hash)
+{
+    const std::string address = folded(email);
+    if (exists(address))
+        return Made::TAKEN;
+    unlinkat(root, address.c_str(), AT_REMOVEDIR); // an empty one says nothing
+    if (mkdirat(root, address.c_str(), 0777) != 0)
+        return errno == EEXIST ? Made::TAKEN : Made::FAILED;
+    Stmt insert(*db, "INSERT INTO accounts(email, display_name, password, quota) VALUES(?, ?, ?, ?)");
+    insert.bind(1, address).bind(2, email.substr(0, email.find('@'))).bind(3, hash);
+    insert.bind(4, static_cast<long long>(DEFAULT_QUOTA));
+    if (!hash.empty() && insert.done())
+        return Made::YES;
+    unlinkat(root, address.c_str(), AT_REMOVEDIR);
+    return Made::FAILED;
+}
+
+std::string Accounts::issue_token(const std::string &email, const std::string &device)
+{
+    const std::string token = hex(random_bytes(32)), address = folded(email);
+    Stmt insert(*db, "INSERT INTO tokens(hash, account, issued, device) SELECT ?1, id, ?2, ?4 FROM accounts WHERE "
+                     "email = ?3");
+    insert.bind(1, hex(sha256(token))).bind(2, static_cast<long long>(time(nullptr))).bind(3, address);
+    if (!insert.bind(4, device).done() || sqlite3_changes(db->handle.get()) != 1)
+        return "";
+    Stmt bound(*db, "DELETE FROM tokens WHERE rowid IN (SELECT rowid FROM tokens WHERE account = (SELECT id FROM "
+                    "accounts WHERE email = ?1) ORDER BY max(issued, used) DESC, rowid DESC LIMIT -1 OFFSET ?2)");
+    bound.bind(1, address).bind(2, static_cast<long long>(DEVICES_AT_MOST)).done();
+    return token;
+}
+
+bool Accounts::revoke_token(const std::string &token)
+{
+    Stmt row(*db, "DELETE FROM tokens WHERE hash = ?");
+    return row.bind(1, hex(sha256(token))).done() && sqlite3_changes(db->handle.get()) == 1;
+}
+
+std::vector<Device> Accounts::devices(const Account &account)
+{
+    std::vector<Device> found;
+    Stmt row(*db, "SELECT rowid, device, issued, used FROM tokens WHERE account = ? ORDER BY rowid DESC LIMIT ?");
+    row.bind(1, account.id).bind(2, static_cast<long long>(DEVICES_AT_MOST));
+    while (row.row())
+        found.push_back({row.integer(0), row.text(1), row.integer(2), row.integer(3)});
+    return found;
+}
+
+void Accounts::sign_out(const Account &account, long long device)
+{
+    Stmt row(*db, "DELETE FROM tokens WHERE rowid = ? AND account = ?");
+    row.bind(1, device).bind(2, account.id).done();
 }
 
 Account *Accounts::find(long long id)
@@ -125,8 +199,15 @@ Account *Accounts::find(long long id)
 Account *Accounts::by_token(const std::string &token)
 {
     const std::string hash = hex(sha256(token));
-    Stmt row(*db, "SELECT account, hash FROM tokens WHERE hash = ?");
-    return row.bind(1, hash).row() && equal_in_constant_time(row.text(1), hash) ? find(row.integer(0)) : nullptr;
+    Stmt row(*db, "SELECT account, hash, used FROM tokens WHERE hash = ?");
+    if (!row.bind(1, hash).row() || !equal_in_constant_time(row.text(1), hash))
+        return nullptr;
+    const auto now = static_cast<long long>(time(nullptr));
+    const long long id = row.integer(0), age = now - row.integer(2);
+    row.reset();
+    if (age > USE_NOTED_AFTER || age < 0)
+        Stmt(*db, "UPDATE tokens SET used = ? WHERE hash = ?").bind(1, now).bind(2, hash).done();
+    return find(id);
 }
 
 void PasswordCheck::run()
@@ -165,8 +246,13 @@ Account *Accounts::authorize(const char *header, PasswordCheck &check)
     const size_t colon = pair.find(':');
     if (colon == std::string::npos || pair.find('\0') != std::string::npos)
         return nullptr;
-    check.email = folded(pair.substr(0, colon));
-    check.password = pair.substr(colon + 1);
+    return authorize(pair.substr(0, colon), pair.substr(colon + 1), check);
+}
+
+Account *Accounts::authorize(const std::string &email, const std::string &password, PasswordCheck &check)
+{
+    check.email = folded(email);
+    check.password = password;
     if (!by_email)
         by_email.emplace(*db, "SELECT id, password FROM accounts WHERE email = ?");
     const Reset reset{*by_email};
@@ -174,4 +260,21 @@ Account *Accounts::authorize(const char *header, PasswordCheck &check)
         return nullptr;
     check.hash = by_email->text(1);
     return proved.count(proof(check.password, check.hash)) ? find(by_email->integer(0)) : nullptr;
+}
+
+std::string plain_text(const std::string &text, long characters)
+{
+    std::string plain;
+    const char *next = g_utf8_validate(text.c_str(), -1, nullptr) ? text.c_str() : "";
+    for (long count = 0; *next && count < characters; next = g_utf8_next_char(next)) {
+        const gunichar c = g_utf8_get_char(next);
+        const bool is_space = g_unichar_isspace(c);
+        if ((!is_space && !g_unichar_isgraph(c)) || (is_space && (plain.empty() || plain.back() == ' ')))
+            continue;
+        plain += is_space ? " " : std::string(next, static_cast<size_t>(g_utf8_next_char(next) - next));
+        count++;
+    }
+    if (!plain.empty() && plain.back() == ' ')
+        plain.pop_back();
+    return plain;
 }

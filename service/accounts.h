@@ -40,6 +40,13 @@ struct PasswordCheck {
     void run();
 };
 
+// A device that is signed in.
+struct Device {
+    long long id = 0;
+    std::string name;             // empty when it has not told it
+    int64_t issued = 0, used = 0; // seconds since 1970; used: by some minutes, 0: never
+};
+
 class Accounts {
   public:
     // `db` and `files`, the folder that holds one folder per account, are borrowed for the object's life. False when
@@ -48,18 +55,33 @@ class Accounts {
     // Adds the account, or sets only the quota of one that exists (quota < 0: leaves it). False and a reason for
     // people when the address or the password is no good or the database fails.
     bool add(const std::string &email, const std::string &password, int64_t quota, std::string &reason);
-    // A new token of 256 random bits; only its SHA-256 is kept. Empty when there is no such account.
-    std::string issue_token(const std::string &email);
+    enum class Made { YES, TAKEN, FAILED };
+    // Makes an account that nobody had, with a hash from password_hash() and the usual quota. An address whose folder
+    // still holds files of somebody else's is taken, too.
+    Made make(const std::string &email, const std::string &hash);
+    bool exists(const std::string &email);
+    // A new token of 256 random bits for a device; only its SHA-256 is kept. Empty when there is no such account.
+    std::string issue_token(const std::string &email, const std::string &device);
+    // Ends a token; false when it is not known.
+    bool revoke_token(const std::string &token);
+    // The devices that are signed in to the account, the latest first.
+    std::vector<Device> devices(const Account &account);
+    // Ends the token of one of them; nothing happens when it is another account's.
+    void sign_out(const Account &account, long long device);
     // Reads the value of an Authorization header (RFC 6750 Bearer, RFC 7617 Basic; null is allowed). Null when it
     // proves nothing; when `check` has a password then, it is to be run and settled. The account stays valid and at its
     // address for the object's life.
     Account *authorize(const char *header, PasswordCheck &check);
+    // The same for an address and a password that somebody has typed.
+    Account *authorize(const std::string &email, const std::string &password, PasswordCheck &check);
     // The account of a check that has run; null when the password was wrong.
     Account *settle(const PasswordCheck &check);
     // Null when there is no such account.
     Account *find(long long id);
+    Account *find(const std::string &email);
 
   private:
+    bool add_device_columns();
     Account *by_token(const std::string &token);
     std::string proof(const std::string &password, const std::string &hash) const;
 
@@ -72,3 +94,8 @@ class Accounts {
     std::string key;
     std::set<std::string> proved;
 };
+
+// Whether the text can be an account's address: it names a folder and stands before ':' in credentials.
+bool valid_email(const std::string &email);
+// The text without what cannot be seen or turns the direction of writing, and not longer than so many characters.
+std::string plain_text(const std::string &text, long characters);

@@ -1,4 +1,5 @@
 #include "http.h"
+#include "pages.h"
 #include <cstring>
 #include <gio/gio.h>
 
@@ -6,14 +7,25 @@ static const size_t BODY_AT_MOST = 1 << 20; // of requests that are not uploads
 static const char *const ALLOWED =
     "OPTIONS, GET, HEAD, PUT, DELETE, MKCOL, COPY, MOVE, PROPFIND, PROPPATCH, LOCK, UNLOCK";
 
-std::string Request::query_field(const char *name) const
+static std::string field_of(const char *fields_text, gssize size, const char *name)
 {
-    GHashTable *fields = query() ? g_uri_parse_params(query(), -1, "&", G_URI_PARAMS_WWW_FORM, nullptr) : nullptr;
+    GHashTable *fields =
+        fields_text ? g_uri_parse_params(fields_text, size, "&", G_URI_PARAMS_WWW_FORM, nullptr) : nullptr;
     const auto *value = fields ? static_cast<const char *>(g_hash_table_lookup(fields, name)) : nullptr;
     std::string text = value ? value : "";
     if (fields)
         g_hash_table_unref(fields);
     return text;
+}
+
+std::string Request::query_field(const char *name) const
+{
+    return field_of(query(), -1, name);
+}
+
+std::string Request::form_field(const char *name) const
+{
+    return field_of(body.data(), static_cast<gssize>(body.size()), name);
 }
 
 std::unique_ptr<GUri, decltype(&g_uri_unref)> read_address(const Request &request, const char *text)
@@ -102,6 +114,12 @@ void refuse(Request &request, int status)
     put_drop(request);
 }
 
+void refuse_for(Request &request, int seconds)
+{
+    request.set_header("Retry-After", std::to_string(seconds));
+    refuse(request, 429);
+}
+
 void in_thread(Request &request, std::function<void()> work, std::function<void()> done, Workers *workers)
 {
     request.jobs++;
@@ -138,14 +156,19 @@ static void account_info(Request &request)
     request.answer(200, "application/json", json.text(0) + "\n");
 }
 
-static Area area_of(const char *path)
+static Area area_of(const Request &request)
 {
+    const char *path = request.target_path().c_str();
     if (std::strcmp(path, "/1/account/info") == 0)
         return Area::ACCOUNT_INFO;
     if (std::strcmp(path, "/1/media") == 0)
         return Area::MEDIA_ADDRESS;
     if (std::strcmp(path, "/1/thumbnail") == 0)
         return Area::THUMBNAIL;
+    if (is_oauth_path(path))
+        return Area::OAUTH;
+    if (is_page(request))
+        return Area::PAGE;
     return std::strncmp(path, "/1/media/", 9) == 0 ? Area::MEDIA : Area::DAV;
 }
 
@@ -192,7 +215,7 @@ void Request::got_body(const char *bytes, size_t size)
     if (upload)
         return put_chunk(*this, bytes, size);
     body.append(bytes, size);
-    if (body.size() > BODY_AT_MOST)
+    if (body.size() > (area == Area::PAGE || area == Area::OAUTH ? FORM_AT_MOST : BODY_AT_MOST))
         refuse(*this, 413);
 }
 
@@ -209,17 +232,29 @@ void Request::got_request()
         return media_get(*this);
     case Area::THUMBNAIL:
         return thumbnail(*this);
+    case Area::OAUTH:
+        return oauth_request(*this);
+    case Area::PAGE:
+        return page_request(*this);
     }
 }
 
 // The headers are there, the body is not: who asks, for what, and may it be sent?
 void Request::got_headers()
 {
-    area = area_of(target_path().c_str());
+    area = area_of(*this);
     if (has_fragment())
         return refuse(*this, 400);
-    if (area == Area::DAV && parse_path(target_path().c_str(), path) == 404)
+    if (area == Area::OAUTH || area == Area::PAGE) {
+        if (const int status = area == Area::OAUTH ? oauth_refusal(*this) : page_refusal(*this))
+            refuse(*this, status);
+        return;
+    }
+    if (area == Area::DAV && parse_path(target_path().c_str(), path) == 404) {
+        if (wants_page(*this))
+            return page_missing(*this);
         return refuse(*this, 404);
+    }
     if (area != Area::MEDIA)
         return authorize();
     account = media_account(*this);
@@ -243,11 +278,9 @@ void Request::authorize()
     if (check->password.empty())
         return ask_for_credentials(*this);
     // Whether there is such an account makes no difference to anybody who tries.
-    const std::string who = "account " + check->email, where = "address " + peer();
-    if (const int seconds = service->attempts.begin(who, where)) {
-        set_header("Retry-After", std::to_string(seconds));
-        return refuse(*this, 429);
-    }
+    const std::string who = "account " + check->email, where = "address " + network_of(peer());
+    if (const int seconds = service->attempts.begin(who, where))
+        return refuse_for(*this, seconds);
     in_thread(
         *this, [check] { check->run(); },
         [this, check, who, where] {

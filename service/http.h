@@ -4,7 +4,9 @@
 #include "http_date.h"
 #include "locks.h"
 #include "metadata.h"
+#include "oauth.h"
 #include "server.h"
+#include "sessions.h"
 #include "workers.h"
 #include <ctime>
 #include <functional>
@@ -14,6 +16,13 @@ struct Faults {
     int fail_count = 0, fail_status = 500; // the next fail_count PUT requests are answered with fail_status
     unsigned delay = 0;                    // milliseconds to wait after each 64 KiB of a PUT's body
     int lose_reply = 0;                    // the PUT (counted down) whose answer is lost
+};
+
+// What the pages for people need to know of the place where they are served.
+struct Site {
+    std::string base;     // as people see the service, behind a proxy; empty: as the request names it
+    std::string callback; // where a browser goes after an answer; empty: base + "/auth_complete"
+    bool registers = true;
 };
 
 struct Service {
@@ -26,17 +35,23 @@ struct Service {
     std::string media_secret; // of the signatures of addresses
     Faults faults;
     Workers workers{4};
-    Workers painters{2};   // of thumbnails: bounds their memory, and leaves time for others
-    Workers hashers{2};    // of passwords
-    Workers syncers{16};   // of finished uploads: they only wait for the disk
-    Attempts attempts;     // at passwords
+    Workers painters{2}; // of thumbnails: bounds their memory, and leaves time for others
+    Workers hashers{2};  // of passwords
+    Workers syncers{16}; // of finished uploads: they only wait for the disk
+    Attempts attempts;   // at passwords
+    RequestTokens request_tokens;
+    Sessions sessions;
+    Site site;
     int large_answers = 0; // being made or sent
 };
 
 struct Upload;
 
-// What an address belongs to. MEDIA proves by its signature who allowed it, all others by credentials.
-enum class Area { DAV, ACCOUNT_INFO, MEDIA_ADDRESS, MEDIA, THUMBNAIL };
+static const size_t FORM_AT_MOST = 64 << 10; // bytes of a form that a person sends, or of a call to sign in
+
+// What an address belongs to. MEDIA proves by its signature who allowed it, OAUTH and PAGE see to that themselves, all
+// others by credentials.
+enum class Area { DAV, ACCOUNT_INFO, MEDIA_ADDRESS, MEDIA, THUMBNAIL, OAUTH, PAGE };
 
 struct Request : Message {
     Service *service = nullptr;
@@ -68,6 +83,8 @@ struct Request : Message {
     Entry look_up() const;
     // The value of a field of the query (application/x-www-form-urlencoded), or "".
     std::string query_field(const char *name) const;
+    // The same for a body that is a form.
+    std::string form_field(const char *name) const;
 
   private:
     void authorize();
@@ -76,6 +93,8 @@ struct Request : Message {
 
 // Answers a request whose body is still to come, and lets go of its upload.
 void refuse(Request &request, int status);
+// Answers 429: after so many seconds it may be tried again.
+void refuse_for(Request &request, int seconds);
 // The address of a header (RFC 4918, 8.3: absolute, or a path) as the request means it; null when it is none.
 std::unique_ptr<GUri, decltype(&g_uri_unref)> read_address(const Request &request, const char *text);
 // The status that the If-Match, If-None-Match and If-(Un)Modified-Since headers demand for a resource (RFC 9110, 13): 0

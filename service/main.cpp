@@ -176,6 +176,9 @@ int main(int argc, char **argv)
         return code;
     Service service;
     service.faults = options.faults;
+    service.site = options.site;
+    if (options.token_life)
+        service.request_tokens.life = options.token_life;
     Fd root;
     std::string reason;
     if (!open_service(options.root, service, root, reason))
@@ -191,7 +194,7 @@ int main(int argc, char **argv)
         std::printf("account %s\n", email.c_str());
     }
     for (const std::string &email : options.tokens) {
-        const std::string token = service.accounts.issue_token(email);
+        const std::string token = service.accounts.issue_token(email, "velora-cloud --token");
         if (token.empty())
             return complain(EXIT_TROUBLE, "no account " + email);
         std::printf("%s\n", token.c_str());

@@ -81,13 +81,14 @@ namespace {
 // What GLib reads, and frees.
 struct Words {
     char *root = nullptr, *listen = nullptr, *quota = nullptr, *fail = nullptr, *certificate = nullptr, *key = nullptr;
+    char *base = nullptr, *callback = nullptr;
     char **accounts = nullptr, **tokens = nullptr;
-    int delay = 0, lose_reply = 0, patience = 0;
-    gboolean logs = FALSE, logs_sql = FALSE, plain = FALSE;
+    int delay = 0, lose_reply = 0, patience = 0, token_life = 0;
+    gboolean no_registration = FALSE, logs = FALSE, logs_sql = FALSE, plain = FALSE;
 
     ~Words()
     {
-        for (char *text : {root, listen, quota, fail, certificate, key})
+        for (char *text : {root, listen, quota, fail, certificate, key, base, callback})
             g_free(text);
         g_strfreev(accounts);
         g_strfreev(tokens);
@@ -114,9 +115,17 @@ static bool parse(int &argc, char **&argv, Words &words, std::string &reason)
          "Storage of the accounts of --add-account, with K, M, G or T (50G)", "BYTES"},
         {"token", 0, 0, G_OPTION_ARG_STRING_ARRAY, &words.tokens,
          "Print a new bearer token of the account; serves only when --listen is given too", "EMAIL"},
+        {"base", 0, 0, G_OPTION_ARG_STRING, &words.base,
+         "The address at which people reach this service through a proxy, such as https://cloud.example.org", "URL"},
+        {"callback", 0, 0, G_OPTION_ARG_STRING, &words.callback,
+         "Where a browser goes once a device was approved or declined (the service's own /auth_complete)", "URL"},
+        {"no-registration", 0, 0, G_OPTION_ARG_NONE, &words.no_registration,
+         "Let nobody make an account with a browser", nullptr},
         {"log", 0, 0, G_OPTION_ARG_NONE, &words.logs, "Write a line per request to standard error", nullptr},
         {"patience", 0, 0, G_OPTION_ARG_INT, &words.patience,
          "For tests: end connections after so long without headers, a request or bytes of a body", "SECONDS"},
+        {"token-life", 0, 0, G_OPTION_ARG_INT, &words.token_life,
+         "For tests: how long a device may wait for its approval (600)", "SECONDS"},
         {"log-sql", 0, 0, G_OPTION_ARG_NONE, &words.logs_sql,
          "For tests: write each statement for the database once to standard error", nullptr},
         {"fail", 0, 0, G_OPTION_ARG_STRING, &words.fail, "For tests: answer the next COUNT uploads with STATUS",
@@ -134,6 +143,24 @@ static bool parse(int &argc, char **&argv, Words &words, std::string &reason)
     reason = error ? error->message : "";
     g_clear_error(&error);
     return is_parsed;
+}
+
+// An http or https address without a query; of `base` without a path, too. Its spelling is compared, so it has to be
+// the usual one.
+static bool is_web_address(const char *text, bool is_base)
+{
+    GUri *uri = g_uri_parse(text, G_URI_FLAGS_NONE, nullptr);
+    if (!uri)
+        return false;
+    char *usual = g_uri_to_string(uri);
+    const std::string scheme = g_uri_get_scheme(uri), path = g_uri_get_path(uri);
+    const char *host = g_uri_get_host(uri);
+    const bool is_good = (scheme == "http" || scheme == "https") && host && *host && !g_uri_get_query(uri) &&
+                         !g_uri_get_fragment(uri) && !g_uri_get_userinfo(uri) && path.empty() == is_base &&
+                         std::strcmp(usual, text) == 0;
+    g_free(usual);
+    g_uri_unref(uri);
+    return is_good;
 }
 
 static std::string text_of(const char *text)
@@ -158,6 +185,13 @@ int read_options(int argc, char **argv, Options &options)
                                     "numbers from 0");
     if (!words.certificate != !words.key)
         return complain(EXIT_USAGE, "--tls-certificate and --tls-key go together");
+    if ((words.base && !is_web_address(words.base, true)) || (words.callback && !is_web_address(words.callback, false)))
+        return complain(EXIT_USAGE, "--base wants an address such as https://cloud.example.org, --callback one with a "
+                                    "path");
+    if (words.token_life < 0)
+        return complain(EXIT_USAGE, "--token-life: not a number of seconds");
+    options.site = {text_of(words.base), text_of(words.callback), !words.no_registration};
+    options.token_life = words.token_life;
     options.root = words.root;
     options.listen = words.listen ? words.listen : options.listen;
     options.certificate = text_of(words.certificate);

@@ -8,6 +8,8 @@ struct Options {
     int64_t quota = -1;                        // bytes; -1: not given
     Faults faults;
     Patience patience;
+    Site site;
+    int token_life = 0; // seconds; 0: not given
     bool is_serving = false, logs = false, logs_sql = false;
 };
 
