@@ -7,7 +7,7 @@
 
 namespace {
 
-constexpr const char *web = "http://127.0.0.1:1";
+constexpr const char *web = "https://velora.example.org";
 const std::string callback = std::string(web) + "/auth_complete";
 
 class Signin : public UploadPage {
@@ -27,7 +27,8 @@ class Signin : public UploadPage {
     }
     static void forget_account()
     {
-        cloud_content_sync_credentials_set("Velora", nullptr, nullptr, nullptr);
+        fake_cloud_sign_in("");
+        fake_cloud_revoke_tokens();
         _velora_common_account_remove_info_from_db();
     }
     static void run(const std::function<void()> &script)
@@ -69,11 +70,12 @@ class Signin : public UploadPage {
     }
     static bool press(int number)
     {
-        return app->popup && driver::click(elm_object_part_content_get(app->popup, ("button" + std::to_string(number)).c_str()));
+        return app->popup &&
+               driver::click(elm_object_part_content_get(app->popup, ("button" + std::to_string(number)).c_str()));
     }
     static void approve()
     {
-        fake_cloud_approve(true);
+        fake_cloud_approve("someone@example.org");
         fake_ewk_navigate(callback + "?oauth_token=t&uid=1");
     }
     static bool is_left()
@@ -120,6 +122,8 @@ TEST_F(Signin, MakesAnAccountAndGoesOn)
     };
     for (const auto &c : cases) {
         SCOPED_TRACE(c.name);
+        if (getenv("XX"))
+            fprintf(stderr, "CASE %s\n", c.name);
         forget_account();
         fake_ewk_reset();
         run([&] {
@@ -148,18 +152,86 @@ TEST_F(Signin, MakesAnAccountAndGoesOn)
 
 TEST_F(Signin, OpensTheServicesPageInThePersonsLanguage)
 {
+    const std::string escaped = "https%3A%2F%2Fvelora.example.org%2Fauth_complete";
     for (const auto &[language, locale] : std::map<std::string, std::string>{
              {"de_DE.UTF-8", "de_DE"}, {"ko_KR", "ko_KR"}, {"", "en_US"}, {".UTF-8", ""}}) {
         SCOPED_TRACE(language);
         vconf_set_str("db/menu_widget/language", language.c_str());
         for (const bool is_signin : {true, false}) {
+            fake_ewk_reset();
             run([&] {
-                app = nullptr;
-                request({});
-                _velora_app_exit(app);
+                add();
+                signin::s_vd->is_signin = is_signin;
+                ASSERT_TRUE(is_page_there());
+                const std::string token = signin::s_vd->request_token;
+                const std::string page = std::string(web) + "/1/oauth/authorize?oauth_token=" + token;
+                char *cont =
+                    g_uri_escape_string((page + "&oauth_callback=" + escaped + "&cl=" + locale).c_str(), "/", TRUE);
+                EXPECT_EQ(fake_ewk_url(), is_signin ? page + "&oauth_callback=" + callback + "&locale=" + locale
+                                                    : std::string(web) + "/m/register?cl=" + locale +
+                                                          "&signup_data=velora-device&cont=" + taken(cont));
             });
-            static_cast<void>(is_signin);
-            (void)locale;
         }
+    }
+}
+
+TEST_F(Signin, NothingIsLeftOfOneThatFails)
+{
+    const auto at_page = [] { return is_page_there(); };
+    const auto at_start = [] { return true; };
+    const auto send = [] { fake_ewk_start(std::string(web) + "/1/oauth/authorize"); };
+    const struct {
+        const char *name;
+        std::function<void()> before; // the request
+        std::function<bool()> reach;
+        std::function<void()> fail;
+        const char *says = "Something went wrong on the server";
+        int button = 1;              // 0: the back key
+        const char *seconds = "100"; // that a page may take
+    } cases[] = {
+        {"no client", [] { fake_cloud_fail_create(CLOUD_CONTENT_SYNC_ERROR_NO_SERVICE); }, at_start, {}},
+        {"no request token", [] { fake_cloud_fail_auth(1, CLOUD_CONTENT_SYNC_ERROR_NETWORK); }, at_start, {}},
+        {"no web view", fake_ewk_fail_add, at_start, {}},
+        {"not allowed after all", {}, at_page, [] { fake_ewk_navigate(callback + "?oauth_token=t"); }},
+        {"no e-mail", [] { fake_cloud_fail_auth(2, CLOUD_CONTENT_SYNC_ERROR_SERVER); }, at_page, approve},
+        {"the service's home", {}, at_page, [] { fake_ewk_navigate(std::string(web) + "/m"); }},
+        {"web process killed", {}, at_page, fake_ewk_crash},
+        {"web process killed on the way",
+         {},
+         at_page,
+         [&] {
+             send();
+             fake_ewk_crash();
+         }},
+        {"certificate", {}, at_page, [] { fake_ewk_error(EWK_ERROR_CERTIFICATE); }, "could not prove"},
+        {"network", {}, at_page, [] { fake_ewk_error(EWK_ERROR_NETWORK); }, "does not answer"},
+        {"network, and back", {}, at_page, [] { fake_ewk_error(EWK_ERROR_NETWORK); }, "does not answer", 0},
+        {"a page that never comes", {}, at_page, send, "Something went wrong", 1, "0.2"},
+        {"back on such a page", {}, at_page, send, "Processing", 0},
+    };
+    for (const auto &c : cases) {
+        SCOPED_TRACE(c.name);
+        if (getenv("XX"))
+            fprintf(stderr, "CASE %s\n", c.name);
+        fake_app::clear();
+        fake_ewk_reset();
+        setenv("VELORA_PAGE_LOAD_SECONDS", c.seconds, 1);
+        run([&] {
+            if (c.before)
+                c.before();
+            add();
+            ASSERT_TRUE(c.reach());
+            if (c.fail)
+                c.fail();
+            ASSERT_TRUE(wait_for([&] { return app->popup && popup_says(c.says); }))
+                << driver::read_texts(app->win_main);
+            if (c.button)
+                ASSERT_TRUE(press(c.button));
+            else
+                driver::press(app->win_main, "XF86Back");
+            EXPECT_TRUE(is_left());
+        });
+        EXPECT_EQ(accounts(), nobody);
+        EXPECT_EQ(answers(), Texts{"settings canceled"});
     }
 }

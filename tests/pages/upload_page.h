@@ -97,7 +97,12 @@ class UploadPage : public Application {
     {
         const auto is_ready = [] {
             const UploadViewData *vd = s_vd;
-            return vd && vd->done_btn && !vd->ad->popup && !elm_object_disabled_get(vd->done_btn);
+            if (!vd || !vd->done_btn || vd->ad->popup || elm_object_disabled_get(vd->done_btn))
+                return false;
+            int x = 0, width = 0, window_width = 0; // the page may still be on its way in
+            evas_object_geometry_get(vd->done_btn, &x, nullptr, &width, nullptr);
+            evas_object_geometry_get(window(), nullptr, nullptr, &window_width, nullptr);
+            return x + width <= window_width;
         };
         return wait_for(is_ready) && driver::click(s_vd->done_btn);
     }

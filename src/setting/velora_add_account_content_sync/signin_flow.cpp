@@ -109,6 +109,7 @@ void __signin_fail(SigninViewData *vd, const char *text_id, const char *title_id
         cloud_content_sync_auth_cancel(vd->client.get());
     if (vd->web_view)
         ewk_view_stop(vd->web_view);
+    _velora_popup_take_away(vd->ad, {vd, ""}); // before the next one takes the focus from it, to give it back later
     Evas_Object *popup = _velora_common_create_warning_popup(vd->ad->win_main, text_id, __popup_cancel_cb, vd);
     if (title_id)
         elm_object_domain_translatable_part_text_set(popup, "title,text", VELORA_DOMAIN, title_id);
@@ -293,16 +294,15 @@ static void __signed_in(SigninViewData *vd)
     __refresh_type_set(client.get());
     if (done) {
         _velora_pages_remove(vd);
-        elm_object_item_del(item);
+        __signin_item_delete(ad, item);
         done(ad);
         return;
     }
     ad->launch_mode = launch_mode;
     if (launch_mode == LAUNCH_MODE_SETUP_WIZARD)
         __meta_refresh(ad);
+    __signin_item_delete(ad, item);
     _velora_pages_go_on(ad, vd, __next_page(launch_mode));
-    if (ad->naviframe) // else the application was left
-        elm_object_item_del(item);
 }
 
 static void __activate(SigninViewData *vd)

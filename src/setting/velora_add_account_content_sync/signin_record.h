@@ -54,6 +54,8 @@ void __signin_wait_show(SigninViewData *vd, const char *text_id, Evas_Smart_Cb b
 void __signin_page_create(SigninViewData *vd);
 // Frees the record; the widgets stay.
 void __signin_view_destroy(SigninViewData *vd);
+// Takes the page's widgets away. None of them may have the keys' focus, or be given it, while it goes.
+void __signin_item_delete(AppData *ad, Elm_Object_Item *item);
 // The end of the page, with its widgets, for the list of pages.
 void __signin_page_end(void *page);
 void __signin_page_abandon(void *page);

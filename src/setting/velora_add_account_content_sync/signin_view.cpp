@@ -23,6 +23,7 @@ static constexpr double s_build_delay = 0.1;
 
 void __signin_wait_show(SigninViewData *vd, const char *text_id, Evas_Smart_Cb back_cb)
 {
+    _velora_popup_take_away(vd->ad, {vd, ""});
     Evas_Object *popup = _velora_common_progressbar_layout_create(vd->ad->win_main, text_id);
     _velora_common_register_event_for_popup(popup, back_cb, vd);
     _velora_popup_show(vd->ad, {vd, s_wait_topic}, popup);
@@ -234,6 +235,9 @@ static const Handler s_conformant_handlers[] = {
 
 void __signin_view_destroy(SigninViewData *vd)
 {
+    for (Evas_Object *one : {vd->web_view, vd->focus_btn}) // what goes with the focus is asked for it afterwards
+        if (one)
+            elm_object_focus_set(one, EINA_FALSE);
     if (vd->web_view) {
         ewk_view_stop(vd->web_view);
         evas_object_smart_callback_del_full(vd->focus_btn, "focused", _btn_focused, vd->web_view);
@@ -271,13 +275,21 @@ static void __leave(SigninViewData *vd)
     __signin_view_destroy(vd);
 }
 
+void __signin_item_delete(AppData *ad, Elm_Object_Item *item)
+{
+    elm_object_tree_focus_allow_set(ad->naviframe, EINA_FALSE);
+    elm_object_item_del(item);
+    elm_object_tree_focus_allow_set(ad->naviframe, EINA_TRUE);
+}
+
 void __signin_page_end(void *page)
 {
     auto *vd = static_cast<SigninViewData *>(page);
     Elm_Object_Item *item = vd->nf_item;
     elm_naviframe_item_pop_cb_set(item, nullptr, nullptr);
+    AppData *ad = vd->ad;
     __leave(vd);
-    elm_object_item_del(item);
+    __signin_item_delete(ad, item);
 }
 
 void __signin_page_abandon(void *page)
