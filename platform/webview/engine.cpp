@@ -108,7 +108,6 @@ WebKitSettings *settings_new()
              webkit_settings_set_enable_html5_database,
              webkit_settings_set_enable_page_cache,
              webkit_settings_set_enable_dns_prefetching,
-             webkit_settings_set_enable_hyperlink_auditing,
              webkit_settings_set_enable_developer_extras,
              webkit_settings_set_enable_smooth_scrolling,
              webkit_settings_set_enable_back_forward_navigation_gestures,

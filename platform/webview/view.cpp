@@ -70,9 +70,14 @@ void resized(void *data, Evas *, Evas_Object *image, void *)
     view_zoom(view);
 }
 
-void shown_or_hidden(void *data, Evas *, Evas_Object *obj, void *)
+void shown(void *data, Evas *, Evas_Object *, void *)
 {
-    gtk_widget_set_visible(view_of(data).offscreen, evas_object_visible_get(obj));
+    gtk_widget_show(view_of(data).offscreen);
+}
+
+void hidden(void *data, Evas *, Evas_Object *, void *)
+{
+    gtk_widget_hide(view_of(data).offscreen);
 }
 
 void page_make(View &view)
@@ -179,18 +184,18 @@ Evas_Object *view_add(Evas_Object *parent)
     static unsigned serial = 0;
     auto *view = new View;
     view->serial = ++serial;
-    view->obj = elm_bg_add(parent);
+    view->obj = elm_grid_add(parent);
     view->window = elm_object_top_widget_get(parent);
     elm_object_focus_allow_set(view->obj, EINA_TRUE);
     view->image = evas_object_image_filled_add(evas_object_evas_get(parent));
     evas_object_image_alpha_set(view->image, EINA_FALSE);
     evas_object_image_size_set(view->image, 1, 1);
-    elm_object_part_content_set(view->obj, "overlay", view->image);
+    elm_grid_pack(view->obj, view->image, 0, 0, 100, 100);
     page_make(*view);
     paper_paint(*view);
     evas_object_event_callback_add(view->image, EVAS_CALLBACK_RESIZE, resized, view);
-    evas_object_event_callback_add(view->obj, EVAS_CALLBACK_SHOW, shown_or_hidden, view);
-    evas_object_event_callback_add(view->obj, EVAS_CALLBACK_HIDE, shown_or_hidden, view);
+    evas_object_event_callback_add(view->obj, EVAS_CALLBACK_SHOW, shown, view);
+    evas_object_event_callback_add(view->obj, EVAS_CALLBACK_HIDE, hidden, view);
     evas_object_event_callback_add(view->obj, EVAS_CALLBACK_DEL, deleted, view);
     evas_object_show(view->image);
     all.push_back(view);
