@@ -103,22 +103,20 @@ gboolean script_dialog(WebKitWebView *, WebKitScriptDialog *dialog, gpointer dat
 // A list of choices (<select>).
 void picked(void *data, Evas_Object *popup, void *item)
 {
-    auto *menu = static_cast<WebKitOptionMenu *>(data);
     const auto index = reinterpret_cast<uintptr_t>(elm_object_item_data_get(static_cast<Elm_Object_Item *>(item)));
-    webkit_option_menu_activate_item(menu, static_cast<guint>(index));
-    evas_object_del(elm_object_item_widget_get(static_cast<Elm_Object_Item *>(item)));
-    (void)popup;
+    webkit_option_menu_activate_item(static_cast<WebKitOptionMenu *>(data), static_cast<guint>(index));
+    evas_object_del(popup);
 }
 
-gboolean option_menu(WebKitWebView *, WebKitOptionMenu *menu, GdkEvent *, GdkRectangle *, gpointer data)
+gboolean option_menu(WebKitWebView *, WebKitOptionMenu *menu, GdkEvent *, GdkRectangle *place, gpointer data)
 {
     View &view = view_of(data);
     const Hold hold(view);
-    Evas_Object *popup = elm_popup_add(view.window);
+    Evas_Object *popup = ctxpopup_new(view, place->x + place->width / 2, place->y + place->height);
     for (guint i = 0; i < webkit_option_menu_get_n_items(menu); i++) {
         WebKitOptionMenuItem *item = webkit_option_menu_get_item(menu, i);
         const std::string label = markup_of(webkit_option_menu_item_get_label(item));
-        Elm_Object_Item *row = elm_popup_item_append(popup, label.c_str(), nullptr, picked, menu);
+        Elm_Object_Item *row = elm_ctxpopup_item_append(popup, label.c_str(), nullptr, picked, menu);
         elm_object_item_data_set(row, reinterpret_cast<void *>(static_cast<uintptr_t>(i)));
         elm_object_item_disabled_set(row, !webkit_option_menu_item_is_enabled(item) ||
                                               webkit_option_menu_item_is_group_label(item));
@@ -148,6 +146,16 @@ std::string markup_of(const char *text)
     std::string result = markup ? markup : "";
     free(markup);
     return result;
+}
+
+Evas_Object *ctxpopup_new(View &view, int x, int y)
+{
+    Evas_Object *popup = elm_ctxpopup_add(view.window);
+    elm_ctxpopup_hover_parent_set(popup, view.window);
+    int left = 0, top = 0;
+    evas_object_geometry_get(view.image, &left, &top, nullptr, nullptr);
+    evas_object_move(popup, left + x, top + y);
+    return popup;
 }
 
 void popup_set(View &view, Evas_Object *popup, std::function<void()> ended)

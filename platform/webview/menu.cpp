@@ -95,16 +95,12 @@ void chosen(void *data, Evas_Object *popup, void *item)
 void show(View &view, std::unique_ptr<Ewk_Context_Menu> owned, int x, int y)
 {
     Ewk_Context_Menu *menu = owned.release();
-    Evas_Object *popup = elm_ctxpopup_add(view.window);
-    elm_ctxpopup_hover_parent_set(popup, view.window);
+    Evas_Object *popup = ctxpopup_new(view, x, y);
     for (const auto &item : menu->items) {
         Elm_Object_Item *row =
             elm_ctxpopup_item_append(popup, markup_of(item->label.c_str()).c_str(), nullptr, chosen, menu);
         elm_object_item_data_set(row, item.get());
     }
-    Evas_Coord left = 0, top = 0;
-    evas_object_geometry_get(view.image, &left, &top, nullptr, nullptr);
-    evas_object_move(popup, left + x, top + y);
     popup_set(view, popup, [menu] { delete menu; });
 }
 

@@ -59,12 +59,14 @@ gboolean damaged(GtkWidget *, GdkEventExpose *event, gpointer data)
     return FALSE;
 }
 
-void resized(void *data, Evas *, Evas_Object *image, void *)
+void placed(void *data, Evas *, Evas_Object *obj, void *)
 {
     View &view = view_of(data);
-    int width = 0, height = 0;
-    evas_object_geometry_get(image, nullptr, nullptr, &width, &height);
-    if (width < 1 || height < 1)
+    int x = 0, y = 0, width = 0, height = 0, old_width = 0, old_height = 0;
+    evas_object_geometry_get(obj, &x, &y, &width, &height);
+    evas_object_geometry_get(view.image, nullptr, nullptr, &old_width, &old_height);
+    evas_object_geometry_set(view.image, x, y, width, height);
+    if (width < 1 || height < 1 || (width == old_width && height == old_height))
         return;
     gtk_widget_set_size_request(GTK_WIDGET(view.page), width, height); // an offscreen window follows both ways
     view_zoom(view);
@@ -72,11 +74,13 @@ void resized(void *data, Evas *, Evas_Object *image, void *)
 
 void shown(void *data, Evas *, Evas_Object *, void *)
 {
+    evas_object_show(view_of(data).image);
     gtk_widget_show(view_of(data).offscreen);
 }
 
 void hidden(void *data, Evas *, Evas_Object *, void *)
 {
+    evas_object_hide(view_of(data).image);
     gtk_widget_hide(view_of(data).offscreen);
 }
 
@@ -184,20 +188,20 @@ Evas_Object *view_add(Evas_Object *parent)
     static unsigned serial = 0;
     auto *view = new View;
     view->serial = ++serial;
-    view->obj = elm_grid_add(parent);
+    view->obj = elm_layout_add(parent);
     view->window = elm_object_top_widget_get(parent);
     elm_object_focus_allow_set(view->obj, EINA_TRUE);
     view->image = evas_object_image_filled_add(evas_object_evas_get(parent));
     evas_object_image_alpha_set(view->image, EINA_FALSE);
     evas_object_image_size_set(view->image, 1, 1);
-    elm_grid_pack(view->obj, view->image, 0, 0, 100, 100);
+    evas_object_smart_member_add(view->image, view->obj);
     page_make(*view);
     paper_paint(*view);
-    evas_object_event_callback_add(view->image, EVAS_CALLBACK_RESIZE, resized, view);
+    evas_object_event_callback_add(view->obj, EVAS_CALLBACK_MOVE, placed, view);
+    evas_object_event_callback_add(view->obj, EVAS_CALLBACK_RESIZE, placed, view);
     evas_object_event_callback_add(view->obj, EVAS_CALLBACK_SHOW, shown, view);
     evas_object_event_callback_add(view->obj, EVAS_CALLBACK_HIDE, hidden, view);
     evas_object_event_callback_add(view->obj, EVAS_CALLBACK_DEL, deleted, view);
-    evas_object_show(view->image);
     all.push_back(view);
     return view->obj;
 }
