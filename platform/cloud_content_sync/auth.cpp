@@ -244,6 +244,8 @@ void Auth::deactivate()
         forget_sign_in(request.sign_in);
         return revoke_access(one, then);
     }
+    if (request.is_sign_in_only)
+        return then(CLOUD_CONTENT_SYNC_ERROR_NONE);
     client.end_requests(CLOUD_CONTENT_SYNC_ERROR_NO_ACCOUNT);
     // What is on this device goes first: a process that is killed in between leaves a token that the person can still
     // revoke at the service, and not an account that the service refuses.

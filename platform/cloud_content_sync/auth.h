@@ -19,6 +19,7 @@ struct AuthRequest {
     cloud_content_sync_email_cb email_cb = nullptr;
     cloud_content_sync_status_cb status_cb = nullptr;
     void *user_data = nullptr;
+    bool is_sign_in_only = false; // of a deactivation: it leaves an account alone
     int id = 0;
     int sign_in = 0; // the one that was under way when it was asked for
 };

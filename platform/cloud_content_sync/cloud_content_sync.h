@@ -157,8 +157,8 @@ int cloud_content_sync_cancel(cloud_content_sync_h handle, int req_id);
 
 // The credentials by which the device's user is known to a service, as a sign-in or a set-up tool leaves them.
 // user null: bearer token in secret (RFC 6750); otherwise HTTP Basic (RFC 7617). secret null: nobody is signed in any
-// more. They are kept in a file that its owner alone can read, the secret in the session's Secret Service where there is
-// one that works without asking the person, and sent to the service's storage and account interface alone. Requests
+// more. They are kept in a file that its owner alone can read, the secret in the session's Secret Service where there
+// is one that works without asking the person, and sent to the service's storage and account interface alone. Requests
 // that begin later use them. While the Secret Service that has the secret cannot be asked they fail with UNAUTHORIZED.
 //
 // email: the account's address, as the service gives it. The account is known by it, so a new token, or another way to
@@ -212,6 +212,9 @@ int cloud_content_sync_activate(cloud_content_sync_h handle, cloud_content_sync_
 // DB_FAILED, only when something on the device could not be removed: then whoever was signed in still is. With nobody
 // signed in it is DONE.
 int cloud_content_sync_deactivate(cloud_content_sync_h handle, cloud_content_sync_status_cb cb, void *user_data);
+// Ends a sign-in that is under way, as above; with none under way nothing is done, whoever is signed in, and that is
+// DONE.
+int cloud_content_sync_auth_abandon(cloud_content_sync_h handle, cloud_content_sync_status_cb cb, void *user_data);
 // Ends the request of this section that runs, which then has no callback. No callback of it runs any more on return:
 // one that is running is waited for, unless this is called from within it. An activation that has stored its
 // credentials is not undone, nor a deactivation that has begun. A sign-in that is under way stays so. NOT_FOUND when

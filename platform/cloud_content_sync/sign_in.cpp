@@ -50,6 +50,14 @@ int cloud_content_sync_deactivate(cloud_content_sync_h handle, cloud_content_syn
     return ask(handle, {.kind = AuthRequest::DEACTIVATE, .status_cb = cb, .user_data = user_data});
 }
 
+int cloud_content_sync_auth_abandon(cloud_content_sync_h handle, cloud_content_sync_status_cb cb, void *user_data)
+{
+    if (!handle || !cb)
+        return INVALID;
+    return ask(handle,
+               {.kind = AuthRequest::DEACTIVATE, .status_cb = cb, .user_data = user_data, .is_sign_in_only = true});
+}
+
 int cloud_content_sync_auth_cancel(cloud_content_sync_h handle)
 {
     if (!handle)

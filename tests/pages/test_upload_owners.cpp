@@ -73,10 +73,6 @@ TEST_F(Owners, OtherRequestsLeaveARunAlone)
         Texts answers;
     } cases[] = {
         {"a tap on the icon", "", [] { request({.sender = "icon"}); }, {"first succeeded", "icon canceled"}},
-        {"another account",
-         "pending page",
-         [] { request({.operation = APP_CONTROL_OPERATION_ACCOUNT_ADD, .sender = "settings"}); },
-         {"first succeeded", "settings canceled"}},
         {"a share without a network",
          "network",
          [this] {

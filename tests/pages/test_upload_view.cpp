@@ -149,7 +149,7 @@ TEST_F(Browser, SaysWhatIsWrongAndTriesAgain)
 {
     for (const auto &[error, words] :
          {std::pair(CLOUD_CONTENT_SYNC_ERROR_NETWORK, "Velora cannot be reached"), // with Wi-Fi on
-          {CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED, "You are signed out"}}) {
+          {CLOUD_CONTENT_SYNC_ERROR_SERVER, "Velora cannot be reached"}}) {
         fake_cloud_reset();
         fake_cloud_add_folder("/Fresh");
         fake_cloud_fail_refresh(error);

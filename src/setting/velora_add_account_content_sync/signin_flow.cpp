@@ -92,12 +92,9 @@ static void __velora_refresh_cb(int status, int, void *data)
     _velora_common_pipe_send_msg(ad->pipe, "refresh_meta_done");
 }
 
-static void __ended_cb(int, int, void *) {}
-
-void __signin_forget(SigninViewData *vd)
+SignoutScope __signin_scope(const SigninViewData *vd)
 {
-    cloud_content_sync_auth_cancel(vd->client.get());
-    cloud_content_sync_deactivate(vd->client.get(), __ended_cb, nullptr);
+    return vd->is_activated ? SIGNOUT_ACCOUNT : SIGNOUT_SIGN_IN;
 }
 
 // Failures
@@ -128,7 +125,7 @@ void __popup_cancel_cb(void *, Evas_Object *, void *)
         return;
     vd->is_over = true;
     elm_object_tree_focus_allow_set(ad->naviframe, EINA_TRUE);
-    _velora_common_signout_without_remove_popup(ad, vd);
+    _velora_common_signout_without_remove_popup(ad, vd, __signin_scope(vd));
 }
 
 static void __create_back_popup_cancel_cb(void *, Evas_Object *, void *)
@@ -143,14 +140,14 @@ static void __create_back_popup_cancel_cb(void *, Evas_Object *, void *)
         return;
     vd->is_over = true;
     if (ad->launch_mode == LAUNCH_MODE_SETUP_WIZARD) {
-        _velora_common_signout_without_remove_popup(ad, vd);
+        _velora_common_signout_without_remove_popup(ad, vd, __signin_scope(vd));
         return;
     }
     _velora_popup_take_away(ad, {vd, ""});
     elm_object_tree_focus_allow_set(ad->naviframe, EINA_TRUE);
     if (!_velora_pages_have_others(vd))
         evas_object_hide(ad->win_main);
-    _velora_common_signout(ad, vd);
+    _velora_common_signout(ad, vd, __signin_scope(vd));
 }
 
 // The page's address
@@ -279,6 +276,7 @@ static void (*__next_page(int launch_mode))(AppData *ad)
 static void __signed_in(SigninViewData *vd)
 {
     AppData *ad = vd->ad;
+    vd->is_activated = true;
     if (_velora_common_account_insert(vd->client.get(), ad->email) != 0) {
         __signin_fail(vd);
         return;
@@ -328,7 +326,7 @@ static void __signin_view_pipe_cb(void *, void *buffer, unsigned int)
     const auto is = [message](const char *text) { return std::strcmp(message, text) == 0; };
     if (is("cancel")) {
         _velora_popup_take_away(vd->ad, {vd, ""});
-        _velora_common_signout(vd->ad, vd);
+        _velora_common_signout(vd->ad, vd, __signin_scope(vd));
     } else if (vd->is_over) {
         VELORA_LOGI("%s of a sign-in that is given up", message);
     } else if (is("activate_success")) {

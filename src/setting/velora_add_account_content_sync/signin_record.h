@@ -1,6 +1,7 @@
 #pragma once
 // The record of the sign-in page, and what its two files know of each other. Main loop only, but for `request_token`.
 #include "velora_common/velora_app_data.h"
+#include "velora_common/velora_signout.h"
 #include <string>
 
 struct SigninViewData {
@@ -20,6 +21,7 @@ struct SigninViewData {
     void (*done)(AppData *ad) = nullptr; // of a page that lies over another one
     std::string web, callback, ca_file;  // the service's addresses
     bool is_approved = false;            // the person has allowed the device in
+    bool is_activated = false;           // it is the device's account, but for its record
     bool is_over = false;                // declined, failed or given up: all that is left is to leave
 };
 
@@ -43,8 +45,8 @@ void __signin_fail(SigninViewData *vd, const char *text_id = "IDS_CLOUD_BODY_SER
 void __signin_begin(SigninViewData *vd);
 // Loads the page that the token is for, once there are both a token and a web view.
 void __signin_page_load(SigninViewData *vd);
-// Ends a sign-in that has come to nothing, at the service as well; nobody waits for it.
-void __signin_forget(SigninViewData *vd);
+// What a sign-in that comes to nothing now has to end.
+SignoutScope __signin_scope(const SigninViewData *vd);
 
 // signin_view.cpp
 

@@ -261,6 +261,9 @@ void __signin_view_destroy(SigninViewData *vd)
     delete vd;
 }
 
+// Client thread. Nobody waits for it.
+static void __abandoned_cb(int, int, void *) {}
+
 // Nobody knows the page any more but its widgets.
 static void __leave(SigninViewData *vd)
 {
@@ -268,8 +271,10 @@ static void __leave(SigninViewData *vd)
     _velora_pages_remove(vd);
     if (_velora_common_signout_is_under_way())
         _velora_common_signout_end(ad);
+    else if (vd->client && vd->is_activated) // without a record: the next request settles it
+        VELORA_LOGI("an account is left without its record");
     else if (vd->client)
-        __signin_forget(vd);
+        cloud_content_sync_auth_abandon(vd->client.get(), __abandoned_cb, nullptr);
     _velora_popup_take_away(ad, {vd, ""});
     elm_object_tree_focus_allow_set(ad->naviframe, EINA_TRUE);
     __signin_view_destroy(vd);

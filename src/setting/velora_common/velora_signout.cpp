@@ -18,7 +18,7 @@ static constexpr double s_longest_wait = 10;
 struct Signout {
     bool is_under_way = false;
     void *page = nullptr;
-    bool has_last_word = false; // says at the end that the account is signed out
+    SignoutScope scope = SIGNOUT_ACCOUNT;
     ClientHold client;
     pthread_t thread = 0;
     bool is_joinable = false;
@@ -51,7 +51,9 @@ static void *__thread_sigout(void *data)
         VELORA_LOGE("data is NULL");
         return nullptr;
     }
-    const int err_code = cloud_content_sync_deactivate(s_signout.client.get(), __cloud_content_sync_status_cb, ad);
+    auto *const end =
+        s_signout.scope == SIGNOUT_ACCOUNT ? cloud_content_sync_deactivate : cloud_content_sync_auth_abandon;
+    const int err_code = end(s_signout.client.get(), __cloud_content_sync_status_cb, ad);
     if (err_code != 0) { // no callback will come
         VELORA_LOGE("err_code[%d]", err_code);
         __send_end(ad);
@@ -204,7 +206,7 @@ static void __wait_show(AppData *ad)
     ad->signout_popup = popup;
 }
 
-static int __signout(AppData *ad, void *page, Ecore_Pipe_Cb receiver, bool has_wait)
+static int __signout(AppData *ad, void *page, SignoutScope scope, Ecore_Pipe_Cb receiver, bool has_wait)
 {
     if (!ad) {
         VELORA_LOGE("ad is NULL");
@@ -212,7 +214,7 @@ static int __signout(AppData *ad, void *page, Ecore_Pipe_Cb receiver, bool has_w
     }
     if (s_signout.is_under_way)
         return 0;
-    s_signout = {.is_under_way = true, .page = page, .client = ad->client};
+    s_signout = {.is_under_way = true, .page = page, .scope = scope, .client = ad->client};
     ad->signout_pipe = _velora_common_pipe_add(receiver, ad);
     s_signout.patience = ecore_timer_add(s_longest_wait, __patience_cb, ad);
     _velora_common_create_thread(&s_signout.thread, __thread_sigout, ad);
@@ -224,17 +226,17 @@ static int __signout(AppData *ad, void *page, Ecore_Pipe_Cb receiver, bool has_w
     return 0;
 }
 
-int _velora_common_signout(AppData *ad, void *page)
+int _velora_common_signout(AppData *ad, void *page, SignoutScope scope)
 {
-    return __signout(ad, page, __add_account_sigout_pipe_cb, true);
+    return __signout(ad, page, scope, __add_account_sigout_pipe_cb, true);
 }
 
-int _velora_common_signout_without_remove_popup(AppData *ad, void *page)
+int _velora_common_signout_without_remove_popup(AppData *ad, void *page, SignoutScope scope)
 {
-    return __signout(ad, page, __add_account_sigout_pipe_cb, false);
+    return __signout(ad, page, scope, __add_account_sigout_pipe_cb, false);
 }
 
 int _velora_common_add_account_with_popup_signout(AppData *ad, void *page)
 {
-    return __signout(ad, page, __add_account_with_popup_sigout_pipe_cb, true);
+    return __signout(ad, page, SIGNOUT_ACCOUNT, __add_account_with_popup_sigout_pipe_cb, true);
 }
