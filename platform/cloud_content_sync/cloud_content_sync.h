@@ -157,8 +157,8 @@ int cloud_content_sync_cancel(cloud_content_sync_h handle, int req_id);
 
 // The credentials by which the device's user is known to a service, as a sign-in or a set-up tool leaves them.
 // user null: bearer token in secret (RFC 6750); otherwise HTTP Basic (RFC 7617). secret null: nobody is signed in any
-// more. They are kept in a file that its owner alone can read, the secret in the session's Secret Service where there is
-// one that works without asking the person, and sent to the service's storage and account interface alone. Requests
+// more. They are kept in a file that its owner alone can read, the secret in the session's Secret Service where there
+// is one that works without asking the person, and sent to the service's storage and account interface alone. Requests
 // that begin later use them. While the Secret Service that has the secret cannot be asked they fail with UNAUTHORIZED.
 //
 // email: the account's address, as the service gives it. The account is known by it, so a new token, or another way to
