@@ -142,6 +142,7 @@ Transfer *Http::start(std::unique_ptr<Transfer> owned, const Credentials &creden
         curl_easy_setopt(easy, CURLOPT_TIMEOUT, static_cast<long>(transfer.time_limit.count()));
         // On a kept connection that turns out dead libcurl would send it again.
         curl_easy_setopt(easy, CURLOPT_FRESH_CONNECT, 1L);
+        curl_easy_setopt(easy, CURLOPT_FORBID_REUSE, 1L); // or each would leave a connection behind
     }
     set_credentials(easy, credentials);
     set_body(easy, transfer);

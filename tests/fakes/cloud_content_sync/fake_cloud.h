@@ -51,7 +51,8 @@ void fake_cloud_fail_auth(int nth, int error);
 // A pause before each step of a request, in milliseconds. An upload takes three steps: half of its body, the rest
 // and the answer (more when it is large); a refresh one, and any other request one.
 void fake_cloud_set_delay(int milliseconds);
-// While held, no step is taken, except for as many as are let through.
+// While held, no step is taken, except for as many as are let through. A client that is destroyed meanwhile, and has a
+// token to revoke, waits three seconds for nothing.
 void fake_cloud_hold(bool hold);
 void fake_cloud_let_through(int steps);
 
