@@ -94,12 +94,17 @@ bool Accounts::add(const std::string &email, const std::string &password, int64_
                 .done();
         return true;
     }
+    const std::string hash = password_hash(password);
+    if (hash.empty()) {
+        reason = "the password of " + email + " is too long";
+        return false;
+    }
     if (mkdirat(root, address.c_str(), 0777) != 0 && errno != EEXIST) {
         reason = "cannot make the folder of " + address + ": " + g_strerror(errno);
         return false;
     }
     Stmt insert(*db, "INSERT INTO accounts(email, display_name, password, quota) VALUES(?, ?, ?, ?)");
-    insert.bind(1, address).bind(2, email.substr(0, email.find('@'))).bind(3, password_hash(password));
+    insert.bind(1, address).bind(2, email.substr(0, email.find('@'))).bind(3, hash);
     insert.bind(4, static_cast<long long>(quota >= 0 ? quota : DEFAULT_QUOTA));
     if (insert.done())
         return true;

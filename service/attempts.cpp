@@ -62,6 +62,9 @@ int Attempts::take(const std::string &what, double most, double seconds)
 std::string network_of(const std::string &peer)
 {
     static const size_t NETWORK_BYTES = 8;
+    static const std::string MAPPED = "::ffff:"; // IPv4 on a socket for both
+    if (peer.starts_with(MAPPED))
+        return peer.substr(MAPPED.size());
     GInetAddress *address = g_inet_address_new_from_string(peer.c_str());
     if (!address)
         return peer;

@@ -29,7 +29,7 @@ static void show_approval(Visit &visit, const Asked &asked, const RequestToken &
 {
     const std::string device = token.device.empty() ? text_of(Text::UNNAMED_DEVICE, visit.language) : token.device;
     std::string content = "<dl>\n<div><dt>" + visit.say(Text::DEVICE) + "</dt><dd><bdi>" + escape(device) +
-                          "</bdi></dd></div>\n<div><dt>" + visit.say(Text::SIGNED_IN_AS) + "</dt><dd><bdi>" +
+                          "</bdi></dd></div>\n<div><dt>" + visit.say(Text::ACCOUNT_NAME) + "</dt><dd><bdi>" +
                           escape(visit.account->email) + "</bdi></dd></div>\n</dl>\n";
     if (token.network != visit.network)
         content += paragraph(visit.say(Text::OTHER_NETWORK), "warning");

@@ -156,7 +156,8 @@ static constexpr const char *TEXTS[][LANGUAGES] = {
      "Cerrar sesión en esta página", "이 페이지에서 로그아웃", "退出此页面"},
     {"Unnamed device", "Gerät ohne Namen", "Appareil sans nom", "Dispositivo sin nombre", "이름 없는 기기",
      "未命名设备"},
-    {"Terms of use", "Nutzungsbedingungen", "Conditions d’utilisation", "Condiciones de uso", "이용 약관", "使用条款"},
+    {"Terms of use", "Nutzungs\u00adbedingungen", "Conditions d’utilisation", "Condiciones de uso", "이용 약관",
+     "使用条款"},
     {"This service is run by the person or the organisation that gave you its address. They alone are responsible for "
      "it, "
      "and they are the ones to ask.",

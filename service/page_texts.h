@@ -21,7 +21,7 @@ enum class Text {
     WAIT_MINUTES, // %1: how many
     APPROVE_TITLE,
     DEVICE,
-    SIGNED_IN_AS,
+    ACCOUNT_NAME,
     APPROVE_WHAT,
     APPROVE_WARNING,
     OTHER_NETWORK,

@@ -75,6 +75,10 @@ class Cloud {
     pid_t pid = 0;
 };
 
+// Checks that no statement that the service has told of (--log-sql) reads a table from end to end, and that there were
+// so many at least.
+void expect_no_scans(const Cloud &cloud, int least);
+
 // A connection on which a request is sent piece by piece.
 class Connection {
   public:

@@ -271,6 +271,25 @@ TEST(Strain, PropertiesCountAndDeepTreesGo)
     EXPECT_EQ(cloud.temporary_files(), 0u);
 }
 
+void expect_no_scans(const Cloud &cloud, int least)
+{
+    Db db;
+    ASSERT_TRUE(db.open(cloud.root / "velora-cloud.db", nullptr));
+    std::istringstream log(read_file(cloud.place / "err"));
+    int count = 0;
+    for (std::string line; std::getline(log, line);) {
+        const std::string sql = line.starts_with("sql: ") ? line.substr(5) : "";
+        if (sql.find(" FROM ") == sql.npos && sql.find("UPDATE") == sql.npos)
+            continue;
+        Stmt plan(db, ("EXPLAIN QUERY PLAN " + sql).c_str());
+        for (count++; plan.row();)
+            EXPECT_TRUE(plan.text(3).find("SCAN ") == std::string::npos || plan.text(3).find("SCAN (") == 0 ||
+                        plan.text(3).find("CONSTANT ROW") != std::string::npos)
+                << sql << ": " << plan.text(3);
+    }
+    EXPECT_GT(count, least);
+}
+
 // No statement reads a table from end to end, whatever it holds.
 TEST(Strain, NoStatementScansWhatGrows)
 {
@@ -288,21 +307,7 @@ TEST(Strain, NoStatementScansWhatGrows)
     cloud.ask("COPY", "/dav/d/", {"Destination: /dav/e"});
     cloud.ask("MOVE", "/dav/e/", {"Destination: /dav/d"});
     cloud.ask("DELETE", "/dav/d/");
-    Db db;
-    ASSERT_TRUE(db.open(cloud.root / "velora-cloud.db", nullptr));
-    std::istringstream log(read_file(cloud.place / "err"));
-    int count = 0;
-    for (std::string line; std::getline(log, line);) {
-        const std::string sql = line.starts_with("sql: ") ? line.substr(5) : "";
-        if (sql.find(" FROM ") == sql.npos && sql.find("UPDATE") == sql.npos)
-            continue;
-        Stmt plan(db, ("EXPLAIN QUERY PLAN " + sql).c_str());
-        for (count++; plan.row();)
-            EXPECT_TRUE(plan.text(3).find("SCAN ") == std::string::npos || plan.text(3).find("SCAN (") == 0 ||
-                        plan.text(3).find("CONSTANT ROW") != std::string::npos)
-                << sql << ": " << plan.text(3);
-    }
-    EXPECT_GT(count, 20);
+    expect_no_scans(cloud, 20);
 }
 
 TEST(Strain, ServesOverTlsAndSaysWhatItDid)
@@ -320,6 +325,8 @@ TEST(Strain, ServesOverTlsAndSaysWhatItDid)
     EXPECT_EQ(cloud.ask("PUT", "/dav/large", {}, bytes).status, 201);
     EXPECT_TRUE(cloud.ask("GET", "/dav/large").body == bytes);
     EXPECT_EQ(cloud.ask("GET", "/dav/none?secret=1").status, 404);
+    const std::string cookie = cloud.ask("GET", "/m").header("set-cookie");
+    EXPECT_TRUE(cookie.starts_with("__Host-velora=") && cookie.ends_with("; HttpOnly; SameSite=Lax; Secure")) << cookie;
     unsetenv("CLOUD_TEST_CA");
     EXPECT_EQ(cloud.ask("GET", "/dav/large").status, 0) << "trusted without a reason";
     const Connection plain(cloud.port);
