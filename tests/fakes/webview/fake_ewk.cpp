@@ -23,8 +23,8 @@ namespace {
 using fake_ewk::Answer;
 
 struct View {
-    Evas_Object *obj = nullptr;       // null once it is deleted
-    std::string base, address, going; // going: what is under way
+    Evas_Object *obj = nullptr;               // null once it is deleted
+    std::string base, address, wanted, going; // going: what is under way
     bool is_loading = false, is_dead = false;
 };
 
@@ -251,7 +251,11 @@ void ewk_view_url_set(Evas_Object *obj, const char *address)
         return;
     what_was_seen.address = address;
     later(view, [](View &one) { finished(one); }); // what is stopped
-    later(view, [view, wanted = what_was_seen.address](View &) { go(view, wanted, By::program); });
+    view->wanted = address;
+    later(view, [view](View &one) {
+        if (const std::string wanted = std::exchange(one.wanted, ""); !wanted.empty())
+            go(view, wanted, By::program);
+    });
 }
 
 const char *ewk_view_url_get(const Evas_Object *obj)
@@ -266,6 +270,7 @@ void ewk_view_stop(Evas_Object *obj)
     if (!view)
         return;
     what_was_seen.stopped++;
+    view->wanted.clear();
     later(view, [](View &one) { finished(one); });
 }
 
