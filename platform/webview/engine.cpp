@@ -35,18 +35,25 @@ class Variable {
     bool is_ours;
 };
 
+// An error is the end of a request, not of the program.
+int note_error(Display *, XErrorEvent *error)
+{
+    host->print(4, "WEBVIEW", "X error %d of request %d.%d", error->error_code, error->request_code, error->minor_code);
+    return 0;
+}
+
 bool toolkit_start()
 {
     const Variable no_bridge("NO_AT_BRIDGE", "1"); // Elementary speaks to screen readers
     // GDK's handlers end the process at an error; Ecore's know that windows come and go.
     const auto on_error = XSetErrorHandler(nullptr);
     const auto on_io_error = XSetIOErrorHandler(nullptr);
-    XSetErrorHandler(on_error);
+    const auto fatal = XSetErrorHandler(on_error); // what is left when nobody handles them
     XSetIOErrorHandler(on_io_error);
     gtk_disable_setlocale(); // the program has done it
     gdk_set_allowed_backends("x11,wayland");
     const bool started = gtk_init_check(nullptr, nullptr);
-    XSetErrorHandler(on_error);
+    XSetErrorHandler(on_error == fatal ? note_error : on_error);
     XSetIOErrorHandler(on_io_error);
     if (!started)
         return false;

@@ -6,6 +6,22 @@
 #include <xkbcommon/xkbcommon.h>
 
 namespace {
+// What the engine's gestures take for a touchscreen: a device like the pointer that is one. The machine's own, if it
+// has any, are Evas's affair.
+GdkDevice *touchscreen(GdkDevice *pointer)
+{
+    static GdkDevice *device = GDK_DEVICE(g_object_new(
+        G_OBJECT_TYPE(pointer), "display", gdk_device_get_display(pointer), "name", "fingers", "type",
+        GDK_DEVICE_TYPE_SLAVE, "input-source", GDK_SOURCE_TOUCHSCREEN, "input-mode", GDK_MODE_SCREEN, nullptr));
+    return device;
+}
+
+bool is_touch(const GdkEvent *event)
+{
+    return event->type == GDK_TOUCH_BEGIN || event->type == GDK_TOUCH_UPDATE || event->type == GDK_TOUCH_END ||
+           event->type == GDK_TOUCH_CANCEL;
+}
+
 void send(View &view, GdkEvent *event)
 {
     const bool is_key = event->type == GDK_KEY_PRESS || event->type == GDK_KEY_RELEASE;
@@ -13,6 +29,8 @@ void send(View &view, GdkEvent *event)
         GdkSeat *seat = gdk_display_get_default_seat(gtk_widget_get_display(GTK_WIDGET(view.page)));
         event->any.window = GDK_WINDOW(g_object_ref(window));
         gdk_event_set_device(event, is_key ? gdk_seat_get_keyboard(seat) : gdk_seat_get_pointer(seat));
+        if (is_touch(event))
+            gdk_event_set_source_device(event, touchscreen(gdk_seat_get_pointer(seat)));
         gtk_main_do_event(event);
     }
     gdk_event_free(event);

@@ -123,12 +123,14 @@ gboolean decide(WebKitWebView *, WebKitPolicyDecision *decision, WebKitPolicyDec
 {
     View &view = view_of(data);
     if (type == WEBKIT_POLICY_DECISION_TYPE_RESPONSE) {
-        if (webkit_response_policy_decision_is_mime_type_supported(WEBKIT_RESPONSE_POLICY_DECISION(decision)))
+        auto *response = WEBKIT_RESPONSE_POLICY_DECISION(decision);
+        if (webkit_response_policy_decision_is_mime_type_supported(response))
             return FALSE;
         const Hold hold(view);
+        const std::string url = webkit_uri_request_get_uri(webkit_response_policy_decision_get_request(response));
         webkit_policy_decision_ignore(decision); // no downloads
         if (view.is_loading)
-            emit_error(view, EWK_ERROR_OTHER, view.address.c_str(), "not a page");
+            emit_error(view, EWK_ERROR_OTHER, url.c_str(), "not a page");
         return TRUE;
     }
     if (type == WEBKIT_POLICY_DECISION_TYPE_NAVIGATION_ACTION) {

@@ -16,13 +16,13 @@ class Signin : public UploadPage {
     {
         UploadPage::SetUp();
         forget_account();
-        fake_ewk_reset();
+        fake_ewk::clear();
         vconf_set_str("db/menu_widget/language", "de_DE.UTF-8");
     }
     void TearDown() override
     {
         EXPECT_EQ(signin::s_vd, nullptr);
-        EXPECT_EQ(fake_ewk_views(), 0);
+        EXPECT_EQ(fake_ewk::live_views(), 0);
         UploadPage::TearDown();
     }
     static void forget_account()
@@ -62,7 +62,7 @@ class Signin : public UploadPage {
             int x = 0; // the page may still be on its way in
             if (signin::s_vd && signin::s_vd->web_view)
                 evas_object_geometry_get(signin::s_vd->web_view, &x, nullptr, nullptr, nullptr);
-            return signin::s_vd && !fake_ewk_url().empty() && !app->popup && x == 0;
+            return signin::s_vd && !fake_ewk::seen().address.empty() && !app->popup && x == 0;
         });
     }
     static bool has_popup(const char *topic)
@@ -78,10 +78,16 @@ class Signin : public UploadPage {
         return app->popup &&
                driver::click(elm_object_part_content_get(app->popup, ("button" + std::to_string(number)).c_str()));
     }
+    // A form is sent, and this comes of it.
+    static void send(fake_ewk::Answer answer)
+    {
+        fake_ewk::site([answer](const std::string &) { return answer; });
+        fake_ewk::navigate(std::string(web) + "/1/oauth/authorize");
+    }
     static void approve()
     {
         fake_cloud_approve("someone@example.org");
-        fake_ewk_navigate(callback + "?oauth_token=t&uid=1");
+        fake_ewk::navigate(callback + "?oauth_token=t&uid=1");
     }
     static bool press_back()
     {
@@ -134,20 +140,20 @@ TEST_F(Signin, MakesAnAccountAndGoesOn)
         SCOPED_TRACE(c.name);
 
         forget_account();
-        fake_ewk_reset();
+        fake_ewk::clear();
         run([&] {
             Wish wish = c.wish;
             wish.paths = locals(c.files);
             request(wish);
             EXPECT_TRUE(popup_says("Loading"));
             ASSERT_TRUE(is_page_there());
-            EXPECT_EQ(fake_ewk_cookies_cleared(), 1);
-            fake_ewk_navigate(std::string(web) + "/1/oauth/authorize"); // the form is sent
+            EXPECT_EQ(fake_ewk::seen().cookies_cleared, 1);
+            send({});
             approve();
             ASSERT_TRUE(wait_for([] { return !signin::s_vd; }));
             driver::settle();
             EXPECT_EQ(accounts(), somebody);
-            EXPECT_EQ(fake_ewk_views(), 0);
+            EXPECT_EQ(fake_ewk::live_views(), 0);
             EXPECT_NE(driver::read_texts(app->win_main).find(c.next), std::string::npos);
             ASSERT_EQ(s_vd != nullptr, !c.files.empty());
             if (!s_vd)
@@ -167,7 +173,7 @@ TEST_F(Signin, OpensTheServicesPageInThePersonsLanguage)
         SCOPED_TRACE(language);
         vconf_set_str("db/menu_widget/language", language.c_str());
         for (const bool is_signin : {true, false}) {
-            fake_ewk_reset();
+            fake_ewk::clear();
             run([&] {
                 add();
                 signin::s_vd->is_signin = is_signin;
@@ -176,9 +182,10 @@ TEST_F(Signin, OpensTheServicesPageInThePersonsLanguage)
                 const std::string page = std::string(web) + "/1/oauth/authorize?oauth_token=" + token;
                 char *cont =
                     g_uri_escape_string((page + "&oauth_callback=" + escaped + "&cl=" + locale).c_str(), "/", TRUE);
-                EXPECT_EQ(fake_ewk_url(), is_signin ? page + "&oauth_callback=" + callback + "&locale=" + locale
-                                                    : std::string(web) + "/m/register?cl=" + locale +
-                                                          "&signup_data=velora-device&cont=" + taken(cont));
+                EXPECT_EQ(fake_ewk::seen().address, is_signin
+                                                        ? page + "&oauth_callback=" + callback + "&locale=" + locale
+                                                        : std::string(web) + "/m/register?cl=" + locale +
+                                                              "&signup_data=velora-device&cont=" + taken(cont));
             });
         }
     }
@@ -188,7 +195,7 @@ TEST_F(Signin, NothingIsLeftOfOneThatFails)
 {
     const auto at_page = [] { return is_page_there(); };
     const auto at_start = [] { return true; };
-    const auto send = [] { fake_ewk_start(std::string(web) + "/1/oauth/authorize"); };
+    const auto send_in_vain = [] { send({fake_ewk::Answer::hang}); };
     const struct {
         const char *name;
         std::function<void()> before; // the request
@@ -200,29 +207,48 @@ TEST_F(Signin, NothingIsLeftOfOneThatFails)
     } cases[] = {
         {"no client", [] { fake_cloud_fail_create(CLOUD_CONTENT_SYNC_ERROR_NO_SERVICE); }, at_start, {}},
         {"no request token", [] { fake_cloud_fail_auth(1, CLOUD_CONTENT_SYNC_ERROR_NETWORK); }, at_start, {}},
-        {"no web view", fake_ewk_fail_add, at_start, {}},
-        {"not allowed after all", {}, at_page, [] { fake_ewk_navigate(callback + "?oauth_token=t"); }},
+        {"no web view", fake_ewk::refuse_views, at_start, {}},
+        {"not allowed after all", {}, at_page, [] { fake_ewk::navigate(callback + "?oauth_token=t"); }},
         {"no e-mail", [] { fake_cloud_fail_auth(2, CLOUD_CONTENT_SYNC_ERROR_SERVER); }, at_page, approve},
-        {"the service's home", {}, at_page, [] { fake_ewk_navigate(std::string(web) + "/m"); }},
-        {"web process killed", {}, at_page, fake_ewk_crash},
+        {"the service's home", {}, at_page, [] { fake_ewk::navigate(std::string(web) + "/m"); }},
+        {"web process killed", {}, at_page, fake_ewk::crash},
         {"web process killed on the way",
          {},
          at_page,
          [&] {
-             send();
-             fake_ewk_crash();
+             send_in_vain();
+             fake_ewk::crash();
          }},
-        {"certificate", {}, at_page, [] { fake_ewk_error(EWK_ERROR_CERTIFICATE); }, "could not prove"},
-        {"network", {}, at_page, [] { fake_ewk_error(EWK_ERROR_NETWORK); }, "does not answer"},
-        {"network, and back", {}, at_page, [] { fake_ewk_error(EWK_ERROR_NETWORK); }, "does not answer", 0},
-        {"a page that never comes", {}, at_page, send, "Something went wrong", 1, "0.2"},
-        {"back on such a page", {}, at_page, send, "Processing", 0},
+        {"certificate",
+         {},
+         at_page,
+         [] {
+             send({fake_ewk::Answer::error, "", EWK_ERROR_CERTIFICATE});
+         },
+         "could not prove"},
+        {"network",
+         {},
+         at_page,
+         [] {
+             send({fake_ewk::Answer::error, "", EWK_ERROR_NETWORK});
+         },
+         "does not answer"},
+        {"network, and back",
+         {},
+         at_page,
+         [] {
+             send({fake_ewk::Answer::error, "", EWK_ERROR_NETWORK});
+         },
+         "does not answer",
+         0},
+        {"a page that never comes", {}, at_page, send_in_vain, "Something went wrong", 1, "0.2"},
+        {"back on such a page", {}, at_page, send_in_vain, "Processing", 0},
     };
     for (const auto &c : cases) {
         SCOPED_TRACE(c.name);
 
         fake_app::clear();
-        fake_ewk_reset();
+        fake_ewk::clear();
         setenv("VELORA_PAGE_LOAD_SECONDS", c.seconds, 1);
         run([&] {
             if (c.before)
@@ -255,7 +281,11 @@ TEST_F(Signin, LeavesUploadsAndTheirAccountAlone)
          [] { // a page on its way in takes no keys
              return wait_for([] { return press_back() && !signin::s_vd; });
          }},
-        {"declined", [] { return is_page_there(); }, [] { return fake_ewk_navigate(callback + "?not_approved=true"); }},
+        {"declined", [] { return is_page_there(); },
+         [] {
+             fake_ewk::navigate(callback + "?not_approved=true");
+             return true;
+         }},
     };
     for (const auto &c : cases) {
         SCOPED_TRACE(c.name);
@@ -264,7 +294,7 @@ TEST_F(Signin, LeavesUploadsAndTheirAccountAlone)
         fake_cloud_sign_in("someone@example.org");
         fake_cloud_refresh_now();
         fake_app::clear();
-        fake_ewk_reset();
+        fake_ewk::clear();
         run([&] {
             share({"a.txt", "b.txt"});
             fake_cloud_hold(true);
