@@ -64,6 +64,7 @@ class Device:
             CLOUD_SERVICES_DIR=os.path.join(self.home, "services"),
             VELORA_MEDIA_ROOT=os.path.join(self.home, "media"),
             ORVANT_INSPECT="1",
+            CLOUD_SECRETS="file",  # nobody's keyring
         )
         if scale:
             self.env["ELM_SCALE"] = str(scale)

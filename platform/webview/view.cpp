@@ -1,4 +1,5 @@
 // A view's life, size and painting.
+#include "inspect.h"
 #include "menu.h"
 #include "watch.h"
 #include <algorithm>
@@ -119,6 +120,7 @@ void deleted(void *data, Evas *, Evas_Object *, void *)
     const Hold hold(view);
     std::erase(all, &view);
     watch_stop(view);
+    inspect_stop(view);
     input_disconnect(view);
     evas_object_del(view.popup);
     if (view.asking)
@@ -203,5 +205,6 @@ Evas_Object *view_add(Evas_Object *parent)
     evas_object_event_callback_add(view->obj, EVAS_CALLBACK_HIDE, hidden, view);
     evas_object_event_callback_add(view->obj, EVAS_CALLBACK_DEL, deleted, view);
     all.push_back(view);
+    inspect_start(*view);
     return view->obj;
 }

@@ -56,6 +56,10 @@ struct View {
     // menu.cpp, dialog.cpp
     Evas_Object *popup = nullptr;
 
+    // inspect.cpp
+    Ecore_Timer *inspector = nullptr;
+    std::string inspected;
+
     double text_zoom = 1;
 };
 

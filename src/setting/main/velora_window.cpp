@@ -3,10 +3,12 @@
 #include "vconf/vconf.h"
 #include "velora_common/velora_indicator.h"
 #include "velora_common/velora_log.h"
+#include "velora_common/velora_pages.h"
 #include "velora_common/velora_paths.h"
 
 static void __win_delete_request_cb(void *, Evas_Object *, void *)
 {
+    _velora_pages_abandon(); // the widgets go before the last messages of workers are read
     elm_exit();
 }
 

@@ -303,6 +303,7 @@ void __signin_page_abandon(void *page)
     if (vd->client)
         cloud_content_sync_auth_cancel(vd->client.get());
     vd->client = nullptr;
+    vd->is_over = true;
 }
 
 static Eina_Bool __velora_signin_back_cb(void *, Elm_Object_Item *)

@@ -206,7 +206,7 @@ Names server_names()
 
 Names page_names()
 {
-    return {};
+    return {"VeloraCloud"};
 }
 
 std::optional<Backend> start_backend(const std::string &name)

@@ -49,6 +49,7 @@ struct TempHome : TempFolder {
     {
         setenv("PLATFORM_DATA_DIR", path.c_str(), 1);
         setenv("XDG_CACHE_HOME", (path + "/cache").c_str(), 1);
+        setenv("CLOUD_SECRETS", "file", 1); // nobody's keyring
     }
 };
 
