@@ -13,7 +13,7 @@ Visit::Visit(Request &asked) : request(asked), service(*asked.service), network(
     const char *cookies = request.header("Cookie");
     char **items = g_strsplit(cookies ? cookies : "", ";", 64);
     for (char **item = items; *item; item++)
-        if (const char *cookie = g_strstrip(*item); name.compare(0, name.size(), cookie, name.size()) == 0)
+        if (const char *cookie = g_strstrip(*item); g_str_has_prefix(cookie, name.c_str()))
             id = cookie + name.size();
     g_strfreev(items);
     if (!Sessions::is_id(id))
