@@ -20,7 +20,7 @@ PAGES = {
     "/link-foreign": "<a class=all href=https://foreign.invalid/>link</a>",
     "/link-window": "<a class=all href=/page target=_blank>link</a>",
     # each field reports what it holds, or that it was reached, as an address of the site
-    "/form": "<form method=post action=/sent><input class=all name=a><input name=b></form>",
+    "/form": "<form method=post action=/sent><input class=all name=a><input name=b><button></button></form>",
     "/select": "<select class=all onchange=\"location='/chose-'+value\"><option>1<option>2<option>3</select>",
     "/alert": "<button class=all onclick=\"alert('a <b>&amp;</b>');location='/closed'\">ask</button>",
     "/foreign-parts": "<img src=OTHER/a.png><script src=OTHER/b.js></script><iframe src=OTHER/c></iframe>"
