@@ -147,12 +147,15 @@ TEST_F(Engine, ViewsLeaveNothingBehind)
     const auto at_rest = [](int most) { return [most] { return descriptors() <= most; }; };
     driver::run_until([] { return false; }, 0.5);
     const int files = descriptors();
-    const long threads = status("Threads"), memory = status("VmRSS");
+    const long threads = status("Threads");
+    [[maybe_unused]] const long memory = status("VmRSS");
     for (int i = 0; i < 5; i++)
         ASSERT_TRUE(visit_once());
     // the engine's pools breathe; a view that stays has a dozen descriptors and 1.2 MB of pixels
     EXPECT_TRUE(driver::run_until(at_rest(files + 6), 5)) << descriptors() << " of " << files;
     EXPECT_TRUE(driver::run_until([&] { return status("Threads") <= threads + 3; }, 10));
+#if !defined(__SANITIZE_ADDRESS__) // which keeps what was freed
     EXPECT_LT(status("VmRSS"), memory + 3000);
+#endif
 }
 } // namespace
