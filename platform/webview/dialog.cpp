@@ -24,7 +24,7 @@ void popup_deleted(void *data, Evas *, Evas_Object *popup, void *)
 
 void popup_close(void *, Evas_Object *popup, void *)
 {
-    evas_object_del(popup);
+    popup_close_soon(popup);
 }
 
 // A question of the page's script, which stands still until it is answered.
@@ -45,12 +45,12 @@ void agreed(void *data, Evas_Object *, void *)
         webkit_script_dialog_prompt_set_text(asked->dialog, text ? text : "");
         free(text);
     }
-    evas_object_del(asked->popup);
+    popup_close_soon(asked->popup);
 }
 
 void refused(void *data, Evas_Object *, void *)
 {
-    evas_object_del(static_cast<Dialog *>(data)->popup);
+    popup_close_soon(static_cast<Dialog *>(data)->popup);
 }
 
 void button_add(Dialog *asked, const char *part, const char *text, Evas_Smart_Cb clicked, bool is_primary)
@@ -105,7 +105,7 @@ void picked(void *data, Evas_Object *popup, void *item)
 {
     const auto index = reinterpret_cast<uintptr_t>(elm_object_item_data_get(static_cast<Elm_Object_Item *>(item)));
     webkit_option_menu_activate_item(static_cast<WebKitOptionMenu *>(data), static_cast<guint>(index));
-    evas_object_del(popup);
+    popup_close_soon(popup);
 }
 
 gboolean option_menu(WebKitWebView *, WebKitOptionMenu *menu, GdkEvent *, GdkRectangle *place, gpointer data)
@@ -146,6 +146,19 @@ std::string markup_of(const char *text)
     std::string result = markup ? markup : "";
     free(markup);
     return result;
+}
+
+void popup_close_soon(Evas_Object *popup)
+{
+    ecore_job_add(
+        [](void *closing) {
+            for (const View *view : views())
+                if (view->popup == closing) {
+                    evas_object_del(view->popup);
+                    return;
+                }
+        },
+        popup);
 }
 
 Evas_Object *ctxpopup_new(View &view, int x, int y)

@@ -12,20 +12,29 @@
 // the callback returns, strings as long as what they are read from. Functions answer false, 0 or null for null
 // arguments and do nothing else.
 //
-// Smart events of a view, in the order in which they come, event_info in parentheses:
-//   "policy,navigation,decide" (Ewk_Policy_Decision *)  the view is about to go to an address, also by a redirect.
-//                                    A handler may refuse it; else it is taken when it is allowed, see below.
-//   "load,started" (null)            an allowed address begins to load
-//   "load,finished" (null)           it is there, or it has failed, or it was stopped: once for each "load,started"
-//   "load,error" (const Ewk_Error *) the page in the view's frame could not be loaded; before its "load,finished". The
-//   view shows nothing of
-//                                    the engine's own; what a person is told is the handler's concern.
+// Smart events of a view, in the order in which they come, event_info in parentheses. Any handler may delete the view.
+//   "policy,navigation,decide" (Ewk_Policy_Decision *)  the view is about to go to an address, also by a redirect, in
+//                                    its frame (others are not shown). A handler may refuse it; else it is taken when
+//                                    it is allowed, see ewk_view_base_set. For an address that is neither http nor
+//                                    https it comes while ewk_view_url_set runs.
+//   "load,started" (null)            an allowed address begins to load; also when it turns out that nobody answers
+//   there "load,error" (const Ewk_Error *) the page in the view's frame could not be loaded. The view shows nothing of
+//   the
+//                                    engine's own; what a person is told is the handler's concern. "load,finished"
+//                                    follows when "load,started" came. An address that is not allowed is an error when
+//                                    ewk_view_url_set or a redirect leads to it; a link or form that leads there has no
+//                                    effect but a line in the log.
+//   "load,finished" (null)           it is there, or has failed, or was stopped, or another address takes its place:
+//   once
+//                                    for each "load,started", but for this: of a load whose redirect a handler has
+//                                    refused nothing more is heard.
 //   "webprocess,crashed" (null)      the process that shows the pages has ended, or answers nothing, or has painted
 //                                    nothing for the view's patience. The view is of no use any more, but for being
-//                                    deleted. Comes at most once, after it no other event.
+//                                    deleted. Comes at most once, after it no other event, "load,finished" included.
 //   "create,window" (const char *address)  a page wants a new window; it gets none
 //   "contextmenu,customize" (Ewk_Context_Menu *)  the menu of the right button, or of a finger held still, is about to
-//                                    be shown; a handler may take items out. An empty menu is not shown.
+//                                    be shown; a handler may take items out. An empty menu is not shown. It has what a
+//                                    view can do of what the engine offers: downloads are never among it.
 #include <Evas.h>
 
 struct Ewk_Context;
@@ -35,9 +44,10 @@ struct Ewk_Context_Menu;
 struct Ewk_Context_Menu_Item;
 
 enum Ewk_Error_Type {
-    EWK_ERROR_NETWORK,     // the service cannot be reached, or broke off
-    EWK_ERROR_CERTIFICATE, // its certificate is not to be trusted; nothing was sent
-    EWK_ERROR_REFUSED,     // the address is not allowed
+    EWK_ERROR_NETWORK, // the service cannot be reached, or broke off
+    // its certificate is not to be trusted: nothing was sent; or it was changed in between: nothing that came is shown
+    EWK_ERROR_CERTIFICATE,
+    EWK_ERROR_REFUSED, // the address is not allowed
     EWK_ERROR_OTHER,
 };
 struct Ewk_Error {
@@ -70,15 +80,17 @@ enum Ewk_Context_Menu_Item_Tag {
 Evas_Object *ewk_view_add(Evas_Object *parent);
 
 // Has the module's files read by a thread of its own, so that the first ewk_view_add() takes less of the main loop.
-// Any number of times.
+// Any number of times. It also tries the sandbox there.
 void ewk_prepare();
 
 // What the view may load: addresses whose scheme, host and port are those of `base` ("https://cloud.example:8443").
-// All others are refused and logged. A view without a base loads nothing. `ca_file`: certificates in PEM to trust
+// All others, and those that name a user, are refused and logged by scheme, host and port alone. What a page is made of
+// comes from its own origin, or not. A view without a base loads nothing. `ca_file`: certificates in PEM to trust
 // instead of the system's for this base; null or "" for the system's.
 void ewk_view_base_set(Evas_Object *view, const char *base, const char *ca_file);
 // How long, in seconds, a page may leave the view unpainted, or the engine a question unanswered, before
-// "webprocess,crashed"; 20 at first.
+// "webprocess,crashed"; 20 at first. Only while somebody can see the view, and not while a question of the page's
+// script waits for the person. A service that takes its time is not the engine's fault.
 void ewk_view_patience_set(Evas_Object *view, double seconds);
 
 // Loads an address; what was being loaded is stopped.
@@ -87,9 +99,10 @@ void ewk_view_url_set(Evas_Object *view, const char *address);
 const char *ewk_view_url_get(const Evas_Object *view);
 // Ends loading, without an error.
 void ewk_view_stop(Evas_Object *view);
-// How much larger than in its design the page's text is; 1 at first.
+// How much larger than in its design the page's text is; 1 at first. By itself a page of 16 pixels has the size of the
+// program's text: 480 pixels at the scale 1.8 are 360 of CSS.
 void ewk_view_text_zoom_set(Evas_Object *view, double zoom);
-// Whether pages are told that the person prefers dark ones (prefers-color-scheme).
+// Whether pages are told that the person prefers dark ones (prefers-color-scheme); for all views of the process.
 void ewk_view_dark_set(Evas_Object *view, bool is_dark);
 
 Ewk_Context *ewk_view_context_get(const Evas_Object *view);

@@ -249,6 +249,16 @@ void focus_set(View &view, bool has_focus)
     im_focus(view, has_focus);
 }
 
+// Keys come to an object of Evas, the view's own or one inside it.
+bool keys_come_to(const View &view)
+{
+    const Evas *canvas = evas_object_evas_get(view.obj);
+    const Evas_Object *focused = evas_focus_state_get(canvas) ? evas_focus_get(canvas) : nullptr;
+    while (focused && focused != view.obj)
+        focused = evas_object_smart_parent_get(focused);
+    return focused;
+}
+
 // Focus passes through other objects on its way: it is looked at when it has settled.
 void focus_moved(void *data, Evas *, void *)
 {
@@ -260,8 +270,7 @@ void focus_moved(void *data, Evas *, void *)
             View &settled = view_of(moved);
             settled.focus_job = nullptr;
             const Hold hold(settled);
-            focus_set(settled, evas_focus_state_get(evas_object_evas_get(settled.obj)) &&
-                                   (elm_object_focus_get(settled.obj) || evas_object_focus_get(settled.obj)));
+            focus_set(settled, keys_come_to(settled));
         },
         data);
 }

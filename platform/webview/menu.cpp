@@ -37,14 +37,14 @@ std::string label_of(GtkAction *action)
     return label;
 }
 
-void perform(View &view, WebKitContextMenuAction action, const std::string &link)
+void perform(View &view, WebKitContextMenuAction action, std::string link)
 {
     switch (action) {
     case WEBKIT_CONTEXT_MENU_ACTION_OPEN_LINK:
         webkit_web_view_load_uri(view.page, link.c_str());
         break;
     case WEBKIT_CONTEXT_MENU_ACTION_OPEN_LINK_IN_NEW_WINDOW:
-        view_emit(view, "create,window", const_cast<char *>(link.c_str()));
+        view_emit(view, "create,window", link.data());
         break;
     case WEBKIT_CONTEXT_MENU_ACTION_COPY_LINK_TO_CLIPBOARD:
         gtk_clipboard_set_text(gtk_clipboard_get(GDK_SELECTION_CLIPBOARD), link.c_str(), -1);
@@ -85,11 +85,8 @@ void chosen(void *data, Evas_Object *popup, void *item)
         static_cast<const Ewk_Context_Menu_Item *>(elm_object_item_data_get(static_cast<Elm_Object_Item *>(item)));
     View &view = *menu->view;
     const Hold hold(view);
-    const WebKitContextMenuAction action = chosen_one->action;
-    const std::string link = menu->link;
-    evas_object_del(popup); // and with it the menu
-    elm_object_focus_set(view.obj, EINA_TRUE);
-    perform(view, action, link);
+    popup_close_soon(popup);
+    perform(view, chosen_one->action, menu->link);
 }
 
 void show(View &view, std::unique_ptr<Ewk_Context_Menu> owned, int x, int y)

@@ -14,6 +14,8 @@ void dialog_connect(View &view);
 // The view's one popup, in place of an earlier one: goes at the back key, with the view, or with the page's process.
 // `ended` is called when it does, and never again. `popup` is a new ctxpopup or popup.
 void popup_set(View &view, Evas_Object *popup, std::function<void()> ended);
+// Not at once: the key that was its answer would reach the page as well.
+void popup_close_soon(Evas_Object *popup);
 // A list of items to choose from; `x` and `y` in the page. Its items are still to be added.
 Evas_Object *ctxpopup_new(View &view, int x, int y);
 // Plain text as Elementary wants it.

@@ -23,12 +23,14 @@ class Engine : public testing::Test {
     {
         backend::start();
     }
-    // The page that a script or a form leads to.
-    static bool arrives(const Visit &visit, const std::string &path)
+    // The page that a script or a form leads to is there, and whole.
+    static bool arrives(Visit &visit, const std::string &path)
     {
         const std::string address = backend::base() + path;
-        const bool there = driver::run_until([&] { return visit.view && ewk_view_url_get(visit.view) == address; }, 10);
-        EXPECT_EQ(ewk_view_url_get(visit.view), address);
+        const bool there = driver::run_until(
+            [&] { return ewk_view_url_get(visit.view) == address && visit.said.ends_with("finished"); }, 10);
+        EXPECT_EQ(ewk_view_url_get(visit.view), address) << visit.said;
+        visit.said.clear();
         return there;
     }
     std::string base = backend::base();
@@ -72,7 +74,8 @@ TEST_F(Engine, TypingAndTab)
     Visit visit(base);
     visit.load(base + "/form", page_came);
     driver::click(visit.view);
-    driver::run_until([] { return false; }, 0.3); // the focus of the page is told to nobody
+    EXPECT_TRUE(driver::run_until([&] { return elm_object_focus_get(visit.view); }, 5));
+    driver::run_until([] { return false; }, 0.3); // what has the focus in the page, nobody is told
     for (const char *key : {"a", "Tab", "b", "Return"})
         driver::press(visit.window, key);
     arrives(visit, "/got?a=a&b=b");
@@ -144,11 +147,15 @@ TEST_F(Engine, ViewsLeaveNothingBehind)
     const auto at_rest = [](int most) { return [most] { return descriptors() <= most; }; };
     driver::run_until([] { return false; }, 0.5);
     const int files = descriptors();
-    const long threads = status("Threads"), memory = status("VmRSS");
+    const long threads = status("Threads");
+    [[maybe_unused]] const long memory = status("VmRSS");
     for (int i = 0; i < 5; i++)
         ASSERT_TRUE(visit_once());
-    EXPECT_TRUE(driver::run_until(at_rest(files), 5)) << descriptors() << " of " << files;
-    EXPECT_LE(status("Threads"), threads + 1);
-    RecordProperty("kilobytes", static_cast<int>(status("VmRSS") - memory));
+    // the engine's pools breathe; a view that stays has a dozen descriptors and 1.2 MB of pixels
+    EXPECT_TRUE(driver::run_until(at_rest(files + 6), 5)) << descriptors() << " of " << files;
+    EXPECT_TRUE(driver::run_until([&] { return status("Threads") <= threads + 3; }, 10));
+#if !defined(__SANITIZE_ADDRESS__) // which keeps what was freed
+    EXPECT_LT(status("VmRSS"), memory + 3000);
+#endif
 }
 } // namespace
