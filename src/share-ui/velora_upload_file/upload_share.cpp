@@ -138,7 +138,8 @@ void __share_meta_done(UploadViewData *vd)
 void __share_meta_changed(UploadViewData *vd)
 {
     // Rows that would be the same stay, for there may be a finger on one.
-    if (vd->phase != PHASE_BROWSING || (__state_shown(vd) == VIEW_STATE_NONE && !__folder_list_has_changed(vd)))
+    const bool is_listed = __state_shown(vd) == VIEW_STATE_NONE && __meta_state(vd) != VIEW_STATE_SIGNED_OUT;
+    if (vd->phase != PHASE_BROWSING || (is_listed && !__folder_list_has_changed(vd)))
         return;
     int x = 0, y = 0, w = 0, h = 0;
     elm_scroller_region_get(vd->genlist, &x, &y, &w, &h);
