@@ -217,7 +217,8 @@ class Device:
         self.service.send_signal(signal.SIGUSR1)
 
     def sign_in(self):
-        self.token_set(self.tool("service/velora-cloud", "--root", self.data, "--token", EMAIL).split()[-1])
+        self.token = self.tool("service/velora-cloud", "--root", self.data, "--token", EMAIL).split()[-1]
+        self.token_set(self.token)
         self.tool("platform/account/device-account", "add", "--package", APP, "--domain", "Velora", "--user", EMAIL)
 
     def token_set(self, token):

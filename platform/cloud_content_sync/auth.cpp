@@ -89,7 +89,9 @@ Transfer *Auth::post(const char *path, const std::string &body, const Credential
     transfer->done = [this, answer, then = std::move(then)](Transfer &done) {
         background.erase(&done);
         int error = done.is_success() ? 0 : done.error();
-        if (error && error != CLOUD_CONTENT_SYNC_ERROR_NETWORK && error != CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED)
+        if (done.result == CURLE_PEER_FAILED_VERIFICATION)
+            error = CLOUD_CONTENT_SYNC_ERROR_CERTIFICATE;
+        else if (error && error != CLOUD_CONTENT_SYNC_ERROR_NETWORK && error != CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED)
             error = CLOUD_CONTENT_SYNC_ERROR_SERVER;
         then(error, *answer);
         client.http.wake();
@@ -158,23 +160,24 @@ void Auth::begin_sign_in()
     current = std::make_shared<SignIn>();
     current->id = running->id;
     const int id = running->id;
-    asking = post("/1/oauth/request_token", json_object("device", device_name()), {},
-                  [this, id](int error, const std::string &answer) {
-                      asking = nullptr;
-                      if (error)
-                          return finish(
-                              id, error == CLOUD_CONTENT_SYNC_ERROR_NETWORK ? error : CLOUD_CONTENT_SYNC_ERROR_SERVER);
-                      const std::string token = token_in(answer, "$.oauth_token");
-                      const std::string secret = token_in(answer, "$.oauth_token_secret");
-                      if (token.empty() || secret.empty())
-                          return finish(id, CLOUD_CONTENT_SYNC_ERROR_SERVER);
-                      // It may be another's by now; then nobody is told either.
-                      if (current && current->id == id) {
-                          current->token = token;
-                          current->secret = secret;
-                      }
-                      finish(id, 0, token, secret);
-                  });
+    asking =
+        post("/1/oauth/request_token", json_object("device", device_name()), {},
+             [this, id](int error, const std::string &answer) {
+                 asking = nullptr;
+                 if (error)
+                     return finish(id, error == CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED ? CLOUD_CONTENT_SYNC_ERROR_SERVER
+                                                                                      : error);
+                 const std::string token = token_in(answer, "$.oauth_token");
+                 const std::string secret = token_in(answer, "$.oauth_token_secret");
+                 if (token.empty() || secret.empty())
+                     return finish(id, CLOUD_CONTENT_SYNC_ERROR_SERVER);
+                 // It may be another's by now; then nobody is told either.
+                 if (current && current->id == id) {
+                     current->token = token;
+                     current->secret = secret;
+                 }
+                 finish(id, 0, token, secret);
+             });
 }
 
 void Auth::ask_for_access()

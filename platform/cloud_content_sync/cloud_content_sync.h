@@ -38,6 +38,7 @@ enum cloud_content_sync_error_e {
     CLOUD_CONTENT_SYNC_ERROR_STORAGE_FULL = 26,  // the account's storage is full (507)
     CLOUD_CONTENT_SYNC_ERROR_BAD_NAME = 27,      // the service cannot store a file of this name
     CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED = 28, // the local file changed while it was sent
+    CLOUD_CONTENT_SYNC_ERROR_CERTIFICATE = 29,   // the service's certificate is not to be trusted; of a sign-in alone
 };
 // States of a transfer and of a refresh. Callbacks bring RUNNING, DONE and FAILED; what is queued is silent.
 enum cloud_content_sync_state_e {
@@ -191,7 +192,8 @@ int cloud_content_sync_credentials_set(const char *service_name, const char *ema
 // more than otherwise.
 
 // status: DONE, with the token and the secret that belongs to it, both valid until the callback returns; or FAILED,
-// with null for both and an error: NETWORK, SERVER. The secret is the client's concern; it is not needed to go on.
+// with null for both and an error: NETWORK, CERTIFICATE, SERVER. The secret is the client's concern; it is not needed
+// to go on.
 typedef void (*cloud_content_sync_request_token_cb)(int status, const char *request_token, const char *secret,
                                                     int error, void *user_data);
 int cloud_content_sync_auth_get_request_token_info(cloud_content_sync_h handle, cloud_content_sync_request_token_cb cb,

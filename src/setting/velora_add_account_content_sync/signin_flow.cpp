@@ -49,6 +49,7 @@ static void __velora_token_info_cb(int status, const char *request_token, const 
     }
     if (error != 0 || status != CLOUD_CONTENT_SYNC_STATE_DONE) {
         VELORA_LOGE("no request token: %d", error);
+        s_vd->error = error;
         __send("get_access_token_fail");
         return;
     }
@@ -111,6 +112,11 @@ void __signin_fail(SigninViewData *vd, const char *text_id, const char *title_id
     if (title_id)
         elm_object_domain_translatable_part_text_set(popup, "title,text", VELORA_DOMAIN, title_id);
     _velora_popup_show(vd->ad, {vd, s_error_topic}, popup);
+}
+
+void __signin_fail_certificate(SigninViewData *vd)
+{
+    __signin_fail(vd, "IDS_VELORA_BODY_CERTIFICATE", "IDS_VELORA_HEADER_NOT_SAFE");
 }
 
 void __popup_cancel_cb(void *, Evas_Object *, void *)
@@ -336,8 +342,13 @@ static void __signin_view_pipe_cb(void *, void *buffer, unsigned int)
         __signin_fail(vd);
     } else if (is("get_email_success")) {
         __activate(vd);
-    } else if (is("get_email_fail") || is("get_access_token_fail")) {
+    } else if (is("get_email_fail")) {
         __signin_fail(vd);
+    } else if (is("get_access_token_fail")) {
+        if (vd->error == CLOUD_CONTENT_SYNC_ERROR_CERTIFICATE)
+            __signin_fail_certificate(vd);
+        else
+            __signin_fail(vd);
     } else if (is("get_access_token_success")) {
         __signin_page_load(vd);
     } else {

@@ -20,6 +20,7 @@ struct SigninViewData {
     int launch_mode = LAUNCH_MODE_NONE;  // that the page was opened in
     void (*done)(AppData *ad) = nullptr; // of a page that lies over another one
     std::string web, callback, ca_file;  // the service's addresses
+    std::atomic<int> error = 0;          // why there is no request token; the client's thread
     bool is_approved = false;            // the person has allowed the device in
     bool is_activated = false;           // it is the device's account, but for its record
     bool is_over = false;                // declined, failed or given up: all that is left is to leave
@@ -41,6 +42,8 @@ void __popup_cancel_cb(void *data, Evas_Object *obj, void *event_info);
 // The popup that says what went wrong, in the place of what is on screen; its OK gives up. `title` may be null.
 void __signin_fail(SigninViewData *vd, const char *text_id = "IDS_CLOUD_BODY_SERVER_ERROR_OCCURRED_TRY_LATER",
                    const char *title_id = nullptr);
+// The service has shown a certificate that is not to be trusted.
+void __signin_fail_certificate(SigninViewData *vd);
 // Asks for a request token, with the wait on screen. The page that belongs to it follows.
 void __signin_begin(SigninViewData *vd);
 // Loads the page that the token is for, once there are both a token and a web view.

@@ -125,11 +125,12 @@ static void __load_error_cb(void *, Evas_Object *, void *event_info)
     if (vd->is_over || vd->is_approved)
         return;
     if (error->type == EWK_ERROR_CERTIFICATE) {
-        __signin_fail(vd, "IDS_VELORA_BODY_CERTIFICATE", "IDS_VELORA_HEADER_NOT_SAFE");
+        __signin_fail_certificate(vd);
         return;
     }
     if (error->type != EWK_ERROR_NETWORK)
         return;
+    _velora_popup_take_away(vd->ad, {vd, ""}); // before the next one takes the focus from it
     _velora_popup_show(vd->ad, {vd, s_error_topic},
                        _velora_common_with_title_btn_popup(
                            vd->ad->win_main, __shared_text("IDS_VELORA_STATE_ERROR_TITLE"),
@@ -239,6 +240,7 @@ void __signin_view_destroy(SigninViewData *vd)
         if (one)
             elm_object_focus_set(one, EINA_FALSE);
     if (vd->web_view) {
+        elm_access_object_unregister(vd->web_view);
         ewk_view_stop(vd->web_view);
         evas_object_smart_callback_del_full(vd->focus_btn, "focused", _btn_focused, vd->web_view);
         evas_object_smart_callback_del_full(vd->focus_btn, "unfocused", _btn_unfocused, vd->web_view);
@@ -347,7 +349,8 @@ static Eina_Bool __web_view_create(void *data)
     for (const Handler &one : s_view_handlers)
         evas_object_smart_callback_add(vd->web_view, one.event, one.handler, vd);
     elm_access_object_unregister(vd->focus_btn);
-    elm_access_object_register(vd->web_view, vd->ad->win_main);
+    Evas_Object *spoken = elm_access_object_register(vd->web_view, vd->ad->win_main);
+    elm_object_focus_allow_set(spoken, elm_config_access_get()); // for the keys the view itself is the place
     ea_screen_reader_name_set(vd->web_view, VELORA_SERVICE);
     __signin_page_load(vd);
     return ECORE_CALLBACK_CANCEL;

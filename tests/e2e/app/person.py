@@ -14,7 +14,8 @@ PACKAGE = "com.orvant.velora-share"
 # What EFL, the compiler's run-time checks and the C library print when something is wrong in a program.
 # Not EFL's regret that the last widget of a window that could have the focus goes, nor that Edje keeps the parts of
 # themes that are gone in its list of those that follow a size class.
-FAULTS = re.compile(r"^(?:(?:ERR|CRI)<\d+>(?!.*Could not fetch a node located|.*efl_observer_update\(\)).*|.*AddressSanitizer.*|.*LeakSanitizer.*|.*ThreadSanitizer.*|.*runtime error:.*"
+# Nor what the web engine's processes say when their connections go with them.
+FAULTS = re.compile(r"^(?!\(WebKit)(?:(?:ERR|CRI)<\d+>(?!.*Could not fetch a node located|.*efl_observer_update\(\)).*|.*AddressSanitizer.*|.*LeakSanitizer.*|.*ThreadSanitizer.*|.*runtime error:.*"
                     r"|.*CRITICAL \*\*.*|free\(\).*|malloc.*corrupt.*|terminate called.*)$", re.M)
 
 

@@ -68,14 +68,6 @@ def callers_window(person):
     check(owner.value == caller, f"the window belongs to {owner.value:#x}, not to {caller:#x}")
 
 
-def no_account(person):
-    person.share(person.file("one.txt"))
-    wait_for("a popup", lambda: person.find("OK", "Elm_Button"))
-    person.click("OK", "Elm_Button")
-    person.ends()
-    person.has_stored({})
-
-
 def names_taken(person):
     person.put(f"{FOLDER}/photo.jpg", b"taken before")
     paths = [person.file(name) for name in ("photo.jpg", "elsewhere/photo.jpg", "late.jpg", "a/late.jpg")]
@@ -148,7 +140,6 @@ SCENARIOS = [  # the longest ones first
     ("names that could be mistaken for something else", hostile_names, {}),
     ("files that cannot be read, between good ones", bad_files, {}),
     ("the window of the caller", callers_window, {}),
-    ("nobody is signed in", no_account, {"account": False}),
     ("names that are taken, also in the last moment", names_taken, {}),
     ("the window is closed in the middle", window_closed, {"service": SLOW}),
     ("no session bus", no_bus, {}),
