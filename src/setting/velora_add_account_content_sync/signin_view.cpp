@@ -107,9 +107,9 @@ static void __again_cb(void *, Evas_Object *, void *)
         __signin_begin(vd);
 }
 
-static char *__shared_text(const char *id)
+static char *__text_of_page(const char *id)
 {
-    return dcgettext(VELORA_SHARE_DOMAIN, id, LC_MESSAGES);
+    return dcgettext(VELORA_DOMAIN, id, LC_MESSAGES);
 }
 
 // The network may be back in a moment: what was to be done is not given up for that.
@@ -133,9 +133,9 @@ static void __load_error_cb(void *, Evas_Object *, void *event_info)
     _velora_popup_take_away(vd->ad, {vd, ""}); // before the next one takes the focus from it
     _velora_popup_show(vd->ad, {vd, s_error_topic},
                        _velora_common_with_title_btn_popup(
-                           vd->ad->win_main, __shared_text("IDS_VELORA_STATE_ERROR_TITLE"),
-                           __shared_text("IDS_VELORA_STATE_ERROR_TEXT"), __popup_cancel_cb, __again_cb,
-                           __shared_text("IDS_CLOUD_SK2_CANCEL"), __shared_text("IDS_VELORA_BUTTON_RETRY"), vd));
+                           vd->ad->win_main, __text_of_page("IDS_VELORA_STATE_ERROR_TITLE"),
+                           __text_of_page("IDS_VELORA_STATE_ERROR_TEXT"), __popup_cancel_cb, __again_cb,
+                           __text_of_page("IDS_CLOUD_SK2_CANCEL"), __text_of_page("IDS_VELORA_BUTTON_RETRY"), vd));
 }
 
 static void __webprocess_crashed_cb(void *, Evas_Object *, void *)

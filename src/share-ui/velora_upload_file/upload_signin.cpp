@@ -3,7 +3,6 @@
 #include "velora_common/velora_current_popup.h"
 #include "velora_common/velora_popup.h"
 #include "velora_upload_file/upload_text.h"
-#include "velora_upload_file/velora_upload_view.h"
 #include <libintl.h>
 
 static const char s_topic[] = "signed out";
@@ -19,7 +18,7 @@ void __signin_open_cb(void *data, Evas_Object *, void *)
     if (vd != s_vd)
         return;
     _velora_popup_take_away(vd->ad, {vd, s_topic});
-    _velora_signin_create_over(vd->ad, _velora_upload_view_signed_in);
+    _velora_signin_create_over(vd->ad, __signed_in_again);
 }
 
 static void __cancel_cb(void *data, Evas_Object *, void *)

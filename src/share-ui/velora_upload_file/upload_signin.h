@@ -6,5 +6,7 @@
 bool __is_signed_out(int error);
 // Opens the sign-in over the view; `data` is the view. What waits goes on afterwards.
 void __signin_open_cb(void *data, Evas_Object *obj, void *event_info);
+// There is an account again: what waited for it goes on. The view's own, above all others.
+void __signed_in_again(AppData *ad);
 // Says that the account was signed out, and offers to sign in again.
 void __signin_ask(UploadViewData *vd);

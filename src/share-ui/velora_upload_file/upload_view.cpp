@@ -21,6 +21,7 @@
 #include "velora_upload_file/upload_retry.h"
 #include "velora_upload_file/upload_select.h"
 #include "velora_upload_file/upload_share.h"
+#include "velora_upload_file/upload_signin.h"
 #include "velora_upload_file/upload_thumbnails.h"
 #include "velora_upload_file/upload_waiting.h"
 #include "velora_upload_file/upload_worker.h"
@@ -168,7 +169,7 @@ void _velora_upload_view_create(AppData *ad)
     }
 }
 
-void _velora_upload_view_signed_in(AppData *)
+void __signed_in_again(AppData *)
 {
     UploadViewData *vd = s_vd;
     if (vd && vd->phase == PHASE_BROWSING)

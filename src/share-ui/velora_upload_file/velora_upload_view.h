@@ -12,8 +12,5 @@ void _velora_upload_view_update();
 // The first refresh of the folder tree has ended.
 void _velora_upload_view_meta_done();
 
-// There is an account again, after one was signed out: what waited for it goes on.
-void _velora_upload_view_signed_in(AppData *ad);
-
 // Call before AppData's list is replaced by a result's: the files in it wait for their folder, whatever comes first.
 void _velora_upload_view_keep_waiting(AppData *ad);
