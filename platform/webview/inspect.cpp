@@ -1,15 +1,15 @@
 #include "inspect.h"
 #include <cstdlib>
 
-// Lines of kind, text, x, y, width and height, in parts of the view's width. Fields go by their labels, what has the
-// focus comes last once more.
+// Lines of kind, text, x, y, width and height, in parts of the view's width: what is in sight, and alerts wherever they
+// are. Fields go by their labels, what has the focus comes last once more.
 static constexpr char script[] = R"js((function () {
     const lines = [], text = node => (node.innerText || "").trim().replace(/\s+/g, " ");
     const name = node => node.labels && node.labels.length ? text(node.labels[0])
         : text(node) || node.getAttribute("aria-label") || (node.type === "submit" && node.value) || "";
     const add = (kind, node) => {
         const box = node.getBoundingClientRect();
-        if (name(node) && box.width > 1 && box.height > 1 && box.bottom > 0 && box.top < innerHeight)
+        if (name(node) && box.width > 1 && box.height > 1 && (kind === "page:alert" || (box.bottom > 0 && box.top < innerHeight)))
             lines.push([kind, name(node), ...[box.left, box.top, box.width, box.height].map(n => n / innerWidth)].join("\t"));
     };
     const all = (kind, nodes) => document.querySelectorAll(nodes).forEach(node => add(kind, node));

@@ -292,7 +292,40 @@ def certificate(tour):
     tour.step("another one: nothing is sent", refused)
 
 
+def thirty(tour):
+    """Thirty sign-ins in one process, which an open share keeps: what grows?"""
+    person = tour.person
+
+    def once():
+        person.request = person.launch("account/add")
+        sign_in(person)
+        allow(person)
+        wait_for("the folders again", lambda: person.find("Done", "Elm_Button") and person.find("Photos") and
+                 not web_processes(person), 30)
+
+    def size():
+        folder = f"/proc/{person.application.pid}"
+        with open(folder + "/status", encoding="ascii") as file:
+            status = dict(line.split(":", 1) for line in file)
+        return (len(os.listdir(folder + "/fd")), int(status["Threads"]), int(status["VmRSS"].split()[0]))
+
+    def many():
+        sizes = []
+        for _ in range(33):
+            once()
+            time.sleep(1)
+            sizes.append(size())
+        before, after = sizes[2], sizes[-1]
+        one_account(person)
+        told = f"descriptors, threads, KiB after 3: {before}, after 33: {after}"
+        check(all(late <= early * 1.02 + 1 for early, late in zip(before, after)), f"{told}; in between {sizes}")
+        return told
+
+    tour.step("a share is open", lambda: (person.share(person.file("one.txt")), person.sees("Photos", "Done")))
+    tour.step("thirty sign-ins leave nothing behind", many)
+
+
 NEW = {"account": False}
 WAYS = {"signin-share": (share, NEW), "signin-keys": (keys, NEW), "signin-register": (register, NEW),
         "signin-declined": (declined, NEW), "signin-again": (again, {}), "signin-trouble": (trouble, NEW),
-        "signin-certificate": (certificate, NEW | {"secure": True})}
+        "signin-thirty": (thirty, {}), "signin-certificate": (certificate, NEW | {"secure": True})}
