@@ -44,7 +44,7 @@ int note_error(Display *, XErrorEvent *error)
 
 bool toolkit_start()
 {
-    const Variable no_bridge("NO_AT_BRIDGE", "1"); // Elementary speaks to screen readers
+    const Variable no_bridge("NO_AT_BRIDGE", "1"); // Elementary speaks to screen readers, and inspect.cpp for the page
     // GDK's handlers end the process at an error; Ecore's know that windows come and go.
     const auto on_error = XSetErrorHandler(nullptr);
     const auto on_io_error = XSetIOErrorHandler(nullptr);

@@ -72,7 +72,8 @@ const WebviewTable *Loader::finish()
         begun = false; // it may be there the next time
         return nullptr;
     }
-    static const WebviewHost host = {__dlog_print, back_key_add, lacks_sandbox};
+    static const WebviewHost host = {__dlog_print, back_key_add, lacks_sandbox, ea_screen_reader_is_on,
+                                     ea_screen_reader_read};
     const auto open = reinterpret_cast<decltype(&velora_webview_table)>(dlsym(module, "velora_webview_table"));
     table = open ? open(&host) : nullptr;
     if (!table)

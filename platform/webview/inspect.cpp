@@ -1,4 +1,5 @@
 #include "inspect.h"
+#include <algorithm>
 #include <cstdlib>
 
 // Lines of kind, text, x, y, width and height, in parts of the view's width: what is in sight, and alerts wherever they
@@ -9,10 +10,11 @@ static constexpr char script[] = R"js((function () {
         : text(node) || node.getAttribute("aria-label") || (node.type === "submit" && node.value) || "";
     const add = (kind, node) => {
         const box = node.getBoundingClientRect();
-        if (name(node) && box.width > 1 && box.height > 1 && (kind === "page:alert" || (box.bottom > 0 && box.top < innerHeight)))
+        if (name(node) && box.width > 1 && box.height > 1 && (kind === "page:alert" || kind === "page:heading" || (box.bottom > 0 && box.top < innerHeight)))
             lines.push([kind, name(node), ...[box.left, box.top, box.width, box.height].map(n => n / innerWidth)].join("\t"));
     };
     const all = (kind, nodes) => document.querySelectorAll(nodes).forEach(node => add(kind, node));
+    all("page:heading", "h1");
     all("page:text", "h1, h2, p, li, dt, dd, label");
     all("page:alert", "[role=alert]");
     all("page:link", "a[href]");
@@ -23,6 +25,7 @@ static constexpr char script[] = R"js((function () {
     return lines.join("\n");
 })())js";
 static constexpr double period = 0.2; // seconds
+static constexpr int ticks_fresh = 5;
 
 static std::string in_pixels(const char *list, int width)
 {
@@ -42,6 +45,43 @@ static std::string in_pixels(const char *list, int width)
     return all;
 }
 
+// The text of the first line of a kind, or of all of them.
+static std::string text_of(const std::string &list, const std::string &kind, bool all = false)
+{
+    std::string texts;
+    for (size_t at = 0; at < list.size() && (all || texts.empty());) {
+        const size_t end = std::min(list.find('\n', at), list.size());
+        const size_t tab = list.find('\t', at);
+        if (tab < end && list.compare(at, tab - at, kind) == 0)
+            texts += (texts.empty() ? "" : " ") + list.substr(tab + 1, list.find('\t', tab + 1) - tab - 1);
+        at = end + 1;
+    }
+    return texts;
+}
+
+// The engine's own accessibility needs a toolkit's window on the screen, which this view is not. A screen reader is
+// told what a page is called, what went wrong on it, and what has the focus.
+static void read_out(View &view)
+{
+    const std::string heading = text_of(view.inspected, "page:heading");
+    const std::string alerts = text_of(view.inspected, "page:alert", true);
+    const std::string focus = text_of(view.inspected, "page:focus");
+    const std::string page = heading + " " + alerts;
+    if (page != view.heading)
+        view.fresh = ticks_fresh;
+    else if (view.fresh > 0)
+        view.fresh--;
+    if (page == view.heading && focus == view.spoken)
+        return;
+    view.heading = page;
+    view.spoken = focus;
+    // A focus that a page gives as it comes must not cut its name short.
+    const std::string words = view.fresh > 0 ? page + " " + focus : focus;
+    if (words.empty())
+        return;
+    host->read_out(view.obj, words.c_str());
+}
+
 static void listed(GObject *page, GAsyncResult *result, gpointer serial)
 {
     JSCValue *value = webkit_web_view_evaluate_javascript_finish(WEBKIT_WEB_VIEW(page), result, nullptr);
@@ -53,6 +93,8 @@ static void listed(GObject *page, GAsyncResult *result, gpointer serial)
         evas_object_geometry_get(view->image, nullptr, nullptr, &width, nullptr);
         view->inspected = in_pixels(list, width);
         evas_object_data_set(view->obj, "inspect,list", view->inspected.c_str());
+        if (host->has_reader())
+            read_out(*view);
     }
     g_free(list);
     if (value)
@@ -70,7 +112,7 @@ static Eina_Bool look(void *data)
 
 void inspect_start(View &view)
 {
-    if (std::getenv("ORVANT_INSPECT"))
+    if (std::getenv("ORVANT_INSPECT") || host->has_reader())
         view.inspector = ecore_timer_add(period, look, &view);
 }
 

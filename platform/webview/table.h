@@ -10,6 +10,9 @@ struct WebviewHost {
     void (*back_key_add)(Evas_Object *obj, void (*func)(void *data, Evas_Object *obj, void *), void *data);
     // $VELORA_WEBVIEW_SANDBOX is not "off", and no process could be put into a sandbox.
     bool (*lacks_sandbox)();
+    // ea_screen_reader_is_on, ea_screen_reader_read
+    bool (*has_reader)();
+    void (*read_out)(Evas_Object *widget, const char *text);
 };
 
 // One function for each of ewk.h; those of a view, context or manager are given no null.

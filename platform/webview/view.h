@@ -59,6 +59,8 @@ struct View {
     // inspect.cpp
     Ecore_Timer *inspector = nullptr;
     std::string inspected;
+    int fresh = 0;               // ticks for which the page still counts as new
+    std::string heading, spoken; // of the page with its alerts, and the focus: read out
 
     double text_zoom = 1;
 };

@@ -227,6 +227,21 @@ TEST_F(Signin, NothingIsLeftOfOneThatFails)
              send_in_vain();
              fake_ewk::crash();
          }},
+        {"no place for the account",
+         {},
+         at_page,
+         [this] { // the device's database is no file any more
+             std::filesystem::rename(home.path + "/accounts.db", home.path + "/kept.db");
+             std::filesystem::create_directory(home.path + "/accounts.db");
+             approve();
+         }},
+        {"no place for the credentials",
+         {},
+         at_page,
+         [this] {
+             std::filesystem::create_directories(home.path + "/cloud/Velora.credentials/full");
+             approve();
+         }},
         {"certificate",
          {},
          at_page,
@@ -273,6 +288,11 @@ TEST_F(Signin, NothingIsLeftOfOneThatFails)
                 press_back();
             EXPECT_TRUE(is_left());
         });
+        std::filesystem::remove_all(home.path + "/cloud/Velora.credentials");
+        if (std::filesystem::exists(home.path + "/kept.db")) {
+            std::filesystem::remove(home.path + "/accounts.db");
+            std::filesystem::rename(home.path + "/kept.db", home.path + "/accounts.db");
+        }
         EXPECT_EQ(accounts(), nobody);
         EXPECT_EQ(answers(), Texts{"settings canceled"});
     }

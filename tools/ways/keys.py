@@ -4,6 +4,7 @@ import re
 import subprocess
 import time
 
+from ways.hearing import Reader
 from ways.steps import SLOW, Failure, check, stays, wait_for
 
 
@@ -146,36 +147,7 @@ def escape(tour):
 def reader(tour):
     person = tour.person
     file = person.file("large.bin", size=28_000_000)
-    person.start(["/usr/libexec/at-spi-bus-launcher", "--launch-immediately", "--a11y=1", "--screen-reader=1"],
-                 stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL)
-    wait_for("the accessibility bus", lambda: person.is_on_bus("org.a11y.Bus"))
-    bus = re.search("'(.*)'", person.run("gdbus", "call", "--session", "--dest", "org.a11y.Bus", "--object-path",
-                                         "/org/a11y/bus", "--method", "org.a11y.Bus.GetAddress")).group(1)
-    controls = ("push button", "list item", "menu item", "check box", "progress bar", "page tab")
-
-    def ask(where, method, *arguments):
-        dest, path = where
-        return person.run("gdbus", "call", "--address", bus, "--dest", dest, "--object-path", path, "--method",
-                          method, *arguments)
-
-    def walk(where):
-        """Every (role, name) of the tree below an object."""
-        role = ask(where, "org.a11y.atspi.Accessible.GetRoleName").split("'")[1]
-        name = ask(where, "org.freedesktop.DBus.Properties.Get", "org.a11y.atspi.Accessible", "Name").strip()[3:-4]
-        found = [(role, name)]
-        children = ask(where, "org.a11y.atspi.Accessible.GetChildren")
-        for child in re.findall(r"\('([^']*)', (?:objectpath )?'([^']*)'\)", children):
-            found += walk(child)
-        return found
-
-    def hears(*wanted):
-        heard = walk(("org.a11y.atspi.Registry", "/org/a11y/atspi/accessible/root"))
-        for role, name in heard:
-            check(role not in controls or name, f"a {role} has no name: {heard!r}")
-            check("IDS_" not in name, f"a {role} is called {name}")
-        for one in wanted:
-            check(one in heard, f"{one!r} is not heard, but {heard!r}")
-        return f"{sum(role in controls for role, _ in heard)} controls"
+    hears = Reader(person).hears
 
     def browse():
         person.share(file)

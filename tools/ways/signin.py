@@ -9,6 +9,7 @@ import time
 import urllib.request
 
 from device import EMAIL, PASSWORD
+from ways.hearing import Reader
 from ways.steps import check, stored, wait_for
 
 NEW_EMAIL, NEW_PASSWORD = "new.person@velora.example", "ein Lied im Wind"
@@ -98,28 +99,29 @@ def share(tour):
     tour.step("Back", tour.left, {"one.txt": path})
 
 
+def tab_to(person, name):
+    for _ in range(12):
+        if person.find(name, "page:focus"):
+            return
+        person.key("Tab")
+        time.sleep(0.4)  # the page's list is made five times a second
+    check(False, f"Tab does not lead to {name!r}: {person.visible()!r}")
+
+
 def keys(tour):
     person = tour.person
 
     def type_in():
         page(person, "Sign in")
-        tab_to("E-mail address")
+        tab_to(person, "E-mail address")
         person.run("xdotool", "type", "--delay", "12", EMAIL)
-        tab_to("Password")
+        tab_to(person, "Password")
         person.run("xdotool", "type", "--delay", "12", PASSWORD)
         person.key("Return")
         page(person, "Connect this device?")
 
-    def tab_to(name):
-        for _ in range(12):
-            if person.find(name, "page:focus"):
-                return
-            person.key("Tab")
-            time.sleep(0.4)  # the page's list is made five times a second
-        check(False, f"Tab does not lead to {name!r}: {person.visible()!r}")
-
     def approve():
-        tab_to("Allow")
+        tab_to(person, "Allow")
         person.key("Return")
         person.sees("To upload files")
         one_account(person)
@@ -325,7 +327,49 @@ def thirty(tour):
     tour.step("thirty sign-ins leave nothing behind", many)
 
 
+def reader(tour):
+    """The page is read out, and the keys work while a screen reader is on."""
+    person = tour.person
+    reader_of = Reader(person)
+
+    def spoken(words):
+        """What is read out is the name of the view at that moment."""
+        return wait_for(f"{words!r} to be read out", lambda: any(words in name for _, name in reader_of.walk()))
+
+    def first():
+        add_account(person)
+        page(person, "Sign in")
+        spoken("Sign in")
+        return reader_of.hears(("push button", "Back"))
+
+    def wrong():
+        for label, words in (("E-mail address", EMAIL), ("Password", "not that one")):
+            tab_to(person, label)
+            spoken(label)
+            person.run("xdotool", "type", "--delay", "12", words)
+        person.key("Return")
+        spoken("The e-mail address or the password is wrong.")
+
+    def right():
+        tab_to(person, "Password")
+        person.run("xdotool", "type", "--delay", "12", PASSWORD)
+        person.key("Return")
+        page(person, "Connect this device?")
+        spoken("Connect this device?")
+        tab_to(person, "Allow")
+        spoken("Allow")
+        person.key("Return")
+        person.sees("To upload files")
+        one_account(person)
+        person.key("Escape")
+        return person.ends()
+
+    tour.step("the page", first)
+    tour.step("a wrong password", wrong)
+    tour.step("the right one, and allowed", right)
+
+
 NEW = {"account": False}
 WAYS = {"signin-share": (share, NEW), "signin-keys": (keys, NEW), "signin-register": (register, NEW),
-        "signin-declined": (declined, NEW), "signin-again": (again, {}), "signin-trouble": (trouble, NEW),
+        "signin-declined": (declined, NEW), "signin-again": (again, {}), "signin-trouble": (trouble, NEW), "signin-reader": (reader, NEW),
         "signin-thirty": (thirty, {}), "signin-certificate": (certificate, NEW | {"secure": True})}

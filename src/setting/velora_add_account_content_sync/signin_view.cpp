@@ -370,6 +370,7 @@ void __signin_page_create(SigninViewData *vd)
         ad->naviframe);
     vd->focus_btn = elm_button_add(ad->naviframe);
     elm_object_style_set(vd->focus_btn, "focus");
+    ea_screen_reader_name_set(vd->focus_btn, VELORA_SERVICE);
     vd->nf_item = elm_naviframe_item_push(ad->naviframe, VELORA_SERVICE, button, nullptr, vd->focus_btn, nullptr);
     elm_object_item_domain_part_text_translatable_set(vd->nf_item, "default", VELORA_DOMAIN, EINA_TRUE);
     elm_naviframe_item_pop_cb_set(vd->nf_item, __velora_signin_back_cb, vd);

@@ -1,0 +1,42 @@
+"""A screen reader that is switched on, and what it is told."""
+
+import re
+import subprocess
+
+from ways.steps import check, wait_for
+
+CONTROLS = ("push button", "list item", "menu item", "check box", "progress bar", "page tab", "entry", "password text", "link")
+
+
+class Reader:
+    def __init__(self, person):
+        self.person = person
+        person.start(["/usr/libexec/at-spi-bus-launcher", "--launch-immediately", "--a11y=1", "--screen-reader=1"],
+                     stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL)
+        wait_for("the accessibility bus", lambda: person.is_on_bus("org.a11y.Bus"))
+        self.bus = re.search("'(.*)'", person.run("gdbus", "call", "--session", "--dest", "org.a11y.Bus", "--object-path",
+                                                  "/org/a11y/bus", "--method", "org.a11y.Bus.GetAddress")).group(1)
+
+    def ask(self, where, method, *arguments):
+        dest, path = where
+        return self.person.run("gdbus", "call", "--address", self.bus, "--dest", dest, "--object-path", path, "--method",
+                               method, *arguments)
+
+    def walk(self, where=("org.a11y.atspi.Registry", "/org/a11y/atspi/accessible/root")):
+        """Every (role, name) of the tree below an object."""
+        role = self.ask(where, "org.a11y.atspi.Accessible.GetRoleName").split("'")[1]
+        name = self.ask(where, "org.freedesktop.DBus.Properties.Get", "org.a11y.atspi.Accessible", "Name").strip()[3:-4]
+        found = [(role, name)]
+        children = self.ask(where, "org.a11y.atspi.Accessible.GetChildren")
+        for child in re.findall(r"\('([^']*)', (?:objectpath )?'([^']*)'\)", children):
+            found += self.walk(child)
+        return found
+
+    def hears(self, *wanted):
+        heard = self.walk()
+        for role, name in heard:
+            check(role not in CONTROLS or name, f"a {role} has no name: {heard!r}")
+            check("IDS_" not in name, f"a {role} is called {name}")
+        for one in wanted:
+            check(one in heard, f"{one!r} is not heard, but {heard!r}")
+        return f"{sum(role in CONTROLS for role, _ in heard)} controls"
