@@ -128,6 +128,7 @@ void deleted(void *data, Evas *, Evas_Object *, void *)
     g_signal_handlers_disconnect_by_data(view.page, &view);
     g_signal_handlers_disconnect_by_data(view.offscreen, &view);
     webkit_web_view_stop_loading(view.page);
+    evas_object_image_size_set(view.image, 1, 1); // what Evas keeps of it is small then
     evas_object_del(view.image);
     view.obj = view.image = nullptr;
 }

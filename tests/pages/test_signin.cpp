@@ -152,8 +152,11 @@ TEST_F(Signin, MakesAnAccountAndGoesOn)
         run([&] {
             Wish wish = c.wish;
             wish.paths = locals(c.files);
+            fake_cloud_hold(true);
             request(wish);
+            ASSERT_TRUE(has_popup("wait"));
             EXPECT_TRUE(popup_says("Loading"));
+            fake_cloud_hold(false);
             ASSERT_TRUE(is_page_there());
             EXPECT_EQ(fake_ewk::seen().cookies_cleared, 1);
             send({});
@@ -188,12 +191,12 @@ TEST_F(Signin, OpensTheServicesPageInThePersonsLanguage)
                 ASSERT_TRUE(is_page_there());
                 const std::string token = signin::s_vd->request_token;
                 const std::string page = std::string(web) + "/1/oauth/authorize?oauth_token=" + token;
-                char *cont =
-                    g_uri_escape_string((page + "&oauth_callback=" + escaped + "&cl=" + locale).c_str(), "/", TRUE);
+                const std::string cont = taken(
+                    g_uri_escape_string((page + "&oauth_callback=" + escaped + "&cl=" + locale).c_str(), "/", TRUE));
                 EXPECT_EQ(fake_ewk::seen().address, is_signin
                                                         ? page + "&oauth_callback=" + callback + "&locale=" + locale
                                                         : std::string(web) + "/m/register?cl=" + locale +
-                                                              "&signup_data=velora-device&cont=" + taken(cont));
+                                                              "&signup_data=velora-device&cont=" + cont);
             });
         }
     }
@@ -347,7 +350,7 @@ TEST_F(Signin, LeavesUploadsAndTheirAccountAlone)
 
 TEST_F(Signin, OtherRequestsInTheMiddleLoseNothing)
 {
-    const auto before_page = [] { return has_popup("wait"); };
+    const auto before_page = [] { return true; };
     const auto at_page = [] { return is_page_there(); };
     for (const auto &reach : {std::function<bool()>(before_page), std::function<bool()>(at_page)}) {
         forget_account();
@@ -375,13 +378,13 @@ TEST_F(Signin, OtherRequestsInTheMiddleLoseNothing)
 TEST_F(Signin, GivenUpAndAskedForAtOnceBeginsAnew)
 {
     run([&] {
+        fake_cloud_hold(true);
         share({"a.txt"});
-        fake_cloud_set_delay(200);
         ASSERT_TRUE(has_popup("wait"));
         press_back();
         share({"b.txt"});
         EXPECT_TRUE(evas_object_visible_get(app->win_main));
-        fake_cloud_set_delay(0);
+        fake_cloud_hold(false);
         ASSERT_TRUE(is_page_there());
         approve();
         ASSERT_TRUE(wait_for([] { return !signin::s_vd && s_vd; }));

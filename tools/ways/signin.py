@@ -313,7 +313,7 @@ def thirty(tour):
 
     def many():
         sizes = []
-        for _ in range(33):
+        for _ in range(9):
             once()
             time.sleep(1)
             sizes.append(size())
