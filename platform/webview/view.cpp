@@ -110,6 +110,9 @@ void page_make(View &view)
 
 void let_go(View *view)
 {
+    // After a touch the toolkit keeps the window of a page that is gone: it is to keep a small one.
+    if (GdkWindow *window = gtk_widget_get_window(view->offscreen))
+        gdk_window_resize(window, 1, 1);
     gtk_widget_destroy(view->offscreen);
     delete view;
 }
@@ -128,7 +131,6 @@ void deleted(void *data, Evas *, Evas_Object *, void *)
     g_signal_handlers_disconnect_by_data(view.page, &view);
     g_signal_handlers_disconnect_by_data(view.offscreen, &view);
     webkit_web_view_stop_loading(view.page);
-    evas_object_image_size_set(view.image, 1, 1); // what Evas keeps of it is small then
     evas_object_del(view.image);
     view.obj = view.image = nullptr;
 }
