@@ -185,7 +185,7 @@ static std::string __authorization_address(const SigninViewData *vd)
 
 void __signin_page_load(SigninViewData *vd)
 {
-    if (!vd->web_view || !vd->request_token || vd->is_over)
+    if (!vd->web_view || !vd->has_token || vd->is_over)
         return;
     Ewk_Context *context = ewk_view_context_get(vd->web_view);
     Ewk_Cookie_Manager *cookies = ewk_context_cookie_manager_get(context);
@@ -350,6 +350,7 @@ static void __signin_view_pipe_cb(void *, void *buffer, unsigned int)
         else
             __signin_fail(vd);
     } else if (is("get_access_token_success")) {
+        vd->has_token = true;
         __signin_page_load(vd);
     } else {
         VELORA_LOGE("pipe message error");
@@ -373,6 +374,7 @@ static bool __service_find(SigninViewData *vd)
 
 void __signin_begin(SigninViewData *vd)
 {
+    vd->has_token = false;
     __signin_wait_show(vd, "IDS_CLOUD_OPT_LOADING_ING_ABB", __create_back_popup_cancel_cb);
     if (const int error = cloud_content_sync_auth_get_request_token_info(vd->client.get(), __velora_token_info_cb, vd);
         error != 0) {

@@ -20,6 +20,7 @@ struct SigninViewData {
     int launch_mode = LAUNCH_MODE_NONE;  // that the page was opened in
     void (*done)(AppData *ad) = nullptr; // of a page that lies over another one
     std::string web, callback, ca_file;  // the service's addresses
+    bool has_token = false;              // its message has been read: only then is the token the main loop's
     std::atomic<int> error = 0;          // why there is no request token; the client's thread
     bool is_approved = false;            // the person has allowed the device in
     bool is_activated = false;           // it is the device's account, but for its record
