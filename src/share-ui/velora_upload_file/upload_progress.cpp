@@ -31,9 +31,12 @@ static void __show_run(UploadViewData *vd)
     const RunReport &report = run.report;
     // From the files themselves: the worker counts one only after its state has changed.
     gint64 sent = 0;
+    int ended = 0;
     for (const RunFile &file : run.files) {
         const int state = file.item->state;
-        if (state == UPLOAD_STATE_DONE || state == UPLOAD_STATE_FAILED)
+        const bool is_ended = state == UPLOAD_STATE_DONE || state == UPLOAD_STATE_FAILED;
+        ended += is_ended;
+        if (is_ended)
             sent += file.size;
         else if (state == UPLOAD_STATE_UPLOADING)
             sent += file.size / 100 * file.item->progress;
@@ -41,10 +44,9 @@ static void __show_run(UploadViewData *vd)
     const gint64 all = std::max<gint64>(run.bytes - report.bytes_canceled, 0);
     sent = std::clamp<gint64>(sent, 0, all);
     const int remaining = std::max(run.remaining(), 0);
-    const int ended = std::min(report.success + report.fail, remaining);
     char words[128];
-    std::snprintf(words, sizeof words, __text("%d of %d · %s of %s"), ended, remaining, __short_size(sent).c_str(),
-                  __short_size(all).c_str());
+    std::snprintf(words, sizeof words, __text("%d of %d · %s of %s"), std::min(ended, remaining), remaining,
+                  __short_size(sent).c_str(), __short_size(all).c_str());
     const double done = all > 0 ? static_cast<double>(sent) / static_cast<double>(all) : 0;
     __info_set(vd, words, done);
 }
