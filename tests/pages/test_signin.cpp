@@ -186,8 +186,10 @@ TEST_F(Signin, OpensTheServicesPageInThePersonsLanguage)
         for (const bool is_signin : {true, false}) {
             fake_ewk::clear();
             run([&] {
+                fake_cloud_hold(true);
                 add();
                 signin::s_vd->is_signin = is_signin;
+                fake_cloud_hold(false);
                 ASSERT_TRUE(is_page_there());
                 const std::string token = signin::s_vd->request_token;
                 const std::string page = std::string(web) + "/1/oauth/authorize?oauth_token=" + token;
