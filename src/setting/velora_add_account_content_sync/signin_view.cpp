@@ -34,18 +34,21 @@ void __signin_wait_show(SigninViewData *vd, const char *text_id, Evas_Smart_Cb b
 
 static void _btn_focused(void *data, Evas_Object *, void *)
 {
-    if (!data)
+    auto *web_view = static_cast<Evas_Object *>(data);
+    if (!web_view)
         VELORA_LOGE("eo is NULL");
-    else
-        elm_object_focus_set(static_cast<Evas_Object *>(data), EINA_TRUE);
+    else if (!elm_object_focus_get(web_view))
+        elm_object_focus_set(web_view, EINA_TRUE);
 }
 
+// Not by Elementary: it would give the focus back to the button, and so on without end.
 static void _btn_unfocused(void *data, Evas_Object *, void *)
 {
-    if (!data)
+    auto *web_view = static_cast<Evas_Object *>(data);
+    if (!web_view)
         VELORA_LOGE("eo is NULL");
-    else
-        elm_object_focus_set(static_cast<Evas_Object *>(data), EINA_FALSE);
+    else if (!elm_object_focus_get(web_view))
+        evas_object_focus_set(web_view, EINA_FALSE);
 }
 
 // Loading
