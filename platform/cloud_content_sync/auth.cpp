@@ -58,7 +58,8 @@ void Auth::step()
     }
     if (current && current->id != now)
         revoke_access(std::exchange(current, nullptr), [](int) {});
-    if (!next || !client.is_wanted(next->id))
+    // A deactivation is done also when nobody waits for it any more: whoever asked for it may be gone.
+    if (!next || (next->kind != AuthRequest::DEACTIVATE && !client.is_wanted(next->id)))
         return;
     running = next;
     switch (running->kind) {

@@ -117,14 +117,6 @@ class Signin : public UploadPage {
         std::free(email);
         return all + " " + std::to_string(fake_cloud_live_tokens());
     }
-    static Texts answers()
-    {
-        Texts all;
-        for (const fake_app::Reply &reply : fake_app::replies())
-            all.push_back(reply.sender + (reply.result == APP_CONTROL_RESULT_SUCCEEDED ? " succeeded" : " canceled"));
-        std::ranges::sort(all);
-        return all;
-    }
 };
 
 const std::string nobody = "- - 0", somebody = "someone@example.org someone@example.org 1";

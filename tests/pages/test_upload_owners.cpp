@@ -24,15 +24,6 @@ class Owners : public UploadPage {
     {
         vconf_set_str("memory/connection/type", state);
     }
-    // Every answer as "SENDER RESULT", sorted.
-    static Texts answers()
-    {
-        Texts all;
-        for (const fake_app::Reply &reply : fake_app::replies())
-            all.push_back(reply.sender + (reply.result == APP_CONTROL_RESULT_SUCCEEDED ? " succeeded" : " canceled"));
-        std::ranges::sort(all);
-        return all;
-    }
     static bool is_browsing()
     {
         return s_vd && s_vd->phase == PHASE_BROWSING && !s_vd->ad->popup && s_vd->done_btn &&

@@ -194,6 +194,15 @@ class UploadPage : public Application {
             all.push_back(one.text);
         return all;
     }
+    // Every answer as "SENDER RESULT", sorted.
+    static std::vector<std::string> answers()
+    {
+        std::vector<std::string> all;
+        for (const fake_app::Reply &reply : fake_app::replies())
+            all.push_back(reply.sender + (reply.result == APP_CONTROL_RESULT_SUCCEEDED ? " succeeded" : " canceled"));
+        std::ranges::sort(all);
+        return all;
+    }
     static bool is_answered() // the one who shared
     {
         return fake_app::replies().size() == 1 && fake_app::replies()[0].result == APP_CONTROL_RESULT_SUCCEEDED;

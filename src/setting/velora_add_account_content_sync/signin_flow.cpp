@@ -296,16 +296,16 @@ static void __signed_in(SigninViewData *vd)
     _velora_popup_take_away(ad, {vd, ""});
     __signin_view_destroy(vd);
     __refresh_type_set(client.get());
-    if (done) {
-        _velora_pages_remove(vd);
-        __signin_item_delete(ad, item);
+    __signin_item_delete(ad, item);
+    if (done)
         done(ad);
+    if (done && !ad->upload_list) { // nothing came on top of what the page was opened for
+        _velora_pages_remove(vd);
         return;
     }
     ad->launch_mode = launch_mode;
     if (launch_mode == LAUNCH_MODE_SETUP_WIZARD)
         __meta_refresh(ad);
-    __signin_item_delete(ad, item);
     _velora_pages_go_on(ad, vd, __next_page(launch_mode));
 }
 

@@ -256,8 +256,6 @@ void __signin_view_destroy(SigninViewData *vd)
     for (Ecore_Timer *timer : {vd->timeout_timer, vd->build_timer})
         if (timer)
             ecore_timer_del(timer);
-    if (vd->client)
-        cloud_content_sync_auth_cancel(vd->client.get()); // its callbacks need what goes now
     if (vd->pipe)
         _velora_common_pipe_del(vd->pipe);
     std::free(vd->request_token);
@@ -278,7 +276,7 @@ static void __leave(SigninViewData *vd)
         _velora_common_signout_end(ad);
     else if (vd->client && vd->is_activated) // without a record: the next request settles it
         VELORA_LOGI("an account is left without its record");
-    else if (vd->client)
+    else if (vd->client) // which ends what runs: its callbacks need what goes now
         cloud_content_sync_auth_abandon(vd->client.get(), __abandoned_cb, nullptr);
     _velora_popup_take_away(ad, {vd, ""});
     elm_object_tree_focus_allow_set(ad->naviframe, EINA_TRUE);

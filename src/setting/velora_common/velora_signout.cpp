@@ -107,8 +107,10 @@ static int __record_remove()
     char *email = nullptr;
     const bool is_account_left = cloud_content_sync_account_get_email(VELORA_SERVICE, &email) == 0;
     std::free(email);
-    if (is_account_left)
+    if (is_account_left) { // also one that was activated in the very moment in which it was given up
+        _velora_common_account_settle();
         return 0;
+    }
     const int result = _velora_common_account_remove_info_from_db();
     if (result == ACCOUNT_ERROR_NONE || result == ACCOUNT_ERROR_RECORD_NOT_FOUND)
         return 0;

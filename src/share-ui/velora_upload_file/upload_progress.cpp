@@ -28,24 +28,28 @@ static std::string __waiting_words()
 static void __show_run(UploadViewData *vd)
 {
     const UploadRun &run = *vd->run;
-    const RunReport &report = run.report;
-    // From the files themselves: the worker counts one only after its state has changed.
-    gint64 sent = 0;
-    int ended = 0;
-    for (const RunFile &file : run.files) {
+    RunReport &report = run.report;
+    // From the files themselves: the worker counts one only after its state has changed. They end in their order.
+    for (; report.seen < run.total(); report.seen++) {
+        const RunFile &file = run.files[static_cast<size_t>(report.seen)];
         const int state = file.item->state;
-        const bool is_ended = state == UPLOAD_STATE_DONE || state == UPLOAD_STATE_FAILED;
-        ended += is_ended;
-        if (is_ended)
-            sent += file.size;
-        else if (state == UPLOAD_STATE_UPLOADING)
-            sent += file.size / 100 * file.item->progress;
+        if (state == UPLOAD_STATE_WAITING || state == UPLOAD_STATE_UPLOADING)
+            break;
+        if (state != UPLOAD_STATE_CANCELED) {
+            report.seen_ended++;
+            report.seen_bytes += file.size;
+        }
     }
+    gint64 sent = report.seen_bytes;
+    if (report.seen < run.total())
+        if (const RunFile &file = run.files[static_cast<size_t>(report.seen)];
+            file.item->state == UPLOAD_STATE_UPLOADING)
+            sent += file.size / 100 * file.item->progress;
     const gint64 all = std::max<gint64>(run.bytes - report.bytes_canceled, 0);
     sent = std::clamp<gint64>(sent, 0, all);
     const int remaining = std::max(run.remaining(), 0);
     char words[128];
-    std::snprintf(words, sizeof words, __text("%d of %d · %s of %s"), std::min(ended, remaining), remaining,
+    std::snprintf(words, sizeof words, __text("%d of %d · %s of %s"), std::min(report.seen_ended, remaining), remaining,
                   __short_size(sent).c_str(), __short_size(all).c_str());
     const double done = all > 0 ? static_cast<double>(sent) / static_cast<double>(all) : 0;
     __info_set(vd, words, done);

@@ -27,6 +27,8 @@ struct RunReport {
     std::atomic<int> fail = 0;                     // worker
     std::atomic<int> current = 0;                  // index of the file the worker is on
     std::atomic<gint64> bytes_canceled = 0;        // main loop
+    int seen = 0, seen_ended = 0;                  // files that the line above the list has added up; main loop
+    gint64 seen_bytes = 0;                         // of the latter; main loop
     std::unique_ptr<std::atomic<bool>[]> selected; // one flag a file; main loop, and the worker when a file has ended
     std::atomic<int> callbacks = 0;                // of transfers that are running; client thread
     std::atomic<bool> is_stopping = false;         // the worker has to leave; main loop
