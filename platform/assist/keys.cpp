@@ -172,6 +172,15 @@ void focused_key_down(void *data, Evas *, Evas_Object *, void *event_info)
     stop_asking(canvas);
 }
 
+// Such an object hears no keys: a page on its way in, for one.
+bool is_frozen(const Evas_Object *obj)
+{
+    for (; obj; obj = evas_object_smart_parent_get(obj))
+        if (evas_object_freeze_events_get(obj))
+            return true;
+    return false;
+}
+
 // Grabs hear a key before the object in focus does; what that one makes of it is seen by a callback behind all of its
 // own. When the callback does not run, the object has gone over the key: that is using it up.
 void key_down(void *data, Evas *evas, Evas_Object *, void *event_info)
@@ -180,6 +189,8 @@ void key_down(void *data, Evas *evas, Evas_Object *, void *event_info)
     stop_asking(canvas);
     canvas->pressed = static_cast<Evas_Event_Key_Down *>(event_info)->key;
     canvas->asked = evas_focus_get(evas);
+    if (canvas->asked && is_frozen(canvas->asked))
+        canvas->asked = nullptr;
     canvas->used_up = canvas->asked != nullptr;
     if (!canvas->asked)
         return;
