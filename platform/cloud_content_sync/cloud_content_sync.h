@@ -75,6 +75,26 @@ int cloud_content_sync_destroy(cloud_content_sync_h handle);
 // signed in it reads as true, and setting it answers NO_ACCOUNT.
 int cloud_content_sync_setting_get_type_activation(cloud_content_sync_h handle, int content_type, bool *value);
 int cloud_content_sync_setting_set_type_activation(cloud_content_sync_h handle, int content_type, bool value);
+// Whether what the camera makes is to be uploaded by itself; a setting of the account as the above is, at first false,
+// and with nobody signed in. Whoever holds a handle may act on it; this library does not.
+int cloud_content_sync_setting_get_camera_upload(cloud_content_sync_h handle, bool *value);
+int cloud_content_sync_setting_set_camera_upload(cloud_content_sync_h handle, bool value);
+// The same for: whether a content type is to be transferred over Wi-Fi alone.
+int cloud_content_sync_setting_get_wifi_only_type(cloud_content_sync_h handle, int content_type, bool *value);
+int cloud_content_sync_setting_set_wifi_only_type(cloud_content_sync_h handle, int content_type, bool value);
+
+// Asks the service how much of the account's storage there is and how much of it is used, in bytes. Returns at once;
+// INVALID_PARAMETER for a null handle or callback, and there is no callback then. Otherwise there is exactly one, on
+// the client's thread, unless the cancel below or destroy comes first: status DONE and error 0, with total 0 where the
+// service names no bound (RFC 4331); or FAILED, with 0 and 0, and an error: NO_ACCOUNT, NETWORK, UNAUTHORIZED, SERVER.
+// Several may be asked for; each is answered.
+typedef void (*cloud_content_sync_storage_cb)(int status, unsigned long long total, unsigned long long used, int error,
+                                              void *user_data);
+int cloud_content_sync_get_server_storage_info(cloud_content_sync_h handle, cloud_content_sync_storage_cb cb,
+                                               void *user_data);
+// Ends the questions with this user_data, which then have no callback; one that is running is waited for, unless this
+// is called from within it. NOT_FOUND when there is none.
+int cloud_content_sync_cancel_server_storage_info(cloud_content_sync_h handle, void *user_data);
 
 // Fetches the account's whole tree and puts it in the place of what the database held; a refresh that fails changes
 // nothing. content_types: a sum of content types, not 0; folders and files of every type are fetched whatever it is. cb

@@ -7,7 +7,6 @@
 #include "velora_common/velora_account.h"
 #include "velora_common/velora_client.h"
 #include "velora_common/velora_current_popup.h"
-#include "velora_common/velora_indicator.h"
 #include "velora_common/velora_log.h"
 #include "velora_common/velora_network.h"
 #include "velora_common/velora_pages.h"
@@ -80,19 +79,6 @@ static void __velora_activate_cb(int, int error, void *)
     __send(error == 0 ? "activate_success" : "activate_fail");
 }
 
-static void __velora_refresh_cb(int status, int, void *data)
-{
-    auto *ad = static_cast<AppData *>(data);
-    if (!ad) {
-        VELORA_LOGE("user_data is NULL");
-        return;
-    }
-    if (status < 3 || status > 5)
-        return;
-    ad->is_meta_refreshed = true;
-    _velora_common_pipe_send_msg(ad->pipe, "refresh_meta_done");
-}
-
 SignoutScope __signin_scope(const SigninViewData *vd)
 {
     return vd->is_activated ? SIGNOUT_ACCOUNT : SIGNOUT_SIGN_IN;
@@ -145,7 +131,7 @@ static void __create_back_popup_cancel_cb(void *, Evas_Object *, void *)
     if (!_velora_popup_is_shown(ad, {vd, ""}))
         return;
     vd->is_over = true;
-    if (ad->launch_mode == LAUNCH_MODE_SETUP_WIZARD) {
+    if (vd->back) {
         _velora_common_signout_without_remove_popup(ad, vd, __signin_scope(vd));
         return;
     }
@@ -250,14 +236,6 @@ static void __refresh_type_set(CloudSyncHandle handle)
         VELORA_LOGE("cloud_content_sync_setting_set_refresh_type failed");
 }
 
-static void __meta_refresh(AppData *ad)
-{
-    constexpr int all_types = CLOUD_CONTENT_TYPE_IMAGE | CLOUD_CONTENT_TYPE_VIDEO | CLOUD_CONTENT_TYPE_CAMERA;
-    ad->is_meta_refreshed = false;
-    if (cloud_content_sync_refresh_meta(ad->sync_handle, all_types, __velora_refresh_cb, ad) != 0)
-        VELORA_LOGE("cloud_content_sync_refresh_meta failed");
-}
-
 static void __nothing_more(AppData *ad)
 {
     if (_velora_pages_are_empty())
@@ -305,7 +283,7 @@ static void __signed_in(SigninViewData *vd)
     }
     ad->launch_mode = launch_mode;
     if (launch_mode == LAUNCH_MODE_SETUP_WIZARD)
-        __meta_refresh(ad);
+        _velora_common_meta_refresh(ad);
     _velora_pages_go_on(ad, vd, __next_page(launch_mode));
 }
 
@@ -400,13 +378,14 @@ static bool __join(AppData *ad)
     return true;
 }
 
-static void __create(AppData *ad, bool is_signin, void (*done)(AppData *ad))
+static void __create(AppData *ad, bool is_signin, void (*done)(AppData *ad), void (*back)(AppData *ad))
 {
     auto *vd = s_vd = new SigninViewData;
     vd->is_signin = is_signin;
     vd->ad = ad;
     vd->launch_mode = ad->launch_mode;
     vd->done = done;
+    vd->back = back;
     if (!done)
         vd->files = g_steal_pointer(&ad->upload_list);
     (done ? _velora_pages_add_over
@@ -437,17 +416,17 @@ void _velora_signin_create(AppData *ad, int is_signin)
         return;
     }
     if (!__join(ad))
-        __create(ad, is_signin != 0, nullptr);
+        __create(ad, is_signin != 0, nullptr, nullptr);
 }
 
-void _velora_signin_create_over(AppData *ad, void (*done)(AppData *ad))
+void _velora_signin_create_over(AppData *ad, int is_signin, void (*done)(AppData *ad), void (*back)(AppData *ad))
 {
     if (s_vd && s_vd->is_over)
         _velora_page_replace(ad, s_vd);
     if (s_vd)
         elm_naviframe_item_promote(s_vd->nf_item);
     else if (_velora_common_check_network_without_popup(ad))
-        __create(ad, true, done);
+        __create(ad, is_signin != 0, done, back);
     else
         _velora_popup_show(ad, {"sign-in", "network"},
                            _velora_common_create_one_text_popup_with_timer(ad->win_main, ad));

@@ -19,6 +19,7 @@ struct SigninViewData {
     GList *files = nullptr;              // of UploadItem: shared, and waiting for the account
     int launch_mode = LAUNCH_MODE_NONE;  // that the page was opened in
     void (*done)(AppData *ad) = nullptr; // of a page that lies over another one
+    void (*back)(AppData *ad) = nullptr; // the same, when there is no account in the end
     std::string web, callback, ca_file;  // the service's addresses
     bool has_token = false;              // its message has been read: only then is the token the main loop's
     std::atomic<int> error = 0;          // why there is no request token; the client's thread

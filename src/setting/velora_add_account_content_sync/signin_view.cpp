@@ -1,7 +1,6 @@
 // The page: a web view in a button that carries the focus, what the view tells, and the ways back.
 #include "velora_add_account_content_sync/signin_record.h"
 #include "velora_common/velora_current_popup.h"
-#include "velora_common/velora_indicator.h"
 #include "velora_common/velora_log.h"
 #include "velora_common/velora_pages.h"
 #include "velora_common/velora_pipe.h"
@@ -296,8 +295,11 @@ void __signin_page_end(void *page)
     Elm_Object_Item *item = vd->nf_item;
     elm_naviframe_item_pop_cb_set(item, nullptr, nullptr);
     AppData *ad = vd->ad;
+    auto *const back = vd->back;
     __leave(vd);
     __signin_item_delete(ad, item);
+    if (back)
+        back(ad);
 }
 
 void __signin_page_abandon(void *page)
@@ -317,14 +319,8 @@ static Eina_Bool __velora_signin_back_cb(void *, Elm_Object_Item *)
         VELORA_LOGE("view is destroyed");
         return EINA_FALSE;
     }
-    AppData *ad = vd->ad;
-    if (ad->launch_mode == LAUNCH_MODE_SETUP_WIZARD) {
-        __leave(vd);
-        _velora_common_set_indicator_mode(ad->conformant, INDICATOR_MODE_TRANSPARENT);
-        return EINA_TRUE;
-    }
     vd->is_over = true;
-    _velora_page_leave(ad, vd);
+    _velora_page_leave(vd->ad, vd);
     return EINA_FALSE;
 }
 

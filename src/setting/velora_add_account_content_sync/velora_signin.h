@@ -8,6 +8,7 @@
 // that list when there is an account. Without a network only the popup that says so.
 void _velora_signin_create(AppData *ad, int is_signin);
 
-// The same over a page whose account was signed out: `done` is called with that page in front again, once there is an
-// account. Back returns to that page.
-void _velora_signin_create_over(AppData *ad, void (*done)(AppData *ad));
+// The same over a page that needs an account. `done` is called with that page in front again, once there is one. Back,
+// and a sign-in that comes to nothing, return to that page; `back`, which may be null, is called then.
+void _velora_signin_create_over(AppData *ad, int is_signin, void (*done)(AppData *ad),
+                                void (*back)(AppData *ad) = nullptr);

@@ -11,3 +11,7 @@ ClientHold _velora_common_client_get(AppData *ad);
 
 // Lets go of AppData's hold.
 void _velora_common_client_release(AppData *ad);
+
+// Starts a refresh of the account's tree, of all types; its end is "refresh_meta_done" on AppData's pipe and
+// `is_meta_refreshed`. A failure to start is logged, and is the end.
+void _velora_common_meta_refresh(AppData *ad);

@@ -93,9 +93,7 @@ void _velora_common_signout_end(AppData *ad)
 
 static void __leave(AppData *ad, void *page)
 {
-    if (ad->launch_mode == LAUNCH_MODE_SETUP_WIZARD)
-        elm_naviframe_item_pop(ad->naviframe);
-    else if (page)
+    if (page)
         _velora_page_leave(ad, page);
     else
         _velora_app_exit(ad);

@@ -6,8 +6,8 @@
 // With SIGNOUT_SIGN_IN only a sign-in that has come to nothing is ended: an account that was there before stays, with
 // its record.
 //
-// `page` is left at the end, as _velora_page_leave() does; null stands for the application. In the setup wizard the
-// item on top of the naviframe is popped instead. -1 without an application record (logged).
+// `page` is left at the end, as _velora_page_leave() does; null stands for the application. -1 without an application
+// record (logged).
 #include "velora_common/velora_app_data.h"
 
 enum SignoutScope { SIGNOUT_ACCOUNT, SIGNOUT_SIGN_IN };

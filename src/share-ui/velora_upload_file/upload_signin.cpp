@@ -18,7 +18,7 @@ void __signin_open_cb(void *data, Evas_Object *, void *)
     if (vd != s_vd)
         return;
     _velora_popup_take_away(vd->ad, {vd, s_topic});
-    _velora_signin_create_over(vd->ad, __signed_in_again);
+    _velora_signin_create_over(vd->ad, 1, __signed_in_again);
 }
 
 static void __cancel_cb(void *data, Evas_Object *, void *)
