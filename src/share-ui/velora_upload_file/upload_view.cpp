@@ -9,6 +9,7 @@
 #include "velora_common/velora_pipe.h"
 #include "velora_common/velora_popup.h"
 #include "velora_upload_file/upload_browser.h"
+#include "velora_upload_file/upload_cancel.h"
 #include "velora_upload_file/upload_icon.h"
 #include "velora_upload_file/upload_list.h"
 #include "velora_upload_file/upload_menu.h"
@@ -195,4 +196,26 @@ void _velora_upload_view_meta_done()
 {
     if (s_vd)
         __share_meta_done(s_vd);
+}
+
+int _velora_upload_view_unfinished()
+{
+    const UploadViewData *vd = s_vd;
+    return vd ? __waiting_count() + (vd->run ? vd->run->queued() : 0) : 0;
+}
+
+void _velora_upload_view_stop_all(AppData *ad)
+{
+    UploadViewData *vd = s_vd;
+    if (!vd || (!vd->run && __waiting_count() == 0))
+        return;
+    if (vd->run) {
+        std::vector<UploadItem *> items;
+        for (const RunFile &file : vd->run->files)
+            if (const int state = file.item->state; state == UPLOAD_STATE_WAITING || state == UPLOAD_STATE_UPLOADING)
+                items.push_back(file.item.get());
+        __uploads_cancel(vd, items);
+        __worker_join(vd->run.get()); // which says what is up
+    }
+    _velora_page_replace(ad, vd);
 }
