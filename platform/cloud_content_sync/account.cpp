@@ -72,7 +72,7 @@ bool Account::replace_credentials(const Credentials *next, std::optional<Credent
     const std::string whose = complete_for();
     const bool is_same = next && identity() == who && (whose.empty() || whose == who);
     // Once before, so that a crash in the middle leaves no rows to somebody else.
-    if (!is_same && !change([&] { return clear(); }))
+    if (!is_same && !change([&] { return clear() && (next || forget_settings()); }))
         return false;
     return change([&] {
         former = credentials_known(service.name);
@@ -218,6 +218,13 @@ std::string Account::complete_for()
 bool Account::clear()
 {
     return writer.run("DELETE FROM folder; DELETE FROM content; DELETE FROM setting WHERE key = 'complete_for'");
+}
+
+// Within change().
+bool Account::forget_settings()
+{
+    Stmt stmt(writer, "DELETE FROM account_setting WHERE account = ?");
+    return stmt.bind(1, identity()).done();
 }
 
 long long Account::setting(const std::string &key, long long fallback)

@@ -35,7 +35,7 @@ class Account {
     // account_identity() of who is signed in; empty when nobody is.
     std::string identity() const;
     // Stores the credentials; null: nobody is signed in any more. What is kept of another account goes, but for its
-    // settings. False when they cannot be stored, or what is kept cannot be removed for null: whoever was signed in is
+    // settings; with null those of the account that was signed in go as well. False when they cannot be stored, or what is kept cannot be removed for null: whoever was signed in is
     // so still. *former, which may be null, is who that was; its secret is empty when it is not to be had.
     bool sign_in(const Credentials *credentials, std::optional<Credentials> *former = nullptr);
     // Does `work` while nobody can sign in or out, in a transaction of the database that its result ends. False, and
@@ -69,6 +69,7 @@ class Account {
     bool change(const std::function<bool()> &work);
     bool replace_credentials(const Credentials *next, std::optional<Credentials> &former);
     bool clear();
+    bool forget_settings();
 
     std::mutex reading, writing;
     Db reader, writer;

@@ -3,6 +3,7 @@
 #include "cloud_content_sync/content.h"
 #include "cloud_content_sync/names.h"
 #include "cloud_content_sync/refresh.h"
+#include "cloud_content_sync/storage.h"
 #include "cloud_content_sync/thumbnails.h"
 #include "cloud_content_sync/upload.h"
 #include <algorithm>
@@ -14,8 +15,8 @@ static constexpr auto TICK = std::chrono::milliseconds(1000); // how often stall
 
 Client::Client(Service description, std::shared_ptr<Account> database)
     : auth(std::make_unique<Auth>(*this)), contents(std::make_unique<Contents>(*this)),
-      thumbnails(std::make_unique<Thumbnails>(*this)), service(std::move(description)), account(std::move(database)),
-      http(service)
+      storage(std::make_unique<Storage>(*this)), thumbnails(std::make_unique<Thumbnails>(*this)),
+      service(std::move(description)), account(std::move(database)), http(service)
 {
 }
 
@@ -196,6 +197,7 @@ void Client::end_requests(int error)
     for (const RefreshRequest &request : refreshes)
         report_refreshed(request, error);
     contents->end(error);
+    storage->end(error);
 }
 
 // Uploads run one after the other, so that two of one name never race for it.
@@ -245,6 +247,7 @@ void Client::loop()
     pthread_sigmask(SIG_BLOCK, &all, nullptr);
     while (!is_stopping()) {
         auth->step();
+        storage->step();
         step_refresh();
         step_upload();
         contents->step();
@@ -255,6 +258,7 @@ void Client::loop()
     running_upload.reset();
     running_refresh.reset();
     contents->end(0);
+    storage->end(0);
     thumbnails->end();
     auth->end();
 }

@@ -20,6 +20,7 @@ namespace cloud {
 class Auth;
 class Contents;
 class Refresh;
+class Storage;
 class Thumbnails;
 class Upload;
 
@@ -63,6 +64,7 @@ class Client : public std::enable_shared_from_this<Client> {
     }
     const std::unique_ptr<Auth> auth;
     const std::unique_ptr<Contents> contents;
+    const std::unique_ptr<Storage> storage;
     const std::unique_ptr<Thumbnails> thumbnails;
 
     const Service service;

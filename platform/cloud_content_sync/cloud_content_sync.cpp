@@ -3,6 +3,7 @@
 #include "cloud_content_sync/content.h"
 #include "cloud_content_sync/handle.h"
 #include "cloud_content_sync/names.h"
+#include "cloud_content_sync/storage.h"
 #include "cloud_content_sync/thumbnails.h"
 #include <cstring>
 
@@ -56,16 +57,18 @@ static bool is_one_type(int type)
     return type == CLOUD_CONTENT_TYPE_IMAGE || type == CLOUD_CONTENT_TYPE_VIDEO || type == CLOUD_CONTENT_TYPE_CAMERA;
 }
 
-static std::string activation_key(int content_type)
+static std::string key_of(const char *setting, int content_type)
 {
-    return "activation." + std::to_string(content_type);
+    return setting + std::to_string(content_type);
 }
+
+static constexpr char ACTIVATION[] = "activation.", WIFI_ONLY[] = "wifi_only.", CAMERA_UPLOAD[] = "camera_upload";
 
 int cloud_content_sync_setting_get_type_activation(cloud_content_sync_h handle, int content_type, bool *value)
 {
     if (!handle || !value || !is_one_type(content_type))
         return INVALID;
-    *value = handle->client->account->setting(activation_key(content_type), 1) != 0;
+    *value = handle->client->account->setting(key_of(ACTIVATION, content_type), 1) != 0;
     return DONE;
 }
 
@@ -73,7 +76,51 @@ int cloud_content_sync_setting_set_type_activation(cloud_content_sync_h handle, 
 {
     if (!handle || !is_one_type(content_type))
         return INVALID;
-    return handle->client->account->set_setting(activation_key(content_type), value);
+    return handle->client->account->set_setting(key_of(ACTIVATION, content_type), value);
+}
+
+int cloud_content_sync_setting_get_camera_upload(cloud_content_sync_h handle, bool *value)
+{
+    if (!handle || !value)
+        return INVALID;
+    *value = handle->client->account->setting(CAMERA_UPLOAD, 0) != 0;
+    return DONE;
+}
+
+int cloud_content_sync_setting_set_camera_upload(cloud_content_sync_h handle, bool value)
+{
+    return handle ? handle->client->account->set_setting(CAMERA_UPLOAD, value) : INVALID;
+}
+
+int cloud_content_sync_setting_get_wifi_only_type(cloud_content_sync_h handle, int content_type, bool *value)
+{
+    if (!handle || !value || !is_one_type(content_type))
+        return INVALID;
+    *value = handle->client->account->setting(key_of(WIFI_ONLY, content_type), 0) != 0;
+    return DONE;
+}
+
+int cloud_content_sync_setting_set_wifi_only_type(cloud_content_sync_h handle, int content_type, bool value)
+{
+    if (!handle || !is_one_type(content_type))
+        return INVALID;
+    return handle->client->account->set_setting(key_of(WIFI_ONLY, content_type), value);
+}
+
+int cloud_content_sync_get_server_storage_info(cloud_content_sync_h handle, cloud_content_sync_storage_cb cb,
+                                               void *user_data)
+{
+    if (!handle || !cb)
+        return INVALID;
+    handle->client->storage->ask(cb, user_data);
+    return DONE;
+}
+
+int cloud_content_sync_cancel_server_storage_info(cloud_content_sync_h handle, void *user_data)
+{
+    if (!handle)
+        return INVALID;
+    return handle->client->storage->cancel(user_data) ? DONE : CLOUD_CONTENT_SYNC_ERROR_NOT_FOUND;
 }
 
 int cloud_content_sync_refresh_meta(cloud_content_sync_h handle, int content_types, cloud_content_sync_refresh_cb cb,

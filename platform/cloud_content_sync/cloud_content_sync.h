@@ -71,8 +71,8 @@ int cloud_content_sync_create(const char *service_name, cloud_content_sync_h *ha
 int cloud_content_sync_destroy(cloud_content_sync_h handle);
 
 // Whether a content type (one of IMAGE, VIDEO, CAMERA) is to be kept in step, at first true. It is a setting of the
-// account that is signed in: others do not see it, and it is there again when that account signs in again. With nobody
-// signed in it reads as true, and setting it answers NO_ACCOUNT.
+// account that is signed in: others do not see it, it is there again when that account takes the place of another, and
+// goes when the account is signed out. With nobody signed in it reads as true, and setting it answers NO_ACCOUNT.
 int cloud_content_sync_setting_get_type_activation(cloud_content_sync_h handle, int content_type, bool *value);
 int cloud_content_sync_setting_set_type_activation(cloud_content_sync_h handle, int content_type, bool value);
 // Whether what the camera makes is to be uploaded by itself; a setting of the account as the above is, at first false,
@@ -228,8 +228,8 @@ int cloud_content_sync_activate(cloud_content_sync_h handle, cloud_content_sync_
 // Ends a sign-in that is under way in this handle, from the call that asks for a request token to an activation that
 // has stored it: what is provisional is revoked and forgotten, and whoever is signed in stays so. With none under way
 // it signs out: every request of the handle ends (their last callbacks bring NO_ACCOUNT; what an upload has stored by
-// then stays), credentials, database, caches and thumbnails of the account go, and then the access token is revoked; a
-// password stays what it is. The account's settings stay for the next time. What is on the device goes also when the
+// then stays), credentials, database, settings, caches and thumbnails of the account go, and then the access token is
+// revoked; a password stays what it is. What is on the device goes also when the
 // service cannot be reached, or the token cannot be read: that is DONE, with the error NETWORK or SERVER. FAILED, with
 // DB_FAILED, only when something on the device could not be removed: then whoever was signed in still is. With nobody
 // signed in it is DONE.

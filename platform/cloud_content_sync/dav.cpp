@@ -73,6 +73,14 @@ static std::string trimmed(const std::string &text)
     return first == text.npos ? "" : text.substr(first, text.find_last_not_of(SPACES) - first + 1);
 }
 
+// -1 for what is no number of bytes.
+static long long number_of(const std::string &text)
+{
+    guint64 number = 0;
+    const bool is_number = g_ascii_string_to_unsigned(trimmed(text).c_str(), 10, 0, G_MAXINT64, &number, nullptr);
+    return is_number ? static_cast<long long>(number) : -1;
+}
+
 void MultistatusReader::State::start(const char *name, const char *uri)
 {
     text.clear();
@@ -103,10 +111,11 @@ void MultistatusReader::State::end(const char *name, const char *uri)
     } else if (is(name, uri, "status") && in_propstat) {
         status = trimmed(text);
     } else if (is(name, uri, "getcontentlength")) {
-        const std::string digits = trimmed(text);
-        guint64 size = 0;
-        if (g_ascii_string_to_unsigned(digits.c_str(), 10, 0, G_MAXINT64, &size, nullptr))
-            propstat.size = static_cast<long long>(size);
+        propstat.size = number_of(text);
+    } else if (is(name, uri, "quota-used-bytes")) {
+        propstat.quota_used = number_of(text);
+    } else if (is(name, uri, "quota-available-bytes")) {
+        propstat.quota_left = number_of(text);
     } else if (is(name, uri, "getlastmodified")) {
         const time_t time = curl_getdate(trimmed(text).c_str(), nullptr);
         propstat.mtime = time < 0 ? 0 : time;
@@ -129,6 +138,10 @@ void MultistatusReader::State::close_propstat()
     entry.is_folder |= propstat.is_folder;
     if (propstat.size >= 0)
         entry.size = propstat.size;
+    if (propstat.quota_used >= 0)
+        entry.quota_used = propstat.quota_used;
+    if (propstat.quota_left >= 0)
+        entry.quota_left = propstat.quota_left;
     if (propstat.mtime)
         entry.mtime = propstat.mtime;
     if (!propstat.etag.empty())

@@ -164,11 +164,10 @@ TEST_P(Files, settings_are_the_accounts_own)
         bool seen;                  // of the images; of the videos it is always the default
         int set;                    // to false
         long long number;           // seen before it is set to the row's own
-    } rows[] = {{"a@example.org", "one", true, 0, -1},
-                {"b@example.org", "one", true, 0, -1},
-                {"a@example.org", "two", false, 0, 0},
-                {nullptr, nullptr, true, NO_ACCOUNT, -1},
-                {"b@example.org", "two", false, 0, 1LL << 40}};
+    } rows[] = {
+        {"a@example.org", "one", true, 0, -1},         {"b@example.org", "one", true, 0, -1},
+        {"a@example.org", "two", false, 0, 0},         {nullptr, nullptr, true, NO_ACCOUNT, -1},
+        {"b@example.org", "two", false, 0, 1LL << 40}, {"a@example.org", "three", true, 0, -1}}; // it was signed out
     cloud::Account account(*cloud::service_find("Test"));
     ASSERT_TRUE(account.open());
     for (const auto &row : rows) {
@@ -182,6 +181,41 @@ TEST_P(Files, settings_are_the_accounts_own)
         EXPECT_EQ(account.setting("number", -1), row.number);
         EXPECT_EQ(account.set_setting("number", (&row - rows) << 40), row.set);
     }
+}
+
+static void storage_cb(int status, unsigned long long total, unsigned long long used, int error, void *data)
+{
+    auto *result = static_cast<Watch *>(data);
+    result->text = std::to_string(used) + " of " + std::to_string(total);
+    result->add({status, 0, error});
+}
+
+TEST_P(Files, storage_is_what_the_service_says)
+{
+    const auto ask_storage = [&](Watch &result) {
+        EXPECT_EQ(cloud_content_sync_get_server_storage_info(handle, storage_cb, &result), 0);
+    };
+    Watch before, after, gone, dropped;
+    ask_storage(before);
+    EXPECT_EQ(before.end(), 0);
+    publish("a.jpg", std::string(5'000, 'x'));
+    ask_storage(after);
+    EXPECT_EQ(after.end(), 0);
+    const bool is_bounded = GetParam() != "Apache";
+    EXPECT_EQ(after.text.starts_with("5000 of "), is_bounded) << after.text;
+    EXPECT_EQ(after.text.ends_with(" of 0"), !is_bounded) << after.text;
+    for (int i = 0; i < 50; i++) { // at every moment of its life
+        ask_storage(dropped);
+        g_usleep(static_cast<gulong>(i) * 100);
+        cloud_content_sync_cancel_server_storage_info(handle, &dropped);
+        const size_t calls = dropped.count();
+        g_usleep(1'000);
+        ASSERT_EQ(dropped.count(), calls);
+    }
+    EXPECT_EQ(cloud_content_sync_cancel_server_storage_info(handle, &dropped), CLOUD_CONTENT_SYNC_ERROR_NOT_FOUND);
+    backend->go_down();
+    ask_storage(gone);
+    EXPECT_EQ(gone.end(), CLOUD_CONTENT_SYNC_ERROR_NETWORK);
 }
 
 // At every moment of a download: after its cancel nothing arrives, unless its last callback has run.

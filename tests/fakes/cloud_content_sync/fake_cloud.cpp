@@ -149,6 +149,15 @@ void fake_cloud_fail_content(int error)
     change([&](FakeState &state) { state.content_error = error; });
 }
 
+void fake_cloud_set_storage(unsigned long long total, unsigned long long used, int error)
+{
+    change([&](FakeState &state) {
+        state.storage_total = total;
+        state.storage_used = used;
+        state.storage_error = error;
+    });
+}
+
 void fake_cloud_approve(const std::string &email)
 {
     change([&](FakeState &state) { state.approver = email; });

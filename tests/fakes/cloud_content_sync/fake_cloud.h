@@ -33,6 +33,10 @@ void fake_cloud_fail_refresh(int error);
 void fake_cloud_fail_create(int error);
 void fake_cloud_fail_content(int error);
 
+// How much storage there is, at first 15 GiB, and how much of it is used besides the files of the tree, in bytes; a
+// total of 0: the service does not say. An error: every question about it ends with that.
+void fake_cloud_set_storage(unsigned long long total, unsigned long long used, int error = 0);
+
 // Signing in and out. The service has pages, which nobody sees: the person's decision is made here. From now on the
 // account of this address allows every request token; "": they are not allowed, as in the beginning.
 void fake_cloud_approve(const std::string &email);

@@ -117,8 +117,28 @@ static std::string response(const std::string &path)
     return text + "</D:prop><D:status>HTTP/1.1 200 OK</D:status></D:propstat></D:response>";
 }
 
+static void storage(Transfer &transfer)
+{
+    if (fake().storage_error)
+        return answer_error(transfer, fake().storage_error);
+    const unsigned long long total = fake().storage_total;
+    unsigned long long used = fake().storage_used;
+    for (const auto &[path, file] : fake().files)
+        used += file.content.size();
+    std::string numbers;
+    if (total)
+        numbers = "<D:quota-used-bytes>" + std::to_string(used) + "</D:quota-used-bytes><D:quota-available-bytes>" +
+                  std::to_string(total - std::min(used, total)) + "</D:quota-available-bytes>";
+    answer(transfer, 207,
+           "<D:multistatus xmlns:D=\"DAV:\"><D:response><D:href>/</D:href><D:propstat><D:prop>" + numbers +
+               "</D:prop><D:status>HTTP/1.1 200 OK</D:status></D:propstat></D:response></D:multistatus>");
+}
+
 static void propfind(Transfer &transfer)
 {
+    if (transfer.body.find("quota") != std::string::npos)
+        return storage(transfer);
+
     const std::string path = transfer.path.size() > 1 && transfer.path.back() == '/'
                                  ? transfer.path.substr(0, transfer.path.size() - 1)
                                  : transfer.path;

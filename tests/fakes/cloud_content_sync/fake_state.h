@@ -14,6 +14,8 @@ struct FakeState {
     std::map<std::string, FakeFile> files; // by path
     bool reachable = true, held = false;
     int permits = 0, delay = 0, versions = 0, uploads_sent = 0, refresh_error = 0, create_error = 0, content_error = 0;
+    int storage_error = 0;
+    unsigned long long storage_total = 15ULL << 30, storage_used = 0;
     std::map<int, int> upload_errors; // number of the upload -> error
     std::vector<std::string> log;
     std::map<std::string, std::string> request_tokens; // token -> secret
