@@ -67,6 +67,11 @@ extern DetailsViewData *s_vd;
 // The text of an id of the domain "velora"; anything else comes back as it is.
 const char *__details_text(const char *id);
 
+// velora_details.cpp
+
+// Looks whose settings they are, shows what is stored and asks for the storage anew.
+void __details_refresh(DetailsViewData *vd);
+
 // details_rows.cpp
 
 DetailsItemData *__create_genlist_item_data(int index, DetailsViewData *vd, const char *text1, const char *text2,
@@ -81,8 +86,8 @@ void __details_text2_set(Elm_Object_Item *row, const char *text);
 void __details_rows_read(DetailsViewData *vd);
 // Keeps a control of a row in the row's record, *slot, while the control lives.
 void __details_control_keep(DetailsItemData *row, Evas_Object **slot, Evas_Object *control);
-// Says that what was chosen is not stored.
-void __details_say_not_saved();
+// What was chosen could not be stored: says so, and shows what is stored.
+void __details_not_saved(DetailsViewData *vd);
 
 // details_schedule.cpp
 

@@ -32,6 +32,7 @@ static void __delete_account_popup_ok_cb(void *data, Evas_Object *, void *)
     if (!_velora_popup_take_away(ad, {vd, s_topic}))
         return;
     _velora_upload_view_stop_all(ad);
+    _velora_upload_view_forget();
     if (!_velora_common_client_get(ad))
         VELORA_LOGE("cloud_content_sync_create failed");
     if (const int result = _velora_common_add_account_with_popup_signout(ad); result != 0)

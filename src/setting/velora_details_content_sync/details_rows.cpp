@@ -14,9 +14,10 @@ const char *__details_text(const char *id)
     return id && *id ? dcgettext(VELORA_DOMAIN, id, LC_MESSAGES) : "";
 }
 
-void __details_say_not_saved()
+void __details_not_saved(DetailsViewData *vd)
 {
     notification_status_message_post(__details_text("IDS_VELORA_BODY_SETTING_NOT_SAVED"));
+    __details_refresh(vd); // the account itself may be gone
 }
 
 // What each switch stands for.
@@ -111,9 +112,10 @@ static void __switch_show(DetailsItemData *row, bool state)
 
 static void __detail_update_genlist_statue(DetailsItemData *row, DetailsViewData *vd, bool state)
 {
-    if (!__switch_write(vd, row->kind, state))
-        __details_say_not_saved();
-    __switch_show(row, __switch_read(vd, row->kind));
+    if (__switch_write(vd, row->kind, state))
+        __switch_show(row, __switch_read(vd, row->kind));
+    else
+        __details_not_saved(vd);
 }
 
 static void __gl_sel_switch_cb(void *, Evas_Object *, void *event_info)
@@ -265,8 +267,18 @@ static void __group_append(DetailsViewData *vd, const char *title, int kind, con
     vd->*__switch_of(kind).companion = __append(vd, vd->itc_1line, wifi_text, nullptr, wifi_kind, __gl_sel_switch_cb);
 }
 
+// A switch and its companion make one card.
+static void __row_realized_cb(void *, Evas_Object *, void *event_info)
+{
+    auto *item = static_cast<Elm_Object_Item *>(event_info);
+    const int kind = static_cast<DetailsItemData *>(elm_object_item_data_get(item))->kind;
+    if (kind != DETAIL_ITEM_NONE)
+        elm_object_item_signal_emit(item, __switch_of(kind).companion ? "elm,state,top" : "elm,state,bottom", "elm");
+}
+
 void __details_rows_append(DetailsViewData *vd)
 {
+    evas_object_smart_callback_add(vd->genlist, "realized", __row_realized_cb, nullptr);
     vd->storage_item = __append(vd, vd->itc_storage, "IDS_CLOUD_BODY_STORAGE_USAGE", "IDS_CLOUD_OPT_LOADING_ING_ABB");
     __append(vd, vd->itc_group, "IDS_ST_HEADER_SYNCED_BY_ORVANT_ABB");
     vd->schedule_item = __append(vd, vd->itc_2line, "IDS_CLOUD_BODY_SYNC_SCHEDULE", nullptr, DETAIL_ITEM_NONE,

@@ -78,7 +78,7 @@ static void __sync_schedule_save_cb(void *data)
     vd->job = nullptr;
     _velora_popup_take_away(vd->ad, {vd, s_topic});
     if (!__set_content_sync_refresh_type(vd->client.get(), vd->chosen_schedule))
-        __details_say_not_saved();
+        __details_not_saved(vd);
     vd->sync_schedule_value = __get_sync_schedule_value(vd->client.get());
     __schedule_row_update(vd);
 }
@@ -147,6 +147,7 @@ static void __language_changed_cb(void *, Evas_Object *genlist, void *)
 static Evas_Object *__choices_create(DetailsViewData *vd, Evas_Object *parent)
 {
     Evas_Object *genlist = elm_genlist_add(parent);
+    elm_object_style_set(genlist, "popup");
     elm_genlist_mode_set(genlist, ELM_LIST_COMPRESS);
     evas_object_size_hint_weight_set(genlist, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
     evas_object_size_hint_align_set(genlist, EVAS_HINT_FILL, EVAS_HINT_FILL);

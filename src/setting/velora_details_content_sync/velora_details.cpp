@@ -72,7 +72,7 @@ static void __account_read(DetailsViewData *vd)
     vd->account = email;
 }
 
-static void __refresh(DetailsViewData *vd)
+void __details_refresh(DetailsViewData *vd)
 {
     __account_read(vd);
     __details_rows_read(vd);
@@ -92,21 +92,21 @@ static bool __is_in_front(const DetailsViewData *vd)
 
 static void __page_shown_cb(void *data, Evas *, Evas_Object *, void *)
 {
-    __refresh(static_cast<DetailsViewData *>(data));
+    __details_refresh(static_cast<DetailsViewData *>(data));
 }
 
 static void __transition_finished_cb(void *data, Evas_Object *, void *)
 {
     auto *vd = static_cast<DetailsViewData *>(data);
     if (__is_in_front(vd))
-        __refresh(vd);
+        __details_refresh(vd);
 }
 
 static void __window_focused_cb(void *data, Evas *, void *)
 {
     auto *vd = static_cast<DetailsViewData *>(data);
     if (__is_in_front(vd))
-        __refresh(vd);
+        __details_refresh(vd);
 }
 
 static void __language_changed_cb(void *data, Evas_Object *genlist, void *)
@@ -264,7 +264,6 @@ static void __page_create(DetailsViewData *vd)
     Evas_Object *nf = vd->ad->naviframe;
     __details_item_classes_create(vd);
     vd->genlist = elm_genlist_add(nf);
-    elm_object_style_set(vd->genlist, "dialogue");
     elm_genlist_mode_set(vd->genlist, ELM_LIST_COMPRESS);
     evas_object_smart_callback_add(vd->genlist, "language,changed", __language_changed_cb, vd);
     __details_rows_append(vd);
@@ -319,7 +318,7 @@ static void __join(DetailsViewData *vd)
     }
     _velora_pages_join(ad, vd);
     elm_naviframe_item_promote(vd->nf_item);
-    __refresh(vd);
+    __details_refresh(vd);
 }
 
 void _velora_details_create(AppData *ad)
@@ -350,5 +349,5 @@ void _velora_details_create(AppData *ad)
                                }});
     vd->pipe = _velora_common_pipe_add(__storage_pipe_cb, vd);
     __page_create(vd);
-    __refresh(vd);
+    __details_refresh(vd);
 }

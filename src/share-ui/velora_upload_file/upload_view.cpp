@@ -1,4 +1,5 @@
 // The upload view's life: built by a share or a result, left by Back, Cancel or a failure.
+#include "notification/notification.h"
 #include "velora_common/velora_client.h"
 #include "velora_common/velora_current_popup.h"
 #include "velora_common/velora_genlist.h"
@@ -15,6 +16,7 @@
 #include "velora_upload_file/upload_menu.h"
 #include "velora_upload_file/upload_messages.h"
 #include "velora_upload_file/upload_notification.h"
+#include "velora_upload_file/upload_open.h"
 #include "velora_upload_file/upload_page.h"
 #include "velora_upload_file/upload_path_bar.h"
 #include "velora_upload_file/upload_queue.h"
@@ -218,4 +220,10 @@ void _velora_upload_view_stop_all(AppData *ad)
         __worker_join(vd->run.get()); // which says what is up
     }
     _velora_page_replace(ad, vd);
+}
+
+void _velora_upload_view_forget()
+{
+    __opened_copies_delete();
+    notification_delete_all_by_type(VELORA_SHARE_PACKAGE, NOTIFICATION_TYPE_NONE);
 }

@@ -21,3 +21,7 @@ int _velora_upload_view_unfinished();
 // Ends what is unfinished as if the person had stopped each file: what is up by then stays, and is told by a result;
 // nothing else is sent. The view goes, and whoever shared is answered. Nothing when nothing is unfinished.
 void _velora_upload_view_stop_all(AppData *ad);
+
+// Deletes what this device keeps of an account that is removed: copies of files that were opened, and notifications,
+// which name what was uploaded.
+void _velora_upload_view_forget();
