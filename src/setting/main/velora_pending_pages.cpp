@@ -1,12 +1,8 @@
 #include "main/velora_pending_pages.h"
-#include "velora_add_account_content_sync/velora_signin.h"
-#include "velora_common/velora_account.h"
 #include "velora_common/velora_current_popup.h"
 #include "velora_common/velora_log.h"
-#include "velora_common/velora_pages.h"
 #include "velora_common/velora_popup.h"
 #include "velora_common/velora_requests.h"
-#include "velora_upload_file/velora_upload_view.h"
 
 static const char s_topic[] = "pending page";
 static int s_request; // that the popup stands for
@@ -50,25 +46,4 @@ void _velora_setupwizard_view_create(AppData *ad)
 void _velora_signin_setupwizard_create(AppData *ad)
 {
     __pending_popup_show(ad, "IDS_VELORA_BODY_SHARE_FROM_ANOTHER_APPLICATION");
-}
-
-void _velora_details_create(AppData *ad)
-{
-    if (!ad) {
-        VELORA_LOGE("ad is NULL");
-        return;
-    }
-    AccountInfo *info = nullptr;
-    const bool has_account = __velora_check_account_exist(VELORA_PACKAGE, &info) == 0;
-    __velora_account_info_free(info);
-    if (ad->launch_mode == LAUNCH_MODE_SHARE) {
-        _velora_upload_view_create(ad);
-    } else if (!_velora_pages_are_empty()) { // what is open is in front now, and says more
-        _velora_request_finish(ad, _velora_request_last());
-    } else if (!has_account) {
-        ad->launch_mode = LAUNCH_MODE_SIGNIN;
-        _velora_signin_create(ad, 1);
-    } else {
-        __pending_popup_show(ad, "IDS_VELORA_BODY_SHARE_FROM_ANOTHER_APPLICATION");
-    }
 }
