@@ -144,9 +144,9 @@ def removal(tour):
     person = tour.person
 
     def upload():
-        person.share(person.file("one.bin", size=4 << 20), person.file("two.txt"))
+        person.share(person.file("one.bin", size=24 << 20), person.file("two.txt"))
         person.choose()
-        person.notified("one.bin", ongoing=True)
+        person.notified("0 / 2", ongoing=True)
         person.raise_window()
 
     def ask():
