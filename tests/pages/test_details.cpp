@@ -517,7 +517,7 @@ TEST_F(Details, AnAccountIsRemovedWithEverythingThatIsUnderWay)
         EXPECT_EQ(accounts(), c.is_reachable ? nobody : "- - 1");
         EXPECT_EQ(uploaded("/a.txt"), "(missing)");
         EXPECT_EQ(answers(),
-                  c.files.empty() ? Texts{"settings canceled"} : Texts{"gallery succeeded", "settings canceled"});
+                  (c.files.empty() ? Texts{"settings canceled"} : Texts{"gallery succeeded", "settings canceled"}));
         fake_cloud_set_reachable(true);
     }
 }

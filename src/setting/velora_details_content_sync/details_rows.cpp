@@ -276,11 +276,11 @@ static void __row_realized_cb(void *, Evas_Object *, void *event_info)
         elm_object_item_signal_emit(item, __switch_of(kind).companion ? "elm,state,top" : "elm,state,bottom", "elm");
 }
 
-// The toolkit takes the keys to titles too. What is told by its row alone, the storage, is worth a stop.
-static bool __is_stop(const DetailsViewData *vd, Elm_Object_Item *item)
+// The toolkit takes the keys to titles too, which cannot even show it.
+static bool __is_stop(Elm_Object_Item *item)
 {
-    return item == vd->storage_item || (elm_genlist_item_select_mode_get(item) == ELM_OBJECT_SELECT_MODE_DEFAULT &&
-                                        !elm_object_item_disabled_get(item));
+    return elm_genlist_item_select_mode_get(item) == ELM_OBJECT_SELECT_MODE_DEFAULT &&
+           !elm_object_item_disabled_get(item);
 }
 
 static Evas_Object *__beyond(const DetailsViewData *vd, bool is_down)
@@ -309,8 +309,10 @@ static Eina_Bool __list_key_cb(void *data, Evas_Object *genlist, Evas_Object *, 
         item = step(item);
     else
         item = is_down ? elm_genlist_first_item_get(genlist) : elm_genlist_last_item_get(genlist);
-    while (item && !__is_stop(vd, item))
+    while (item && !__is_stop(item))
         item = step(item);
+    if (!is_down && item == vd->schedule_item) // what no key stops at comes into sight with it
+        elm_genlist_item_show(vd->storage_item, ELM_GENLIST_ITEM_SCROLLTO_IN);
     if (item) {
         elm_genlist_item_show(item, ELM_GENLIST_ITEM_SCROLLTO_IN);
         elm_object_item_focus_set(item, EINA_TRUE);
