@@ -276,8 +276,56 @@ static void __row_realized_cb(void *, Evas_Object *, void *event_info)
         elm_object_item_signal_emit(item, __switch_of(kind).companion ? "elm,state,top" : "elm,state,bottom", "elm");
 }
 
+// The toolkit takes the keys to titles too, which cannot even show it.
+static bool __is_stop(Elm_Object_Item *item)
+{
+    return elm_genlist_item_select_mode_get(item) == ELM_OBJECT_SELECT_MODE_DEFAULT &&
+           !elm_object_item_disabled_get(item);
+}
+
+static Evas_Object *__beyond(const DetailsViewData *vd, bool is_down)
+{
+    if (!is_down)
+        return elm_object_item_part_content_get(vd->nf_item, "prev_btn");
+    if (vd->more_btn)
+        return vd->more_btn;
+    Evas_Object *bar = elm_object_item_part_content_get(vd->nf_item, "toolbar");
+    return bar ? elm_object_part_content_get(bar, "emergency_btn") : nullptr;
+}
+
+static Eina_Bool __list_key_cb(void *data, Evas_Object *genlist, Evas_Object *, Evas_Callback_Type type,
+                               void *event_info)
+{
+    if (type != EVAS_CALLBACK_KEY_DOWN)
+        return EINA_FALSE;
+    const auto *vd = static_cast<DetailsViewData *>(data);
+    auto *event = static_cast<Evas_Event_Key_Down *>(event_info);
+    const bool is_down = std::strcmp(event->key, "Down") == 0 || std::strcmp(event->key, "KP_Down") == 0;
+    if (!is_down && std::strcmp(event->key, "Up") != 0 && std::strcmp(event->key, "KP_Up") != 0)
+        return EINA_FALSE;
+    const auto step = is_down ? elm_genlist_item_next_get : elm_genlist_item_prev_get;
+    Elm_Object_Item *item = elm_object_focused_item_get(genlist);
+    if (item)
+        item = step(item);
+    else
+        item = is_down ? elm_genlist_first_item_get(genlist) : elm_genlist_last_item_get(genlist);
+    while (item && !__is_stop(item))
+        item = step(item);
+    if (!is_down && item == vd->schedule_item) // what no key stops at comes into sight with it
+        elm_genlist_item_show(vd->storage_item, ELM_GENLIST_ITEM_SCROLLTO_IN);
+    if (item) {
+        elm_genlist_item_show(item, ELM_GENLIST_ITEM_SCROLLTO_IN);
+        elm_object_item_focus_set(item, EINA_TRUE);
+    } else if (Evas_Object *next = __beyond(vd, is_down)) {
+        elm_object_focus_set(next, EINA_TRUE);
+    }
+    event->event_flags = static_cast<Evas_Event_Flags>(event->event_flags | EVAS_EVENT_FLAG_ON_HOLD);
+    return EINA_TRUE;
+}
+
 void __details_rows_append(DetailsViewData *vd)
 {
+    elm_object_event_callback_add(vd->genlist, __list_key_cb, vd);
     evas_object_smart_callback_add(vd->genlist, "realized", __row_realized_cb, nullptr);
     vd->storage_item = __append(vd, vd->itc_storage, "IDS_CLOUD_BODY_STORAGE_USAGE", "IDS_CLOUD_OPT_LOADING_ING_ABB");
     __append(vd, vd->itc_group, "IDS_ST_HEADER_SYNCED_BY_ORVANT_ABB");

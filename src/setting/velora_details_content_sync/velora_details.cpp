@@ -240,13 +240,13 @@ static void __back_button_cb(void *data, Evas_Object *, void *)
 static void __edges_create(DetailsViewData *vd)
 {
     Evas_Object *nf = vd->ad->naviframe;
-    for (const char *part : {"elm.swallow.prev_btn", "toolbar_more_btn", "toolbar"})
+    for (const char *part : {"prev_btn", "toolbar_more_btn", "toolbar"})
         if (Evas_Object *former = elm_object_item_part_content_unset(vd->nf_item, part))
             evas_object_del(former);
     vd->more_btn = nullptr;
     if (!__follows_signin(vd->launch_mode))
         elm_object_item_part_content_set(
-            vd->nf_item, "elm.swallow.prev_btn",
+            vd->nf_item, "prev_btn",
             __bar_button_create(vd, "naviframe/end_btn/default", "IDS_VELORA_BODY_BACK", __back_button_cb, nf));
     if (__has_menu(vd->launch_mode)) {
         vd->more_btn = __bar_button_create(vd, "naviframe/more/default", "IDS_VELORA_BODY_MORE_OPTIONS", __more_cb, vd);
