@@ -42,16 +42,6 @@ static void __pending_popup_show(AppData *ad, const char *text_id)
                        __replaced_cb, ad);
 }
 
-void _velora_setupwizard_view_create(AppData *ad)
-{
-    __pending_popup_show(ad, "IDS_VELORA_BODY_SHARE_FROM_ANOTHER_APPLICATION");
-}
-
-void _velora_signin_setupwizard_create(AppData *ad)
-{
-    __pending_popup_show(ad, "IDS_VELORA_BODY_SHARE_FROM_ANOTHER_APPLICATION");
-}
-
 void _velora_details_create(AppData *ad)
 {
     if (!ad) {
