@@ -3,6 +3,7 @@
 #include "velora_common/velora_log.h"
 #include "velora_common/velora_row_control.h"
 #include "velora_details_content_sync/details_record.h"
+#include <algorithm>
 #include <cstdio>
 #include <iterator>
 
@@ -168,6 +169,18 @@ static Evas_Object *__choices_create(DetailsViewData *vd, Evas_Object *parent)
     return genlist;
 }
 
+// A list takes what it is given, and a table or a box works its least size out from what is in it: this gives it one.
+static Evas_Object *__height_create(Evas_Object *win)
+{
+    constexpr double wanted = 288, most = 0.6; // pixels of the density that the pages are drawn for; of the window
+    int window = 0;
+    evas_object_geometry_get(win, nullptr, nullptr, nullptr, &window);
+    Evas_Object *height = evas_object_rectangle_add(evas_object_evas_get(win));
+    const double pixels = wanted * elm_config_scale_get() / elm_app_base_scale_get();
+    evas_object_size_hint_min_set(height, -1, static_cast<int>(std::min(pixels, window * most)));
+    return height;
+}
+
 void __gl_sel_sync_schedule_cb(void *data, Evas_Object *, void *event_info)
 {
     auto *item = static_cast<Elm_Object_Item *>(event_info);
@@ -183,13 +196,11 @@ void __gl_sel_sync_schedule_cb(void *data, Evas_Object *, void *event_info)
     ea_object_event_callback_add(popup, EA_CALLBACK_BACK, __popup_back_cb, nullptr);
     elm_object_domain_translatable_part_text_set(popup, "title,text", VELORA_DOMAIN, "IDS_CLOUD_BODY_SYNC_SCHEDULE");
     evas_object_size_hint_weight_set(popup, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
-    Evas_Object *box = elm_box_add(popup);
-    evas_object_size_hint_weight_set(box, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
-    elm_box_pack_end(box, __choices_create(vd, box));
-    constexpr double height = 288; // pixels of the density that the pages are drawn for
-    evas_object_size_hint_min_set(box, -1,
-                                  static_cast<int>(height * elm_config_scale_get() / elm_app_base_scale_get()));
-    elm_object_content_set(popup, box);
+    Evas_Object *table = elm_table_add(popup);
+    evas_object_size_hint_weight_set(table, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
+    elm_table_pack(table, __height_create(vd->ad->win_main), 0, 0, 1, 1);
+    elm_table_pack(table, __choices_create(vd, table), 0, 0, 1, 1);
+    elm_object_content_set(popup, table);
     evas_object_show(popup);
     _velora_popup_show(vd->ad, {vd, s_topic}, popup);
 }
