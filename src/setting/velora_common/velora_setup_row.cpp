@@ -9,6 +9,7 @@
 
 static constexpr int s_drawn_width = 480;
 static constexpr double s_drawn_scale = 1.8;
+static constexpr int s_drawn_text = 28; // without a table of fonts
 
 static const char *__text(const char *id)
 {
@@ -133,6 +134,7 @@ Elm_Object_Item *_velora_setup_page_push(Evas_Object *naviframe, Evas_Object *li
     elm_object_domain_translatable_text_set(button, VELORA_DOMAIN, button_id);
     evas_object_smart_callback_add(button, "clicked", button_cb, data);
     elm_object_item_part_content_set(item, "toolbar", button);
+    elm_object_focus_set(list, EINA_TRUE);
     return item;
 }
 
@@ -140,7 +142,8 @@ static Evas_Object *__title_create(Evas_Object *layout, const char *text_id)
 {
     char *font = nullptr;
     int size = 0;
-    ea_theme_font_get("ATO007", &font, &size);
+    if (!ea_theme_font_get("ATO007", &font, &size))
+        size = s_drawn_text;
     std::free(font);
     Evas_Object *label = elm_label_add(layout);
     elm_label_line_wrap_set(label, ELM_WRAP_MIXED);

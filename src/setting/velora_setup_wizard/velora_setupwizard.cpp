@@ -32,6 +32,10 @@ static WelcomeViewData *s_vd;
 static const char s_disclaimer_topic[] = "disclaimer";
 static const char s_previous_id[] = "IDS_CLOUD_BUTTON_PREVIOUS", s_skip_id[] = "IDS_STU_BUTTON_SKIP";
 static constexpr int s_offered_gigabytes = 50;
+static constexpr double s_headline_scale = 1.25; // of what is said below it
+// Where the tables of the theme are missing: readable on light and on dark.
+static constexpr int s_plain_size = 26;
+static constexpr unsigned int s_plain_color = 0x80868E;
 
 static const char *__text(const char *id)
 {
@@ -100,8 +104,10 @@ struct Font {
 static Font __font(const char *theme_code)
 {
     char *name = nullptr;
-    Font font;
+    Font font{.size = s_plain_size};
     ea_theme_font_get(theme_code, &name, &font.size);
+    if (font.size <= 0)
+        font.size = s_plain_size;
     font.name = name ? name : "Sans";
     std::free(name);
     return font;
@@ -110,13 +116,15 @@ static Font __font(const char *theme_code)
 static unsigned int __color(const char *theme_code)
 {
     int r = 0, g = 0, b = 0, a = 0;
-    ea_theme_color_get(theme_code, &r, &g, &b, &a);
+    if (!ea_theme_color_get(theme_code, &r, &g, &b, &a))
+        return s_plain_color;
     return static_cast<unsigned int>((r << 16) + (g << 8) + b);
 }
 
 static Evas_Object *__label_create(Evas_Object *parent)
 {
     Evas_Object *label = elm_label_add(parent);
+    elm_object_style_set(label, "setupwizard"); // white: the colour is the markup's
     elm_label_line_wrap_set(label, ELM_WRAP_MIXED);
     return label;
 }
@@ -307,7 +315,7 @@ static void __account_fill(WelcomeViewData *vd)
     __button_create(vd, "elm.swallow.btn1", "IDS_SA_BODY_CREATE_NEW_ACCOUNT_M_SIGN_UP", __create_account_btn_cb);
     __button_create(vd, "elm.swallow.btn2", "IDS_CLOUD_BUTTON_SIGN_IN", __sign_in_btn_cb);
     elm_layout_signal_emit(elm_object_part_content_get(vd->layout, "elm.swallow.btn1"), "platform,button,primary",
-                           "platform");
+                           "platform"); // of the two what a new phone is most likely to need
 }
 
 static void __page_shown_cb(void *, Evas *, Evas_Object *, void *)
@@ -358,8 +366,10 @@ static void __words_create(WelcomeViewData *vd, const char *file)
     elm_layout_file_set(vd->words, file, "scroller_lite");
     evas_object_size_hint_weight_set(vd->words, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
     evas_object_size_hint_align_set(vd->words, EVAS_HINT_FILL, EVAS_HINT_FILL);
-    for (const char *part : {"elm.swallow.text0", "elm.swallow.text1"})
-        elm_object_part_content_set(vd->words, part, __label_create(vd->words));
+    Evas_Object *headline = __label_create(vd->words), *offer = __label_create(vd->words);
+    elm_object_scale_set(headline, s_headline_scale);
+    elm_object_part_content_set(vd->words, "elm.swallow.text0", headline);
+    elm_object_part_content_set(vd->words, "elm.swallow.text1", offer);
     elm_object_content_set(scroller, vd->words);
     elm_object_part_content_set(vd->layout, "elm.swallow.scroller", scroller);
 }
