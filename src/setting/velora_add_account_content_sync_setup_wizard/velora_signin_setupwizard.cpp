@@ -89,6 +89,7 @@ static Evas_Object *__radio_create(CameraUploadSetupViewData *vd, const SetupIte
     elm_radio_value_set(vd->radio, vd->is_wifi_only ? s_wifi_only : s_any_network);
     evas_object_size_hint_weight_set(radio, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
     evas_object_size_hint_align_set(radio, EVAS_HINT_FILL, EVAS_HINT_FILL);
+    elm_object_focus_allow_set(radio, EINA_FALSE); // keys choose the row
     evas_object_smart_callback_add(radio, "changed", __radio_changed_cb, nullptr);
     ea_screen_reader_name_set(radio, __text(item_data->text_id_2));
     return _velora_common_row_control(vd->genlist, radio);
@@ -153,6 +154,7 @@ static Evas_Object *__enable_button_create(Evas_Object *genlist, const SetupItem
     Evas_Object *button = elm_button_add(genlist);
     elm_object_style_set(button, "contacts");
     elm_object_domain_translatable_text_set(button, VELORA_DOMAIN, item_data->text_id_1);
+    elm_object_focus_allow_set(button, EINA_FALSE); // keys choose the row
     return button;
 }
 

@@ -9,6 +9,12 @@
 
 static constexpr int s_drawn_width = 480;
 static constexpr double s_drawn_scale = 1.8;
+static constexpr int s_narrowest = 320, s_plain_text = 26; // where letters keep that size
+
+static double __scale()
+{
+    return elm_config_scale_get() / s_drawn_scale;
+}
 
 static const char *__text(const char *id)
 {
@@ -119,6 +125,36 @@ Evas_Object *_velora_setup_list_create(Evas_Object *parent)
     return genlist;
 }
 
+// Up and Down go from one row that can be chosen to the next; the toolkit takes them to titles too, which cannot show it.
+// What no key stops at comes into sight with the row beside it.
+static Eina_Bool __list_key_cb(void *data, Evas_Object *genlist, Evas_Object *, Evas_Callback_Type type,
+                               void *event_info)
+{
+    if (type != EVAS_CALLBACK_KEY_DOWN)
+        return EINA_FALSE;
+    auto *event = static_cast<Evas_Event_Key_Down *>(event_info);
+    const bool is_down = g_strcmp0(event->key, "Down") == 0 || g_strcmp0(event->key, "KP_Down") == 0;
+    const bool is_up = g_strcmp0(event->key, "Up") == 0 || g_strcmp0(event->key, "KP_Up") == 0;
+    if (!is_down && !is_up)
+        return EINA_FALSE;
+    const auto step = is_down ? elm_genlist_item_next_get : elm_genlist_item_prev_get;
+    Elm_Object_Item *item = elm_object_focused_item_get(genlist);
+    item = item ? step(item) : elm_genlist_first_item_get(genlist);
+    while (item && elm_genlist_item_select_mode_get(item) != ELM_OBJECT_SELECT_MODE_DEFAULT)
+        item = step(item);
+    if (item) {
+        elm_genlist_item_show(item, ELM_GENLIST_ITEM_SCROLLTO_IN);
+        elm_object_item_focus_set(item, EINA_TRUE);
+    } else {
+        elm_genlist_item_show(is_down ? elm_genlist_last_item_get(genlist) : elm_genlist_first_item_get(genlist),
+                              ELM_GENLIST_ITEM_SCROLLTO_IN);
+        if (is_down)
+            elm_object_focus_set(static_cast<Evas_Object *>(data), EINA_TRUE);
+    }
+    event->event_flags = static_cast<Evas_Event_Flags>(event->event_flags | EVAS_EVENT_FLAG_ON_HOLD);
+    return EINA_TRUE;
+}
+
 Elm_Object_Item *_velora_setup_page_push(Evas_Object *naviframe, Evas_Object *list, const char *button_id,
                                          Evas_Smart_Cb button_cb, Elm_Naviframe_Item_Pop_Cb back_cb, void *data)
 {
@@ -133,15 +169,29 @@ Elm_Object_Item *_velora_setup_page_push(Evas_Object *naviframe, Evas_Object *li
     elm_object_domain_translatable_text_set(button, VELORA_DOMAIN, button_id);
     evas_object_smart_callback_add(button, "clicked", button_cb, data);
     elm_object_item_part_content_set(item, "toolbar", button);
+    elm_object_event_callback_add(list, __list_key_cb, button);
+    elm_object_focus_set(list, EINA_TRUE);
     return item;
+}
+
+int _velora_setup_font_size(Evas_Object *widget, const char *font_class)
+{
+    char *font = nullptr;
+    int size = s_plain_text, width = 0, height = 0;
+    if (!ea_theme_font_get(font_class, &font, &size) || size <= 0)
+        size = s_plain_text;
+    std::free(font);
+    evas_output_size_get(evas_object_evas_get(widget), &width, &height);
+    const int shorter = static_cast<int>(std::min(width, height) / __scale());
+    if (shorter >= s_drawn_width)
+        return size;
+    const int more = s_plain_text * std::max(shorter - s_narrowest, 0) / (s_drawn_width - s_narrowest);
+    return std::min(size, s_plain_text + more);
 }
 
 static Evas_Object *__title_create(Evas_Object *layout, const char *text_id)
 {
-    char *font = nullptr;
-    int size = 0;
-    ea_theme_font_get("ATO007", &font, &size);
-    std::free(font);
+    const int size = _velora_setup_font_size(layout, "ATO007");
     Evas_Object *label = elm_label_add(layout);
     elm_label_line_wrap_set(label, ELM_WRAP_MIXED);
     char *text = g_strdup_printf("<align=center><font_size=%d>%s</font_size></align>", size, __text(text_id));
@@ -155,7 +205,7 @@ static Evas_Object *__title_create(Evas_Object *layout, const char *text_id)
 // What the words and a small picture need at least, at this width.
 static int __least_height(Evas_Object *label, int width)
 {
-    const double scale = elm_config_scale_get() / s_drawn_scale;
+    const double scale = __scale();
     constexpr int margins = 32, picture = 104; // as the groups have them
     int height = 0;
     edje_object_size_min_restricted_calc(elm_layout_edje_get(label), nullptr, &height,
@@ -174,8 +224,8 @@ Evas_Object *_velora_setup_illustration_create(Evas_Object *list, const char *gr
     int width = 0, room = 0;
     evas_object_geometry_get(list, nullptr, nullptr, &width, &room);
     int wanted = height * width / s_drawn_width;
-    if (room > 0) // where the page is wider than high it leaves room for what follows
-        wanted = std::min(wanted, width > room ? room * 3 / 5 : room);
+    if (room > 0) // what follows is to be seen too where the page is wider than high
+        wanted = std::min(wanted, width > room && elm_genlist_items_count(list) > 1 ? room * 3 / 5 : room);
     wanted = std::max(wanted, __least_height(label, width));
     evas_object_size_hint_min_set(layout, width, wanted);
     evas_object_size_hint_max_set(layout, width, wanted);

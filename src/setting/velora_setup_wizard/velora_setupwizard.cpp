@@ -11,6 +11,7 @@
 #include "velora_common/velora_paths.h"
 #include "velora_common/velora_popup.h"
 #include "velora_common/velora_setup_pages.h"
+#include "velora_common/velora_setup_row.h"
 #include <clocale>
 #include <cstdlib>
 #include <libintl.h>
@@ -24,6 +25,7 @@ struct WelcomeViewData {
     Evas_Object *words = nullptr; // in the scroller
     Evas_Object *disclaimer = nullptr;
     Evas_Object *bottom = nullptr;
+    Ecore_Job *fit_job = nullptr;
     std::string account; // whose name stands in the place of the buttons
     bool is_filled = false;
 };
@@ -32,6 +34,11 @@ static WelcomeViewData *s_vd;
 static const char s_disclaimer_topic[] = "disclaimer";
 static const char s_previous_id[] = "IDS_CLOUD_BUTTON_PREVIOUS", s_skip_id[] = "IDS_STU_BUTTON_SKIP";
 static constexpr int s_offered_gigabytes = 50;
+static constexpr double s_headline_scale = 1.25; // of what is said below it
+static constexpr int s_room_for_sign = 430;      // pixels of a screen 480 wide
+static constexpr double s_drawn_scale = 1.8;
+// Where the table of colours is missing: readable on light and on dark.
+static constexpr unsigned int s_plain_color = 0x80868E;
 
 static const char *__text(const char *id)
 {
@@ -58,6 +65,8 @@ static void __view_destroy(void *page)
     _velora_common_set_indicator_mode(vd->ad->conformant, INDICATOR_MODE_HEADER);
     if (vd->beeper)
         evas_object_del(vd->beeper);
+    if (vd->fit_job)
+        ecore_job_del(vd->fit_job);
     s_vd = nullptr;
     delete vd;
 }
@@ -92,17 +101,12 @@ static Eina_Bool __setup_wizard_back_cb(void *, Elm_Object_Item *)
 
 // Markup
 
-struct Font {
-    std::string name;
-    int size = 0;
-};
-
-static Font __font(const char *theme_code)
+static std::string __font(const char *theme_code)
 {
     char *name = nullptr;
-    Font font;
-    ea_theme_font_get(theme_code, &name, &font.size);
-    font.name = name ? name : "Sans";
+    int size = 0;
+    ea_theme_font_get(theme_code, &name, &size);
+    std::string font = name ? name : "Sans";
     std::free(name);
     return font;
 }
@@ -110,33 +114,35 @@ static Font __font(const char *theme_code)
 static unsigned int __color(const char *theme_code)
 {
     int r = 0, g = 0, b = 0, a = 0;
-    ea_theme_color_get(theme_code, &r, &g, &b, &a);
+    if (!ea_theme_color_get(theme_code, &r, &g, &b, &a))
+        return s_plain_color;
     return static_cast<unsigned int>((r << 16) + (g << 8) + b);
 }
 
 static Evas_Object *__label_create(Evas_Object *parent)
 {
     Evas_Object *label = elm_label_add(parent);
+    elm_object_style_set(label, "setupwizard"); // white: the colour is the markup's
     elm_label_line_wrap_set(label, ELM_WRAP_MIXED);
     return label;
 }
 
 static void __headline_set(Evas_Object *label, const char *text)
 {
-    const Font font = __font("ATO007");
+    const std::string font = __font("ATO007");
     char *markup = g_strdup_printf("<color=#%06x><align=center><font=%s text_class=ATO007><font_size=%d>%s</font_size>"
                                    "</font></align></color>",
-                                   __color("ATO007"), font.name.c_str(), font.size, text);
+                                   __color("ATO007"), font.c_str(), _velora_setup_font_size(label, "ATO007"), text);
     elm_object_text_set(label, markup);
     g_free(markup);
 }
 
 static void __user_name_set(Evas_Object *label, const char *user_name)
 {
-    const Font font = __font("ATO004");
+    const std::string font = __font("ATO004");
     char *name = elm_entry_utf8_to_markup(user_name);
     char *markup = g_strdup_printf("<align=center><font=%s text_class=ATO004><font_size=%d>%s</font_size></font></align>",
-                                   font.name.c_str(), font.size, name);
+                                   font.c_str(), _velora_setup_font_size(label, "ATO004"), name);
     elm_object_text_set(label, markup);
     ea_theme_object_color_set(label, "ATO004");
     g_free(markup);
@@ -145,13 +151,13 @@ static void __user_name_set(Evas_Object *label, const char *user_name)
 
 static void __disclaimer_set(Evas_Object *label)
 {
-    const Font font = __font("ATO004");
+    const std::string font = __font("ATO004");
     const unsigned int color = __color("ATO004");
     const char *text = __text("IDS_CLOUD_BODY_DISCLAIMER");
     char *markup = g_strdup_printf("<underline=on><underline_color=#%06x><color=#%06x><align=center><font=%s "
                                    "text_class=ATO004><font_size=%d>%s</font_size></font></align></color>"
                                    "</underline_color></underline>",
-                                   color, color, font.name.c_str(), font.size, text);
+                                   color, color, font.c_str(), _velora_setup_font_size(label, "ATO004"), text);
     elm_object_domain_translatable_text_set(label, VELORA_DOMAIN, markup);
     ea_screen_reader_name_set(label, text);
     g_free(markup);
@@ -307,13 +313,24 @@ static void __account_fill(WelcomeViewData *vd)
     __button_create(vd, "elm.swallow.btn1", "IDS_SA_BODY_CREATE_NEW_ACCOUNT_M_SIGN_UP", __create_account_btn_cb);
     __button_create(vd, "elm.swallow.btn2", "IDS_CLOUD_BUTTON_SIGN_IN", __sign_in_btn_cb);
     elm_layout_signal_emit(elm_object_part_content_get(vd->layout, "elm.swallow.btn1"), "platform,button,primary",
-                           "platform");
+                           "platform"); // of the two what a new phone is most likely to need
+}
+
+// Down the page, and on to the buttons at its bottom.
+static void __focus_chain_set(WelcomeViewData *vd)
+{
+    elm_object_focus_custom_chain_unset(vd->layout);
+    for (const char *part : {"elm.swallow.scroller", "elm.swallow.btn1", "elm.swallow.btn2", "elm.swallow.text2"})
+        if (Evas_Object *content = elm_object_part_content_get(vd->layout, part))
+            elm_object_focus_custom_chain_append(vd->layout, content, nullptr);
 }
 
 static void __page_shown_cb(void *, Evas *, Evas_Object *, void *)
 {
-    if (s_vd)
-        __account_fill(s_vd);
+    if (!s_vd)
+        return;
+    __account_fill(s_vd);
+    __focus_chain_set(s_vd);
 }
 
 // The page
@@ -337,6 +354,27 @@ static void __language_changed_cb(void *, Evas_Object *, void *)
         __texts_set(s_vd);
 }
 
+// Letters have the size that the window has room for; where it has little the sign gives way to the words.
+static void __fit_job(void *data)
+{
+    auto *vd = static_cast<WelcomeViewData *>(data);
+    vd->fit_job = nullptr;
+    __texts_set(vd);
+    if (!vd->account.empty())
+        __user_name_set(elm_object_part_content_get(vd->layout, "elm.swallow.btn1"), vd->account.c_str());
+    int height = 0;
+    evas_object_geometry_get(elm_object_part_content_get(vd->layout, "elm.swallow.scroller"), nullptr, nullptr, nullptr,
+                             &height);
+    const bool is_low = height < s_room_for_sign * elm_config_scale_get() / s_drawn_scale;
+    elm_layout_signal_emit(vd->words, is_low ? "velora,sign,hide" : "velora,sign,show", "velora");
+}
+
+static void __resized_cb(void *, Evas *, Evas_Object *, void *)
+{
+    if (s_vd && !s_vd->fit_job)
+        s_vd->fit_job = ecore_job_add(__fit_job, s_vd);
+}
+
 static void __beeper_create(WelcomeViewData *vd, const char *file)
 {
     vd->beeper = elm_layout_add(vd->ad->naviframe);
@@ -358,8 +396,10 @@ static void __words_create(WelcomeViewData *vd, const char *file)
     elm_layout_file_set(vd->words, file, "scroller_lite");
     evas_object_size_hint_weight_set(vd->words, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
     evas_object_size_hint_align_set(vd->words, EVAS_HINT_FILL, EVAS_HINT_FILL);
-    for (const char *part : {"elm.swallow.text0", "elm.swallow.text1"})
-        elm_object_part_content_set(vd->words, part, __label_create(vd->words));
+    Evas_Object *headline = __label_create(vd->words), *offer = __label_create(vd->words);
+    elm_object_scale_set(headline, s_headline_scale);
+    elm_object_part_content_set(vd->words, "elm.swallow.text0", headline);
+    elm_object_part_content_set(vd->words, "elm.swallow.text1", offer);
     elm_object_content_set(scroller, vd->words);
     elm_object_part_content_set(vd->layout, "elm.swallow.scroller", scroller);
 }
@@ -413,6 +453,9 @@ void _velora_setupwizard_view_create(AppData *ad)
     __disclaimer_create(vd);
     _velora_setup_page_add(ad, vd, __push(vd), __view_destroy);
     __texts_set(vd);
+    __focus_chain_set(vd);
+    elm_object_focus_set(elm_object_part_content_get(vd->layout, "elm.swallow.btn1"), EINA_TRUE);
     evas_object_smart_callback_add(vd->layout, "language,changed", __language_changed_cb, nullptr);
+    evas_object_event_callback_add(vd->layout, EVAS_CALLBACK_RESIZE, __resized_cb, nullptr);
     elm_access_highlight_set(spoken);
 }
