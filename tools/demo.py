@@ -17,7 +17,7 @@ from ways import signin as service  # noqa: E402
 
 OPERATION = "multi_share"
 NEW_EMAIL = "new.person@velora.example"
-CREATE, WIFI_ONLY, ENABLE, NEXT = "Create account", "Wi-Fi only", "Turn on camera upload", "Next"
+CREATE, WIFI_ONLY, ENABLE, NEXT = "Create new account", "Wi-Fi only", "Enable camera upload", "Next"
 PATHS = "http://orvant.com/appcontrol/data/path"
 REASONS = {  # the client's error codes, as in cloud_content_sync.h
     20: "the service cannot be reached", 21: "the service refuses the account", 22: "the service failed",
@@ -202,7 +202,7 @@ def last_things(device, pictures):
     settings = device.launch("account/configure")
     wait_for("the size of the storage", lambda: any(" / " in text for _, text, *_ in device.visible()))
     pictures.take("settings")
-    device.click("More", "Elm_Button")
+    device.click("More options", "Elm_Button")
     device.click("Remove")
     wait_for("the question", lambda: device.find("Cancel", "Elm_Button"))
     pictures.take("remove-account")

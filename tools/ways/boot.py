@@ -7,8 +7,8 @@ from ways.settings import configure, remove, stored_settings, told_and_left, upl
 from ways.signin import NEW_EMAIL, NEW_PASSWORD, accounts, allow, fill, nothing_left, one_account, page, sign_in
 from ways.steps import check, wait_for
 
-CREATE, SIGN_IN, PREVIOUS, SKIP = "Create account", "Sign in", "Previous", "Skip"
-ENABLE, NEXT = "Turn on camera upload", "Next"
+CREATE, SIGN_IN, PREVIOUS, SKIP = "Create new account", "Sign in", "Previous", "Skip"
+ENABLE, NEXT = "Enable camera upload", "Next"
 
 
 def boot(person):
