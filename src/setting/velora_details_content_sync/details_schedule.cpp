@@ -169,16 +169,21 @@ static Evas_Object *__choices_create(DetailsViewData *vd, Evas_Object *parent)
     return genlist;
 }
 
-// A list takes what it is given, and a table or a box works its least size out from what is in it: this gives it one.
-static Evas_Object *__height_create(Evas_Object *win)
+// A list takes what it is given, and a table works its least size out from what is in it: this gives it its height, as
+// much as all choices need when the window has it.
+static void __height_fit(Evas_Object *height, Evas_Object *genlist)
 {
-    constexpr double wanted = 288, most = 0.6; // pixels of the density that the pages are drawn for; of the window
-    int window = 0;
-    evas_object_geometry_get(win, nullptr, nullptr, nullptr, &window);
-    Evas_Object *height = evas_object_rectangle_add(evas_object_evas_get(win));
-    const double pixels = wanted * elm_config_scale_get() / elm_app_base_scale_get();
-    evas_object_size_hint_min_set(height, -1, static_cast<int>(std::min(pixels, window * most)));
-    return height;
+    constexpr double least = 288, most = 0.6; // pixels of the density that the pages are drawn for; of the window
+    int window = 0, needed = 0;
+    evas_object_geometry_get(elm_object_top_widget_get(genlist), nullptr, nullptr, nullptr, &window);
+    elm_scroller_child_size_get(genlist, nullptr, &needed);
+    const double wanted = std::max(least * elm_config_scale_get() / elm_app_base_scale_get(), 1.0 * needed);
+    evas_object_size_hint_min_set(height, 0, static_cast<int>(std::min(wanted, window * most)));
+}
+
+static void __realized_cb(void *data, Evas_Object *genlist, void *)
+{
+    __height_fit(static_cast<Evas_Object *>(data), genlist);
 }
 
 void __gl_sel_sync_schedule_cb(void *data, Evas_Object *, void *event_info)
@@ -198,8 +203,14 @@ void __gl_sel_sync_schedule_cb(void *data, Evas_Object *, void *event_info)
     evas_object_size_hint_weight_set(popup, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
     Evas_Object *table = elm_table_add(popup);
     evas_object_size_hint_weight_set(table, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
-    elm_table_pack(table, __height_create(vd->ad->win_main), 0, 0, 1, 1);
-    elm_table_pack(table, __choices_create(vd, table), 0, 0, 1, 1);
+    evas_object_size_hint_align_set(table, EVAS_HINT_FILL, EVAS_HINT_FILL);
+    Evas_Object *height = evas_object_rectangle_add(evas_object_evas_get(popup));
+    evas_object_size_hint_weight_set(height, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
+    elm_table_pack(table, height, 0, 0, 1, 1);
+    Evas_Object *genlist = __choices_create(vd, table);
+    elm_table_pack(table, genlist, 0, 0, 1, 1);
+    __height_fit(height, genlist);
+    evas_object_smart_callback_add(genlist, "realized", __realized_cb, height);
     elm_object_content_set(popup, table);
     evas_object_show(popup);
     _velora_popup_show(vd->ad, {vd, s_topic}, popup);
