@@ -134,6 +134,12 @@ static void __popup_back_cb(void *, Evas_Object *, void *)
         _velora_popup_take_away(s_vd->ad, {s_vd, s_topic});
 }
 
+static void __choice_say(Elm_Object_Item *item)
+{
+    const auto *row = static_cast<DetailsItemData *>(elm_object_item_data_get(item));
+    __details_row_say(item, row->index == row->vd->sync_schedule_value ? "IDS_VELORA_BODY_SELECTED" : "");
+}
+
 // The finished texts of the choices are in the language that they were made in.
 static void __language_changed_cb(void *, Evas_Object *genlist, void *)
 {
@@ -141,6 +147,7 @@ static void __language_changed_cb(void *, Evas_Object *genlist, void *)
         auto *row = static_cast<DetailsItemData *>(elm_object_item_data_get(item));
         g_free(row->text1);
         row->text1 = __schedule_text_get(row->index);
+        __choice_say(item);
     }
     elm_genlist_realized_items_update(genlist);
 }
@@ -156,13 +163,14 @@ static Evas_Object *__choices_create(DetailsViewData *vd, Evas_Object *parent)
     Evas_Object *group = elm_radio_add(genlist);
     elm_radio_state_value_set(group, 0);
     elm_radio_value_set(group, 0);
+    ea_screen_reader_name_set(group, __details_text("IDS_CLOUD_BODY_SYNC_SCHEDULE"));
     evas_object_data_set(genlist, "radio", group);
     VELORA_LOGI("vd->sync_schedule_value is [%d]", vd->sync_schedule_value);
     for (int i = 0; i < s_schedule_count; i++) {
         char *text = __schedule_text_get(i);
-        elm_genlist_item_append(genlist, vd->itc_1line,
-                                __create_genlist_item_data(i, vd, text, nullptr, "radio", DETAIL_ITEM_NONE), nullptr,
-                                ELM_GENLIST_ITEM_NONE, __sync_schedule_gl_sel_cb, vd);
+        __choice_say(elm_genlist_item_append(
+            genlist, vd->itc_1line, __create_genlist_item_data(i, vd, text, nullptr, "radio", DETAIL_ITEM_NONE),
+            nullptr, ELM_GENLIST_ITEM_NONE, __sync_schedule_gl_sel_cb, vd));
         g_free(text);
     }
     evas_object_show(genlist);
