@@ -46,6 +46,7 @@ static Evas_Object *__create_window(AppData *ad)
     elm_win_indicator_mode_set(win, ELM_WIN_INDICATOR_SHOW);
     // With the window, for a popup that scrolls is emptied by an extension that comes while it is open.
     elm_theme_extension_add(nullptr, _velora_common_app_file("res/edje/velora_genlist.edj").c_str());
+    elm_theme_extension_add(nullptr, _velora_common_app_file("res/edje/velora_setup_wizard.edj").c_str());
     __set_first_size(win);
     evas_object_show(win);
     ad->win_main = win;

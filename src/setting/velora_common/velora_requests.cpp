@@ -30,6 +30,8 @@ int _velora_request_add(AppData *ad, app_control_h request)
     Request one{.number = ++s_last_number};
     app_control_clone(&one.control, request);
     ad->app_control = one.control;
+    g_free(ad->reply_result); // of the request before
+    ad->reply_result = nullptr;
     s_requests.push_back(std::move(one));
     return s_last_number;
 }
