@@ -82,6 +82,9 @@ void __details_item_classes_free(DetailsViewData *vd);
 void __details_rows_append(DetailsViewData *vd);
 // Puts another text under a row's first.
 void __details_text2_set(Elm_Object_Item *row, const char *text);
+// What a screen reader says of a row that has a control: its name, which the theme's parts would say three times, and
+// with an id the control's state.
+void __details_row_say(Elm_Object_Item *item, const char *state_id);
 // Reads every setting again and shows what there is. Without an account nothing can be set.
 void __details_rows_read(DetailsViewData *vd);
 // Keeps a control of a row in the row's record, *slot, while the control lives.

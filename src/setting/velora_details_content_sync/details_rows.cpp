@@ -95,8 +95,22 @@ static bool __switch_write(const DetailsViewData *vd, int kind, bool state)
 
 // A tap on the row, or on the switch.
 
-static void __switch_show(DetailsItemData *row, bool state)
+void __details_row_say(Elm_Object_Item *item, const char *state_id)
 {
+    const auto *row = static_cast<DetailsItemData *>(elm_object_item_data_get(item));
+    std::string name = __details_text(row->text1);
+    if (*state_id)
+        name = name + ", " + __details_text(state_id);
+    ea_screen_reader_name_set(item, name.c_str());
+    Evas_Object *control = row->check ? row->check : row->radio;
+    if (control)
+        ea_screen_reader_name_set(control, __details_text(row->text1));
+}
+
+static void __switch_show(Elm_Object_Item *item, bool state)
+{
+    auto *row = static_cast<DetailsItemData *>(elm_object_item_data_get(item));
+    __details_row_say(item, state ? "IDS_VELORA_BODY_ON" : "IDS_VELORA_BODY_OFF");
     DetailsViewData *vd = row->vd;
     vd->is_setting = true;
     if (row->check && (elm_check_state_get(row->check) == EINA_TRUE) != state)
@@ -112,8 +126,9 @@ static void __switch_show(DetailsItemData *row, bool state)
 
 static void __detail_update_genlist_statue(DetailsItemData *row, DetailsViewData *vd, bool state)
 {
+    Elm_Object_Item *item = elm_genlist_nth_item_get(vd->genlist, static_cast<unsigned>(row->index));
     if (__switch_write(vd, row->kind, state))
-        __switch_show(row, __switch_read(vd, row->kind));
+        __switch_show(item, __switch_read(vd, row->kind));
     else
         __details_not_saved(vd);
 }
@@ -358,10 +373,13 @@ void __details_rows_read(DetailsViewData *vd)
     for (Elm_Object_Item *item = elm_genlist_first_item_get(vd->genlist); item;
          item = elm_genlist_item_next_get(item)) {
         auto *row = static_cast<DetailsItemData *>(elm_object_item_data_get(item));
-        if (row->kind == DETAIL_ITEM_NONE)
+        if (row->kind == DETAIL_ITEM_NONE) {
+            if (item != vd->storage_item && item != vd->schedule_item)
+                __details_row_say(item, "");
             continue;
+        }
         if (__switch_of(row->kind).companion)
             elm_object_item_disabled_set(item, !vd->account);
-        __switch_show(row, __switch_read(vd, row->kind));
+        __switch_show(item, __switch_read(vd, row->kind));
     }
 }

@@ -134,6 +134,12 @@ static void __popup_back_cb(void *, Evas_Object *, void *)
         _velora_popup_take_away(s_vd->ad, {s_vd, s_topic});
 }
 
+static void __choice_say(Elm_Object_Item *item)
+{
+    const auto *row = static_cast<DetailsItemData *>(elm_object_item_data_get(item));
+    __details_row_say(item, row->index == row->vd->sync_schedule_value ? "IDS_VELORA_BODY_SELECTED" : "");
+}
+
 // The finished texts of the choices are in the language that they were made in.
 static void __language_changed_cb(void *, Evas_Object *genlist, void *)
 {
@@ -141,6 +147,7 @@ static void __language_changed_cb(void *, Evas_Object *genlist, void *)
         auto *row = static_cast<DetailsItemData *>(elm_object_item_data_get(item));
         g_free(row->text1);
         row->text1 = __schedule_text_get(row->index);
+        __choice_say(item);
     }
     elm_genlist_realized_items_update(genlist);
 }
@@ -156,29 +163,35 @@ static Evas_Object *__choices_create(DetailsViewData *vd, Evas_Object *parent)
     Evas_Object *group = elm_radio_add(genlist);
     elm_radio_state_value_set(group, 0);
     elm_radio_value_set(group, 0);
+    ea_screen_reader_name_set(group, __details_text("IDS_CLOUD_BODY_SYNC_SCHEDULE"));
     evas_object_data_set(genlist, "radio", group);
     VELORA_LOGI("vd->sync_schedule_value is [%d]", vd->sync_schedule_value);
     for (int i = 0; i < s_schedule_count; i++) {
         char *text = __schedule_text_get(i);
-        elm_genlist_item_append(genlist, vd->itc_1line,
-                                __create_genlist_item_data(i, vd, text, nullptr, "radio", DETAIL_ITEM_NONE), nullptr,
-                                ELM_GENLIST_ITEM_NONE, __sync_schedule_gl_sel_cb, vd);
+        __choice_say(elm_genlist_item_append(
+            genlist, vd->itc_1line, __create_genlist_item_data(i, vd, text, nullptr, "radio", DETAIL_ITEM_NONE),
+            nullptr, ELM_GENLIST_ITEM_NONE, __sync_schedule_gl_sel_cb, vd));
         g_free(text);
     }
     evas_object_show(genlist);
     return genlist;
 }
 
-// A list takes what it is given, and a table or a box works its least size out from what is in it: this gives it one.
-static Evas_Object *__height_create(Evas_Object *win)
+// A list takes what it is given, and a table works its least size out from what is in it: this gives it its height, as
+// much as all choices need when the window has it.
+static void __height_fit(Evas_Object *height, Evas_Object *genlist)
 {
-    constexpr double wanted = 288, most = 0.6; // pixels of the density that the pages are drawn for; of the window
-    int window = 0;
-    evas_object_geometry_get(win, nullptr, nullptr, nullptr, &window);
-    Evas_Object *height = evas_object_rectangle_add(evas_object_evas_get(win));
-    const double pixels = wanted * elm_config_scale_get() / elm_app_base_scale_get();
-    evas_object_size_hint_min_set(height, -1, static_cast<int>(std::min(pixels, window * most)));
-    return height;
+    constexpr double least = 288, most = 0.6; // pixels of the density that the pages are drawn for; of the window
+    int window = 0, needed = 0;
+    evas_object_geometry_get(elm_object_top_widget_get(genlist), nullptr, nullptr, nullptr, &window);
+    elm_scroller_child_size_get(genlist, nullptr, &needed);
+    const double wanted = std::max(least * elm_config_scale_get() / elm_app_base_scale_get(), 1.0 * needed);
+    evas_object_size_hint_min_set(height, 0, static_cast<int>(std::min(wanted, window * most)));
+}
+
+static void __realized_cb(void *data, Evas_Object *genlist, void *)
+{
+    __height_fit(static_cast<Evas_Object *>(data), genlist);
 }
 
 void __gl_sel_sync_schedule_cb(void *data, Evas_Object *, void *event_info)
@@ -198,8 +211,14 @@ void __gl_sel_sync_schedule_cb(void *data, Evas_Object *, void *event_info)
     evas_object_size_hint_weight_set(popup, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
     Evas_Object *table = elm_table_add(popup);
     evas_object_size_hint_weight_set(table, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
-    elm_table_pack(table, __height_create(vd->ad->win_main), 0, 0, 1, 1);
-    elm_table_pack(table, __choices_create(vd, table), 0, 0, 1, 1);
+    evas_object_size_hint_align_set(table, EVAS_HINT_FILL, EVAS_HINT_FILL);
+    Evas_Object *height = evas_object_rectangle_add(evas_object_evas_get(popup));
+    evas_object_size_hint_weight_set(height, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
+    elm_table_pack(table, height, 0, 0, 1, 1);
+    Evas_Object *genlist = __choices_create(vd, table);
+    elm_table_pack(table, genlist, 0, 0, 1, 1);
+    __height_fit(height, genlist);
+    evas_object_smart_callback_add(genlist, "realized", __realized_cb, height);
     elm_object_content_set(popup, table);
     evas_object_show(popup);
     _velora_popup_show(vd->ad, {vd, s_topic}, popup);

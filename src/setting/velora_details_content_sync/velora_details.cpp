@@ -112,7 +112,7 @@ static void __window_focused_cb(void *data, Evas *, void *)
 static void __language_changed_cb(void *data, Evas_Object *genlist, void *)
 {
     auto *vd = static_cast<DetailsViewData *>(data);
-    __schedule_row_update(vd);
+    __details_rows_read(vd); // with what a screen reader says of them
     __update_server_storage_info(vd);
     elm_genlist_realized_items_update(genlist);
 }
