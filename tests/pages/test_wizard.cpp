@@ -4,7 +4,6 @@
 #include "upload_page.h"
 #include "velora_add_account_content_sync/signin_record.h"
 #include "velora_common/velora_account.h"
-#include <regex>
 
 namespace {
 
@@ -50,14 +49,16 @@ class Wizard : public UploadPage {
     // It is there, on a page that is not on its way in, for that one takes no clicks.
     static bool wait_shown(const std::string &text)
     {
-        return wait_for(
-            [&] {
-                const Evas_Object *found = shown(text), *one = found;
-                while (one && !evas_object_freeze_events_get(one))
-                    one = evas_object_smart_parent_get(one);
-                return found && !one;
-            },
-            5);
+        for (int i = 0; i < 100; i++) {
+            driver::settle(); // rows have their widgets once they are drawn
+            const Evas_Object *found = shown(text), *one = found;
+            while (one && !evas_object_freeze_events_get(one))
+                one = evas_object_smart_parent_get(one);
+            if (found && !one)
+                return true;
+            driver::run_until([] { return false; }, 0.05);
+        }
+        return false;
     }
     static bool tap(const std::string &text)
     {
@@ -232,4 +233,73 @@ TEST_F(Wizard, EachWayAnswersAsThePersonLeft)
         EXPECT_EQ(answers(), c.answers);
         EXPECT_EQ(settings(), c.settings);
     }
+}
+
+TEST_F(Wizard, TheDisclaimerOpensByATapAndByReturn)
+{
+    run([&] {
+        ASSERT_TRUE(step("open"));
+        Evas_Object *label = nullptr;
+        const auto opens = [&](const char *key, bool is_on_hold = false) {
+            elm_object_focus_set(label, EINA_TRUE);
+            Evas *evas = evas_object_evas_get(label);
+            evas_event_default_flags_set(evas, is_on_hold ? EVAS_EVENT_FLAG_ON_HOLD : EVAS_EVENT_FLAG_NONE);
+            driver::press(ad()->win_main, key);
+            evas_event_default_flags_set(evas, EVAS_EVENT_FLAG_NONE);
+            return ad()->popup && step("OK") && wait_for([] { return !ad()->popup; });
+        };
+        ASSERT_TRUE(step("Disclaimer"));
+        ASSERT_TRUE(step("OK"));
+        for (label = shown("Disclaimer"); !elm_object_widget_check(label);)
+            label = evas_object_smart_parent_get(label);
+        EXPECT_TRUE(opens("Return"));
+        EXPECT_TRUE(opens("KP_Enter"));
+        EXPECT_FALSE(opens("space"));
+        EXPECT_FALSE(opens("Return", true));
+        EXPECT_TRUE(driver::read_texts(ad()->win_main).find("50 GB") != std::string::npos);
+    });
+}
+
+TEST_F(Wizard, TheChoiceThatIsShownIsTheOneThatIsWritten)
+{
+    fake_cloud_sign_in("ann@example.com");
+    run([&] {
+        ASSERT_TRUE(step("open 2") && step("Wi-Fi only") && step(enable) && step("?Next"));
+        EXPECT_EQ(settings(), "on wifi");
+        Evas_Object *list = driver::find_widget(ad()->win_main, "elm_genlist");
+        const auto illustration_height = [&list] {
+            int height = 0;
+            evas_object_geometry_get(elm_object_item_part_content_get(elm_genlist_first_item_get(list), "elm.icon"),
+                                     nullptr, nullptr, nullptr, &height);
+            return height;
+        };
+        EXPECT_EQ(illustration_height(), 584); // in a window 480 pixels wide
+        ASSERT_TRUE(step("back") && step("?Upload via"));
+        list = driver::find_widget(ad()->win_main, "elm_genlist");
+        EXPECT_EQ(illustration_height(), 315);
+        Elm_Object_Item *any = elm_genlist_nth_item_get(list, 2);
+        const auto choice = [&] { // by both radios
+            driver::settle();
+            const auto is_on = [](Elm_Object_Item *row) {
+                Evas_Object *radio = elm_object_part_content_get(elm_object_item_part_content_get(row, "elm.icon.2"),
+                                                                 "elm.swallow.content");
+                return elm_radio_value_get(radio) == elm_radio_state_value_get(radio);
+            };
+            return std::string(is_on(any) ? "any" : "") + (is_on(elm_genlist_item_next_get(any)) ? "wifi" : "");
+        };
+        EXPECT_EQ(choice(), "wifi");
+        elm_genlist_realized_items_update(list);
+        EXPECT_EQ(choice(), "wifi");
+        ASSERT_TRUE(
+            driver::click(driver::find_widget(elm_object_item_part_content_get(any, "elm.icon.2"), "elm_radio")));
+        EXPECT_EQ(choice(), "any");
+        fake_cloud_sign_in(""); // another program
+        ASSERT_TRUE(step(enable) && step("?Upload via"));
+        EXPECT_TRUE(log.has("The setting could not be saved"));
+        elm_genlist_realized_items_update(list);
+        EXPECT_EQ(choice(), "any");
+        fake_cloud_sign_in("ann@example.com");
+        ASSERT_TRUE(step(enable) && step("?Next"));
+        EXPECT_EQ(settings(), "on any");
+    });
 }
