@@ -17,6 +17,7 @@ BUILDERS = {
     "_velora_common_create_one_text_popup_with_timer": "velora",
     "_velora_common_progressbar_layout_create": "velora",
     "_velora_common_create_bottom_buttons": "velora",
+    "__bar_button_create": "velora-share",
     "_velora_common_create_processing_popup_with_cancel": "velora-share",
 }
 STRING = r'"((?:[^"\\]|\\.)*)"'

@@ -35,8 +35,9 @@ class Account {
     // account_identity() of who is signed in; empty when nobody is.
     std::string identity() const;
     // Stores the credentials; null: nobody is signed in any more. What is kept of another account goes, but for its
-    // settings; with null those of the account that was signed in go as well. False when they cannot be stored, or what is kept cannot be removed for null: whoever was signed in is
-    // so still. *former, which may be null, is who that was; its secret is empty when it is not to be had.
+    // settings; with null those of the account that was signed in go as well. False when they cannot be stored, or what
+    // is kept cannot be removed for null: whoever was signed in is so still. *former, which may be null, is who that
+    // was; its secret is empty when it is not to be had.
     bool sign_in(const Credentials *credentials, std::optional<Credentials> *former = nullptr);
     // Does `work` while nobody can sign in or out, in a transaction of the database that its result ends. False, and
     // nothing done, when `who`, an identity, is not signed in.

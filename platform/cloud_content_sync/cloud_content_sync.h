@@ -239,8 +239,8 @@ int cloud_content_sync_deactivate(cloud_content_sync_h handle, cloud_content_syn
 int cloud_content_sync_auth_abandon(cloud_content_sync_h handle, cloud_content_sync_status_cb cb, void *user_data);
 // Ends the request of this section that runs, which then has no callback. No callback of it runs any more on return:
 // one that is running is waited for, unless this is called from within it. An activation that has stored its
-// credentials is not undone, nor a deactivation or abandonment that was asked for. A sign-in that is under way stays so. NOT_FOUND when
-// there is none.
+// credentials is not undone, nor a deactivation or abandonment that was asked for. A sign-in that is under way stays
+// so. NOT_FOUND when there is none.
 int cloud_content_sync_auth_cancel(cloud_content_sync_h handle);
 
 // The address of the account that is signed in, "" where it is not known. NO_ACCOUNT when nobody is. Reads a file.

@@ -14,7 +14,7 @@ struct DavEntry {
     long long mtime = 0; // seconds since 1970; 0: the service did not say
     std::string etag;
     long long quota_used = -1, quota_left = -1; // bytes; -1: the service did not say
-    std::string sha256; // lower-case hexadecimal digits, or empty
+    std::string sha256;                         // lower-case hexadecimal digits, or empty
 };
 
 // The body of a PROPFIND for what DavEntry holds; the digest only when it is asked for, for it may cost the service

@@ -2,10 +2,10 @@
 // the pages are stand-ins that write down that they were opened.
 #include "application.h"
 #include "posted.h"
+#include "velora_add_account_content_sync_setup_wizard/velora_signin_setupwizard.h"
 #include "velora_common/velora_current_popup.h"
 #include "velora_common/velora_pages.h"
 #include "velora_common/velora_requests.h"
-#include "velora_add_account_content_sync_setup_wizard/velora_signin_setupwizard.h"
 #include "velora_common/velora_upload_item.h"
 #include "velora_details_content_sync/velora_details.h"
 #include "velora_setup_wizard/velora_setupwizard.h"

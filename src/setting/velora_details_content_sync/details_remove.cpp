@@ -6,7 +6,7 @@
 #include "velora_common/velora_popup.h"
 #include "velora_common/velora_signout.h"
 #include "velora_details_content_sync/details_record.h"
-#include "velora_upload_file/velora_upload_view.h"
+#include "velora_upload_file/velora_upload_account.h"
 #include <cstdio>
 
 static const char s_topic[] = "remove account";

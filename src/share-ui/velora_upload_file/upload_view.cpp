@@ -28,6 +28,7 @@
 #include "velora_upload_file/upload_thumbnails.h"
 #include "velora_upload_file/upload_waiting.h"
 #include "velora_upload_file/upload_worker.h"
+#include "velora_upload_file/velora_upload_account.h"
 #include "velora_upload_file/velora_upload_view.h"
 
 UploadViewData *s_vd = nullptr;
