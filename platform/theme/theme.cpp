@@ -54,7 +54,8 @@ struct Letters {
     int plain;      // the size that the palette gives
     int wanted = 0; // what the program has set, or nothing
     int given = 0;  // what this file has made of it
-} letters[] = {{"ui.title", 30}, {"ui.body", 26}, {"ui.caption", 22}, {"ui.bar.title", 30}, {"ui.bar.button", 26}};
+} letters[] = {{"ui.title", 30}, {"ui.body", 26},      {"ui.caption", 22},   {"ATO007", 28},
+               {"ATO004", 24},   {"ui.bar.title", 30}, {"ui.bar.button", 26}};
 
 // Large letters in a narrow window leave a row two of them, and in a low one no row: they grow less there.
 bool bound_letters(int shorter_side)

@@ -181,6 +181,7 @@ void settings_schedule(Evas_Object *win)
     expand(table);
     Evas_Object *height = evas_object_rectangle_add(evas_object_evas_get(win));
     evas_object_size_hint_min_set(height, 0, ELM_SCALE_SIZE(288));
+    evas_object_size_hint_weight_set(height, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
     elm_table_pack(table, height, 0, 0, 1, 1);
     Evas_Object *list = list_add(table, schedule_rows);
     if (!elm_object_style_set(list, "popup"))

@@ -1,6 +1,7 @@
 // What the themes promise of sizes, measured as a list measures its rows.
 #include "driver.h"
 #include <gtest/gtest.h>
+#include <string>
 
 namespace {
 constexpr struct {
@@ -38,6 +39,35 @@ TEST(Rows, OfOneFileHaveOneHeight)
             EXPECT_EQ(heights[1], heights[0]) << percent << " percent, scale " << scale;
             EXPECT_EQ(heights[2], heights[0]) << percent << " percent, scale " << scale;
         }
+    evas_object_del(window);
+}
+
+// The list asks for one text under three names, uses the objects of a row for another, and says only which texts are
+// there.
+TEST(Rows, ShowTheirWordsOnceAndKeepTheirHeight)
+{
+    driver::start();
+    Evas_Object *window = elm_win_add(nullptr, "rows", ELM_WIN_BASIC), *row = edje_object_add(window);
+    ASSERT_TRUE(edje_object_file_set(row, PLATFORM_EDJ, "elm/genlist/item/1line/default"));
+    constexpr const char *names[] = {"elm.text.main", "elm.text.multiline",
+                                     "elm.text.main.left"}; // in the list's order
+    int first = 0, width = 0;
+    for (const int given : {7, 1, 6, 2, 1, 4, 3, 5, 1}) {
+        int shown = 0, height = 0;
+        for (int i = 0; i < 3; i++) {
+            edje_object_part_text_set(row, names[i], given & 1 << i ? "Camera upload" : "");
+            if (given & 1 << i)
+                edje_object_signal_emit(row, (std::string("elm,state,") + names[i] + ",visible").c_str(), "elm");
+        }
+        edje_object_signal_emit(row, given & 1 ? "elm,state,top" : "elm,state,bottom", "");
+        edje_object_message_signal_process(row);
+        for (int i = 0; i < 3; i++)
+            shown += given & 1 << i && std::string(edje_object_part_state_get(row, names[i], nullptr)) == "default";
+        edje_object_size_min_restricted_calc(row, &width, &height, 480, 0);
+        first = first ? first : height;
+        EXPECT_EQ(shown, 1) << given;
+        EXPECT_EQ(height, first) << given;
+    }
     evas_object_del(window);
 }
 } // namespace
