@@ -291,7 +291,8 @@ class Propfind : public std::enable_shared_from_this<Propfind> {
             value = std::to_string(quota_left);
             return !file;
         case Live::QUOTA_USED:
-            value = std::to_string(request.account->stored());
+            // With what uploads may still add, so that used and left make one sum while they run.
+            value = std::to_string(request.account->stored() + request.account->reserved);
             return !file;
         case Live::SHA256:
             value = digest;

@@ -11,9 +11,13 @@ import tempfile
 import time
 
 sys.path.insert(0, os.path.dirname(os.path.abspath(__file__)))
-from device import APP, Device, Trouble, wait_for  # noqa: E402
+import first_boot as wizard_page  # noqa: E402
+from device import APP, PASSWORD, Device, Trouble, wait_for  # noqa: E402
+from ways import signin as service  # noqa: E402
 
 OPERATION = "multi_share"
+NEW_EMAIL = "new.person@velora.example"
+CREATE, WIFI_ONLY, ENABLE, NEXT = "Create new account", "Wi-Fi only", "Enable camera upload", "Next"
 PATHS = "http://orvant.com/appcontrol/data/path"
 REASONS = {  # the client's error codes, as in cloud_content_sync.h
     20: "the service cannot be reached", 21: "the service refuses the account", 22: "the service failed",
@@ -59,6 +63,12 @@ class Pictures:
             self.folder = tempfile.mkdtemp(prefix="velora-pictures-")
         for old in os.listdir(self.folder):
             os.unlink(os.path.join(self.folder, old))
+
+    def take_at(self, name, button):
+        """Once this button is there and the page has come to rest."""
+        wait_for(f'"{button}"', lambda: self.device.find(button, "Elm_Button"), 60)
+        time.sleep(0.6)
+        self.take(name)
 
     def take(self, name):
         self.count += 1
@@ -127,9 +137,10 @@ def report(device, files, before):
     with open(device.log, encoding="utf-8", errors="surrogateescape") as log:
         errors = {path: int(code) for code, path in re.findall(r"upload failed\[(\d+)\]: \[(.*)\]$", log.read(), re.M)}
     places = {}
-    for place in sorted(device.all_files() - before):
-        with device.get(place) as stream:
-            places.setdefault(digest(stream), []).append(place)
+    for stored, place in sorted(device.stored_files().items()):
+        if stored not in before:
+            with open(stored, "rb") as stream:
+                places.setdefault(digest(stream), []).append(place)
     whole = True
     for path in files:
         error = errors.get(escaped(path))
@@ -156,14 +167,62 @@ def leave(device, pictures):
         device.key("Escape")
 
 
-def prepare(device, folder, headless):
+def first_boot(device, pictures):
+    """The first-boot wizard comes to the application's page; headless, an account is made there."""
+    say("wizard  page 2 of 3 is Velora's")
+    if not pictures:
+        say("        make an account there: any address and any password of 8 characters and more will do")
+    application = device.start_application()
+    wizard = device.start([device.program("platform/app/velora-launch"), *wizard_page.REQUEST], stdout=subprocess.PIPE)
+    if pictures:
+        pictures.take_at("welcome", CREATE)
+        device.click(CREATE, "Elm_Button")
+        service.page(device, "Create an account")
+        pictures.take("register")
+        service.fill(device, "E-mail address", NEW_EMAIL)
+        service.fill(device, "Password", PASSWORD)
+        device.click("Create an account", "page:button")
+        service.page(device, "Connect this device?")
+        pictures.take("connect-this-device")
+        device.click("Allow", "page:button")
+        pictures.take_at("camera-upload", ENABLE)
+        device.click(WIFI_ONLY)
+        device.click(ENABLE, "Elm_Button")
+        pictures.take_at("camera-upload-enabled", NEXT)
+        device.click(NEXT, "Elm_Button")
+    wizard.wait()
+    for line in wizard_page.told(wizard.stdout.read().decode().strip()):
+        say(line)
+    application.wait(30)
+
+
+def last_things(device, pictures):
+    """The account's settings, and its removal."""
+    application = device.start_application()
+    settings = device.launch("account/configure")
+    wait_for("the size of the storage", lambda: any(" / " in text for _, text, *_ in device.visible()))
+    pictures.take("settings")
+    device.click("More options", "Elm_Button")
+    device.click("Remove")
+    wait_for("the question", lambda: device.find("Cancel", "Elm_Button"))
+    pictures.take("remove-account")
+    device.click("Remove", "Elm_Button")
+    pictures.take_at("signed-out", "OK")
+    device.click("OK", "Elm_Button")
+    application.wait(30)
+    settings.wait(30)
+    say("removed the account from this phone; its files are still in the cloud")
+
+
+def prepare(device, folder, headless, new_phone):
     """The service with the account, the display and the bus."""
     # In pictures the uploads of small files would be over before they can be seen.
     device.start_service(*(["--delay", "60"] if headless else []))
     say(f"velora-cloud: {device.web}/  files: {device.data}/files")
-    for place in ("/Documents", "/Photos/Holidays", "/Photos/Family & friends", folder):
-        device.make_folder(place)
-    device.sign_in()
+    if not new_phone:
+        for place in ("/Documents", "/Photos/Holidays", "/Photos/Family & friends", folder):
+            device.make_folder(place)
+        device.sign_in()
     if headless:
         device.start_display()
     if headless or "DBUS_SESSION_BUS_ADDRESS" not in device.env or device.is_on_bus(APP):
@@ -179,9 +238,10 @@ def main():
     parser.add_argument("--data")
     parser.add_argument("--to")
     parser.add_argument("--headless", action="store_true")
+    parser.add_argument("--new-phone", action="store_true")
     parser.add_argument("files", nargs="*")
     options = parser.parse_args()
-    folder = options.to or "/Photos/Holidays"
+    folder = options.to or ("/" if options.new_phone else "/Photos/Holidays")  # a new account has no folders
 
     # However it is ended, nothing stays behind.
     for number in (signal.SIGTERM, signal.SIGHUP):
@@ -194,14 +254,16 @@ def main():
             device.end()
             options.headless = True
             device = Device(os.path.abspath(options.build), options.data, secure=True)
-        prepare(device, folder, options.headless)
+        prepare(device, folder, options.headless, options.new_phone)
         files = [os.path.abspath(file) for file in options.files] or sample_pictures(device)
-        before = device.all_files()
+        before = set(device.stored_files())
+        pictures = Pictures(device) if options.headless else None
+        if options.new_phone:
+            first_boot(device, pictures)
         application = device.start_application()
         say(f"sharing {len(files)} file{'s' if len(files) != 1 else ''} to "
             + (folder if options.headless else "your choice"))
         launch = device.launch(OPERATION, "--array", PATHS, *files)
-        pictures = Pictures(device) if options.headless else None
         if pictures:
             operate(device, pictures, folder)
             follow_upload(device, pictures, application, launch)
@@ -213,6 +275,8 @@ def main():
             launch.wait()
         whole = report(device, files, before)
         say(launch.stdout.read().decode().strip() or "no reply")
+        if pictures and options.new_phone:
+            last_things(device, pictures)
         if pictures:
             say(f"pictures: {pictures.folder}")
         return 0 if whole and launch.returncode == 0 else 1

@@ -40,6 +40,7 @@ class Device:
     def __init__(self, build, data=None, size="480x800", language=None, scale=None, dark=False,
                  keep_display=False, maximized=True, secure=False):
         self.build, self.size, self.maximized, self.secure = build, size, maximized, secure
+        self.width = int(size.split("x")[0])
         self.home = tempfile.mkdtemp(prefix="velora-")
         self.data = data or os.path.join(self.home, "cloud")
         self.processes = []
@@ -157,7 +158,7 @@ class Device:
         if not shutil.which("dunst"):
             return
         rules = os.path.join(self.home, "dunstrc")
-        width = int(self.size.split("x")[0]) - 32
+        width = self.width - 32
         with open(rules, "w", encoding="utf-8") as file:
             file.write(f"[global]\nwidth = {width}\norigin = top-center\noffset = 0x16\nfont = Sans 12\n"
                        "frame_width = 1\ncorner_radius = 8\nmax_icon_size = 48\nshow_indicators = no\n"
@@ -258,6 +259,16 @@ class Device:
         top = os.path.join(self.data, "files", EMAIL)
         return {os.path.join("/", os.path.relpath(os.path.join(folder, name), top))
                 for folder, _, names in os.walk(top) for name in names}
+
+    def stored_files(self):
+        """{local path: cloud path} of all files of all accounts."""
+        top = os.path.join(self.data, "files")
+        found = {}
+        for folder, _, names in os.walk(top):
+            for name in names:
+                local = os.path.join(folder, name)
+                found[local] = "/" + "/".join(os.path.relpath(local, top).split("/")[1:])
+        return found
 
     # the application
 

@@ -1,12 +1,14 @@
 // The shell: which page a request opens, and who is answered at the end. Each case is a whole run of the application;
 // the pages are stand-ins that write down that they were opened.
 #include "application.h"
-#include "main/velora_pending_pages.h"
 #include "posted.h"
 #include "velora_common/velora_current_popup.h"
 #include "velora_common/velora_pages.h"
 #include "velora_common/velora_requests.h"
+#include "velora_add_account_content_sync_setup_wizard/velora_signin_setupwizard.h"
 #include "velora_common/velora_upload_item.h"
+#include "velora_details_content_sync/velora_details.h"
+#include "velora_setup_wizard/velora_setupwizard.h"
 #include "velora_upload_file/velora_upload_view.h"
 
 #include <algorithm>
@@ -61,7 +63,6 @@ void _velora_upload_view_create(AppData *ad)
 {
     page_opened("upload", ad);
 }
-void _velora_pending_page_end(AppData *) {}
 void _velora_upload_view_keep_waiting(AppData *) {}
 void _velora_upload_view_meta_done() {}
 
@@ -107,14 +108,16 @@ TEST_F(Shell, OpensThePageThatARequestIsFor)
         int mode;
         std::vector<std::string> queue;
     } cases[] = {
-        {{}, false, "details", 0, {}},
-        {{.launch_mode = "velora_signin"}, false, "details", 4, {}},
+        {{}, true, "details", 0, {}},
+        {{}, false, "sign-in", 1, {}},
+        {{.launch_mode = "velora_signin"}, true, "details", 4, {}},
         {{.launch_mode = "Velora_Signin"}, true, "sign-in", 1, {}},
         {{.launch_mode = wizard}, false, "welcome", 2, {}},
         {{.launch_mode = "Setup_Wizard_Velora_Signin2"}, false, "camera upload", 3, {}},
         {{.operation = "http://example.com/other", .launch_mode = "Velora_Signin"}, false, "sign-in", 1, {}},
         {{.operation = add, .launch_mode = "Velora_Details"}, true, "sign-in", 5, {}},
-        {{.operation = configure}, false, "details", 6, {}},
+        {{.operation = configure}, true, "details", 6, {}},
+        {{.operation = configure}, false, "sign-in", 1, {}},
         {{.operation = share, .uri = "file:///a/b.jpg"}, true, "upload", 7, {"/a/b.jpg"}},
         {{.operation = share, .uri = "/a/b 100%.jpg"}, true, "upload", 7, {"/a/b 100%.jpg"}},
         {{.operation = share, .uri = "/a"}, false, "sign-in", 7, {"/a"}},

@@ -4,6 +4,7 @@
 #include "velora_add_account_content_sync/signin_record.h"
 #include "velora_common/velora_account.h"
 #include "velora_common/velora_pages.h"
+#include "velora_details_content_sync/details_record.h"
 
 namespace {
 
@@ -88,8 +89,20 @@ class Signin : public UploadPage {
     static bool upload()
     {
         for (int i = 0; i < 20; i++)
-            if (press_done() && wait_for([] { return s_vd->phase != PHASE_BROWSING; }, 0.5))
+            if (UploadPage::press_done() && wait_for([] { return s_vd->phase != PHASE_BROWSING; }, 0.5))
                 return true;
+        return false;
+    }
+    // Done of the settings that follow a sign-in.
+    static bool press_done()
+    {
+        const auto is_there = [] { return !signin::s_vd && details::s_vd; };
+        for (int i = 0; i < 40 && wait_for(is_there); i++) {
+            Evas_Object *bar = elm_object_item_part_content_get(details::s_vd->nf_item, "toolbar");
+            driver::click(driver::find_text(bar, "Done")); // in vain while the page is on its way in
+            if (wait_for([&] { return !is_there(); }, 0.2))
+                return true;
+        }
         return false;
     }
     static void approve()
@@ -129,12 +142,11 @@ TEST_F(Signin, MakesAnAccountAndGoesOn)
         const char *name;
         Wish wish;
         Texts files;
-        const char *next; // what is on screen then
     } cases[] = {
-        {"settings", {.operation = APP_CONTROL_OPERATION_ACCOUNT_ADD}, {}, "To upload files"},
-        {"launch mode", {.launch_mode = "Velora_Signin"}, {}, "To upload files"},
-        {"icon", {}, {}, "To upload files"},
-        {"share", {.operation = APP_CONTROL_OPERATION_MULTI_SHARE}, {"a.txt", "b.txt"}, "Upload to"},
+        {"settings", {.operation = APP_CONTROL_OPERATION_ACCOUNT_ADD}, {}},
+        {"launch mode", {.launch_mode = "Velora_Signin"}, {}},
+        {"icon", {}, {}},
+        {"share", {.operation = APP_CONTROL_OPERATION_MULTI_SHARE}, {"a.txt", "b.txt"}},
     };
     for (const auto &c : cases) {
         SCOPED_TRACE(c.name);
@@ -157,10 +169,11 @@ TEST_F(Signin, MakesAnAccountAndGoesOn)
             driver::settle();
             EXPECT_EQ(accounts(), somebody);
             EXPECT_EQ(fake_ewk::live_views(), 0);
-            EXPECT_NE(driver::read_texts(app->win_main).find(c.next), std::string::npos);
-            ASSERT_EQ(s_vd != nullptr, !c.files.empty());
-            if (!s_vd)
+            ASSERT_TRUE(press_done());
+            if (c.files.empty()) {
+                EXPECT_TRUE(is_left());
                 return;
+            }
             ASSERT_TRUE(upload());
             ASSERT_TRUE(wait_for(is_over));
             EXPECT_EQ(rows(), (Texts{"uploaded a.txt", "uploaded b.txt"}));
@@ -362,7 +375,7 @@ TEST_F(Signin, OtherRequestsInTheMiddleLoseNothing)
             ASSERT_TRUE(is_page_there());
             EXPECT_EQ(fake_ewk::live_views(), 1);
             approve();
-            ASSERT_TRUE(wait_for([] { return !signin::s_vd && s_vd; }));
+            ASSERT_TRUE(press_done());
             ASSERT_TRUE(upload());
             ASSERT_TRUE(wait_for(is_over));
             EXPECT_EQ(rows().size(), 2u);
@@ -384,7 +397,7 @@ TEST_F(Signin, GivenUpAndAskedForAtOnceBeginsAnew)
         fake_cloud_hold(false);
         ASSERT_TRUE(is_page_there());
         approve();
-        ASSERT_TRUE(wait_for([] { return !signin::s_vd && s_vd; }));
+        ASSERT_TRUE(press_done());
         ASSERT_TRUE(upload());
         ASSERT_TRUE(wait_for(is_over));
         EXPECT_EQ(rows(), Texts{"uploaded b.txt"});
@@ -451,7 +464,8 @@ TEST_F(Signin, FilesThatARevokedTokenStoppedGoOnAfterwards)
         fake_cloud_sign_in(""); // another program: the next share finds no account and joins
         share({"d.txt"});
         approve();
-        ASSERT_TRUE(wait_for([] { return !signin::s_vd && __state_shown(s_vd) == VIEW_STATE_NONE; }));
+        ASSERT_TRUE(press_done());
+        ASSERT_TRUE(wait_for([] { return __state_shown(s_vd) == VIEW_STATE_NONE; }));
         ASSERT_TRUE(upload());
         ASSERT_TRUE(wait_for(is_over));
         EXPECT_EQ(rows(), (Texts{"uploaded c.txt", "uploaded d.txt"}));

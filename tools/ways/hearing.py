@@ -8,6 +8,9 @@ from ways.steps import check, wait_for
 CONTROLS = ("push button", "list item", "menu item", "check box", "progress bar", "page tab", "entry", "password text", "link")
 
 
+CHECKED = 4  # ATSPI_STATE_CHECKED
+
+
 class Reader:
     def __init__(self, person):
         self.person = person
@@ -31,6 +34,23 @@ class Reader:
         for child in re.findall(r"\('([^']*)', (?:objectpath )?'([^']*)'\)", children):
             found += self.walk(child)
         return found
+
+    def find(self, role, name, where=("org.a11y.atspi.Registry", "/org/a11y/atspi/accessible/root")):
+        """The first of this role and name, as its place; None when there is none."""
+        if self.ask(where, "org.a11y.atspi.Accessible.GetRoleName").split("'")[1] == role and \
+                self.ask(where, "org.freedesktop.DBus.Properties.Get", "org.a11y.atspi.Accessible",
+                         "Name").strip()[3:-4] == name:
+            return where
+        children = self.ask(where, "org.a11y.atspi.Accessible.GetChildren")
+        return next((found for child in re.findall(r"\('([^']*)', (?:objectpath )?'([^']*)'\)", children)
+                     if (found := self.find(role, name, child))), None)
+
+    def is_checked(self, name):
+        """Whether the check box is heard as checked."""
+        place = self.find("check box", name)
+        check(place, f"no check box {name!r}: {self.walk()!r}")
+        states = self.ask(place, "org.a11y.atspi.Accessible.GetState")
+        return bool(int(re.search(r"\[(?:uint32 )?(\d+)", states).group(1)) & 1 << CHECKED)
 
     def hears(self, *wanted):
         heard = self.walk()

@@ -63,6 +63,13 @@ def nothing_left(person):
     return "no record, no credentials, no token"
 
 
+def settings(person, press="Done"):
+    """The account's settings, which a sign-in leads to, are left by this button."""
+    person.sees("Storage usage", "Camera upload")
+    one_account(person)
+    person.click(press, "Elm_Button")
+
+
 def one_account(person):
     found = accounts(person)
     check(found == (1, 1, 1), f"there are (records, credentials, tokens) {found}")
@@ -89,8 +96,8 @@ def share(tour):
         fill(person, "Password", PASSWORD)
         person.click("Sign in", "page:button")
         allow(person)
+        settings(person)
         person.sees("Upload to", "Photos")
-        one_account(person)
 
     tour.step("a share without an account opens the sign-in", lambda: (person.share(path), page(person, "Sign in")))
     tour.step("a wrong password", wrong)
@@ -123,18 +130,18 @@ def keys(tour):
     def approve():
         tab_to(person, "Allow")
         person.key("Return")
-        person.sees("To upload files")
+        person.sees("Storage usage")
         one_account(person)
 
     def leave():
-        tour.go_to("OK", ("Tab",))
+        tour.go_to("Done", ("Tab",))
         person.key("Return")
         return person.ends()
 
     tour.step("the account settings open the sign-in", add_account, person)
     tour.step("address and password, by keys", type_in)
     tour.step("allowed", approve)
-    tour.step("OK leaves", leave)
+    tour.step("Done leaves", leave)
 
 
 def register(tour):
@@ -152,9 +159,7 @@ def register(tour):
         fill(person, "Password", NEW_PASSWORD)
         person.click("Create an account", "page:button")
         allow(person)
-        person.sees("To upload files")
-        one_account(person)
-        person.click("OK", "Elm_Button")
+        settings(person)
         check(person.application.wait(20) == 0, "it ended with an error")
 
     def share_one():
@@ -259,6 +264,7 @@ def trouble(tour):
         person.click("Try again", "Elm_Button")
         sign_in(person)
         allow(person)
+        settings(person)
         uploaded(person, path)
         person.leave()
         stored(person, {"one.txt": path})
@@ -285,9 +291,7 @@ def certificate(tour):
         add_account(person)
         sign_in(person)
         allow(person)
-        person.sees("To upload files")
-        one_account(person)
-        person.click("OK", "Elm_Button")
+        settings(person)
         return person.ends()
 
     tour.step("the right certificate: signed in over TLS", trusted)
@@ -302,6 +306,7 @@ def thirty(tour):
         person.request = person.launch("account/add")
         sign_in(person)
         allow(person)
+        settings(person)
         wait_for("the folders again", lambda: person.find("Done", "Elm_Button") and person.find("Photos") and
                  not web_processes(person), 30)
 
@@ -361,9 +366,10 @@ def reader(tour):
         tab_to(person, "Allow")
         spoken("Allow")
         person.key("Return")
-        person.sees("To upload files")
+        person.sees("Storage usage")
         one_account(person)
-        person.key("Escape")
+        tour.go_to("Done", ("Tab",))
+        person.key("Return")
         return person.ends()
 
     tour.step("the page", first)

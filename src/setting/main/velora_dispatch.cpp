@@ -1,14 +1,16 @@
 // Which page a launch request opens.
 #include "account/account.h"
-#include "main/velora_pending_pages.h"
 #include "main/velora_shell.h"
 #include "velora_add_account_content_sync/velora_signin.h"
+#include "velora_add_account_content_sync_setup_wizard/velora_signin_setupwizard.h"
 #include "velora_common/velora_account.h"
 #include "velora_common/velora_log.h"
 #include "velora_common/velora_network.h"
 #include "velora_common/velora_pages.h"
 #include "velora_common/velora_requests.h"
 #include "velora_common/velora_upload_item.h"
+#include "velora_details_content_sync/velora_details.h"
+#include "velora_setup_wizard/velora_setupwizard.h"
 #include "velora_upload_file/velora_upload_view.h"
 #include <cstdlib>
 #include <cstring>
@@ -134,13 +136,10 @@ static bool __dispatch_share(AppData *ad)
         __queue_shared(ad, held);
         _velora_request_held_taken();
     }
-    if (__velora_account_exists() == 0) {
-        _velora_pending_page_end(ad);
+    if (__velora_account_exists() == 0)
         _velora_upload_view_create(ad);
-    } else {
-        _velora_pending_page_end(ad);
+    else
         _velora_signin_create(ad, 1);
-    }
     return true;
 }
 
@@ -151,7 +150,6 @@ static void __dispatch_upload_result(AppData *ad, app_control_h request)
         return;
     }
     ad->launch_mode = LAUNCH_MODE_UPLOAD_RESULT;
-    _velora_pending_page_end(ad);
     _velora_upload_view_keep_waiting(ad);
     _velora_upload_list_free(&ad->upload_list);
     char **paths = nullptr;
@@ -168,6 +166,19 @@ static void __dispatch_upload_result(AppData *ad, app_control_h request)
     _velora_upload_view_create(ad);
 }
 
+// A tap on the icon brings what is open to the front, which says more. Without an account there are no settings yet.
+static void __dispatch_details(AppData *ad)
+{
+    if (ad->launch_mode == LAUNCH_MODE_NONE && !_velora_pages_are_empty()) {
+        _velora_request_finish(ad, _velora_request_last());
+    } else if (__velora_account_exists() == 0) {
+        _velora_details_create(ad);
+    } else {
+        ad->launch_mode = LAUNCH_MODE_SIGNIN;
+        _velora_signin_create(ad, 1);
+    }
+}
+
 static void __dispatch_default(AppData *ad, app_control_h request)
 {
     ad->launch_mode = __velora_read_launch_mode(request);
@@ -182,7 +193,7 @@ static void __dispatch_default(AppData *ad, app_control_h request)
         _velora_signin_create(ad, 1);
         break;
     default:
-        _velora_details_create(ad);
+        __dispatch_details(ad);
     }
 }
 
@@ -200,7 +211,7 @@ bool __velora_dispatch(AppData *ad, app_control_h request, const char *operation
         _velora_signin_create(ad, 1);
     } else if (g_strcmp0(operation, APP_CONTROL_OPERATION_ACCOUNT_CONFIGURE) == 0) {
         ad->launch_mode = LAUNCH_MODE_ACCOUNT_CONFIGURE;
-        _velora_details_create(ad);
+        __dispatch_details(ad);
     } else if (g_strcmp0(operation, APP_CONTROL_OPERATION_SHARE) == 0 ||
                g_strcmp0(operation, APP_CONTROL_OPERATION_MULTI_SHARE) == 0) {
         return __dispatch_share(ad);

@@ -343,6 +343,12 @@ static void __open_document(UploadViewData *vd, ItemData *record)
         __request_refused(vd, record, err);
 }
 
+void __opened_copies_delete()
+{
+    if (ecore_file_is_dir(__scratch_folder().c_str()) && !ecore_file_recursive_rm(__scratch_folder().c_str()))
+        VELORA_LOGE("copies of opened files are left");
+}
+
 void __select_item_to_launch_app(void *data, Evas_Object *, void *event_info)
 {
     auto *record = static_cast<ItemData *>(data);

@@ -8,3 +8,5 @@
 void __select_item_to_launch_app(void *data, Evas_Object *obj, void *event_info);
 // What the client answered, when the view's pipe brings it.
 void __content_result_handle(UploadViewData *vd, const ContentResultMessage &message);
+// Deletes the copies that were made of files to open them.
+void __opened_copies_delete();

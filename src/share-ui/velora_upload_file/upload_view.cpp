@@ -1,4 +1,5 @@
 // The upload view's life: built by a share or a result, left by Back, Cancel or a failure.
+#include "notification/notification.h"
 #include "velora_common/velora_client.h"
 #include "velora_common/velora_current_popup.h"
 #include "velora_common/velora_genlist.h"
@@ -9,11 +10,13 @@
 #include "velora_common/velora_pipe.h"
 #include "velora_common/velora_popup.h"
 #include "velora_upload_file/upload_browser.h"
+#include "velora_upload_file/upload_cancel.h"
 #include "velora_upload_file/upload_icon.h"
 #include "velora_upload_file/upload_list.h"
 #include "velora_upload_file/upload_menu.h"
 #include "velora_upload_file/upload_messages.h"
 #include "velora_upload_file/upload_notification.h"
+#include "velora_upload_file/upload_open.h"
 #include "velora_upload_file/upload_page.h"
 #include "velora_upload_file/upload_path_bar.h"
 #include "velora_upload_file/upload_queue.h"
@@ -195,4 +198,32 @@ void _velora_upload_view_meta_done()
 {
     if (s_vd)
         __share_meta_done(s_vd);
+}
+
+int _velora_upload_view_unfinished()
+{
+    const UploadViewData *vd = s_vd;
+    return vd ? __waiting_count() + (vd->run ? vd->run->queued() : 0) : 0;
+}
+
+void _velora_upload_view_stop_all(AppData *ad)
+{
+    UploadViewData *vd = s_vd;
+    if (!vd || (!vd->run && __waiting_count() == 0))
+        return;
+    if (vd->run) {
+        std::vector<UploadItem *> items;
+        for (const RunFile &file : vd->run->files)
+            if (const int state = file.item->state; state == UPLOAD_STATE_WAITING || state == UPLOAD_STATE_UPLOADING)
+                items.push_back(file.item.get());
+        __uploads_cancel(vd, items);
+        __worker_join(vd->run.get()); // which says what is up
+    }
+    _velora_page_replace(ad, vd);
+}
+
+void _velora_upload_view_forget()
+{
+    __opened_copies_delete();
+    notification_delete_all_by_type(VELORA_SHARE_PACKAGE, NOTIFICATION_TYPE_NONE);
 }
