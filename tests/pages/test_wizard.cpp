@@ -82,6 +82,11 @@ class Wizard : public UploadPage {
             {"open again", [] { return ask("Setup_Wizard_Velora_Signin", "again"); }},
             {"open 2", [] { return ask("Setup_Wizard_Velora_Signin2", "wizard"); }},
             {"icon", [] { return ask(nullptr, "icon"); }},
+            {"configure",
+             [] {
+                 request({.operation = APP_CONTROL_OPERATION_ACCOUNT_CONFIGURE, .sender = "settings"});
+                 return true;
+             }},
             {"share",
              [this] {
                  request({.operation = APP_CONTROL_OPERATION_SHARE,
@@ -200,11 +205,16 @@ TEST_F(Wizard, EachWayAnswersAsThePersonLeft)
          {"again rbutton_next", "wizard rbutton_next"},
          "on any"},
         {"icon", {"open", "icon", "?Skip", "Previous"}, {"icon none", "wizard lbutton_click"}},
+        {"settings in the middle",
+         {"signed in", "open", "configure", "?Sync schedule", "back", "?ann@example.com", "Skip"},
+         {"settings none", "wizard rbutton_skip"}},
         {"share that signs in, and is left",
-         {"open", "share", "approve", "?Upload to", "Cancel", "?ann@example.com", "!Sign in", "Skip"},
+         {"open", "share", "approve", "?Sync schedule", "Done", "?Upload to", "Cancel", "?ann@example.com", "!Sign in",
+          "Skip"},
          {"gallery -", "wizard rbutton_skip"}},
         {"share that joins the sign-in",
-         {"open", create, "share", "approve", "?Upload to", "Cancel", "?Upload via", enable, "Next"},
+         {"open", create, "share", "approve", "?Sync schedule", "Done", "?Upload to", "Cancel", "?Upload via", enable,
+          "Next"},
          {"gallery -", "wizard rbutton_next"},
          "on any"},
         {"share on the second page",
