@@ -37,11 +37,6 @@ class Wizard : public UploadPage {
             driver::settle();
         });
     }
-    static void request(const Wish &wish)
-    {
-        Application::request(wish);
-        driver::settle();
-    }
     static Evas_Object *shown(const std::string &text)
     {
         return ad()->win_main ? driver::find_text(ad()->win_main, text) : nullptr;
@@ -60,10 +55,6 @@ class Wizard : public UploadPage {
         }
         return false;
     }
-    static bool tap(const std::string &text)
-    {
-        return wait_shown(text) && driver::click(shown(text));
-    }
     static bool approve()
     {
         const auto is_there = [] {
@@ -77,48 +68,35 @@ class Wizard : public UploadPage {
     }
     bool step(const std::string &what)
     {
-        const std::map<std::string, std::function<bool()>> verbs = {
-            {"open", [] { return ask("Setup_Wizard_Velora_Signin", "wizard"); }},
-            {"open again", [] { return ask("Setup_Wizard_Velora_Signin", "again"); }},
-            {"open 2", [] { return ask("Setup_Wizard_Velora_Signin2", "wizard"); }},
-            {"icon", [] { return ask(nullptr, "icon"); }},
-            {"share",
-             [this] {
-                 request({.operation = APP_CONTROL_OPERATION_SHARE,
-                          .uri = locals({"a.txt"})[0].c_str(),
-                          .sender = "gallery"});
-                 return true;
-             }},
-            {"approve", approve},
-            {"signed in",
-             [] { // before, and with its record
-                 fake_cloud_sign_in("ann@example.com");
-                 return true;
-             }},
-            {"signed out",
-             [] {
-                 fake_cloud_sign_in("");
-                 return true;
-             }},
-            {"offline", [] { return vconf_set_str("memory/connection/type", "none") == 0; }},
-            {"online", [] { return vconf_set_str("memory/connection/type", "wifi") == 0; }},
-            {"back",
-             [] {
-                 driver::settle();
-                 driver::press(ad()->win_main, "XF86Back");
-                 return true;
-             }},
+        const std::map<std::string, Wish> requests = {
+            {"open", {.launch_mode = "Setup_Wizard_Velora_Signin", .sender = "wizard"}},
+            {"open again", {.launch_mode = "Setup_Wizard_Velora_Signin", .sender = "again"}},
+            {"open 2", {.launch_mode = "Setup_Wizard_Velora_Signin2", .sender = "wizard"}},
+            {"icon", {.sender = "icon"}},
+            {"configure", {.operation = APP_CONTROL_OPERATION_ACCOUNT_CONFIGURE, .sender = "settings"}},
+            {"share", {.operation = APP_CONTROL_OPERATION_MULTI_SHARE, .sender = "gallery"}},
         };
-        if (what[0] == '?')
+        if (const auto wanted = requests.find(what); wanted != requests.end()) {
+            Wish wish = wanted->second;
+            if (what == "share")
+                wish.paths = locals({"a.txt"});
+            Application::request(wish);
+            driver::settle();
+        } else if (what == "approve") {
+            return approve();
+        } else if (what == "signed in" || what == "signed out") { // by another program
+            fake_cloud_sign_in(what == "signed in" ? "ann@example.com" : "");
+        } else if (what == "offline" || what == "online") {
+            vconf_set_str("memory/connection/type", what == "online" ? "wifi" : "none");
+        } else if (what == "back") {
+            driver::press(ad()->win_main, "XF86Back");
+        } else if (what[0] == '?') {
             return wait_shown(what.substr(1));
-        if (what[0] == '!')
+        } else if (what[0] == '!') {
             return !shown(what.substr(1));
-        const auto verb = verbs.find(what);
-        return verb == verbs.end() ? tap(what) : verb->second();
-    }
-    static bool ask(const char *launch_mode, const char *sender)
-    {
-        request({.launch_mode = launch_mode, .sender = sender});
+        } else {
+            return wait_shown(what) && driver::click(shown(what));
+        }
         return true;
     }
     static Texts answers()
@@ -200,11 +178,16 @@ TEST_F(Wizard, EachWayAnswersAsThePersonLeft)
          {"again rbutton_next", "wizard rbutton_next"},
          "on any"},
         {"icon", {"open", "icon", "?Skip", "Previous"}, {"icon none", "wizard lbutton_click"}},
+        {"settings in the middle",
+         {"signed in", "open", "configure", "?Sync schedule", "back", "?ann@example.com", "Skip"},
+         {"settings none", "wizard rbutton_skip"}},
         {"share that signs in, and is left",
-         {"open", "share", "approve", "?Upload to", "Cancel", "?ann@example.com", "!Sign in", "Skip"},
+         {"open", "share", "approve", "?Sync schedule", "Done", "?Upload to", "Cancel", "?ann@example.com", "!Sign in",
+          "Skip"},
          {"gallery -", "wizard rbutton_skip"}},
         {"share that joins the sign-in",
-         {"open", create, "share", "approve", "?Upload to", "Cancel", "?Upload via", enable, "Next"},
+         {"open", create, "share", "approve", "?Sync schedule", "Done", "?Upload to", "Cancel", "?Upload via", enable,
+          "Next"},
          {"gallery -", "wizard rbutton_next"},
          "on any"},
         {"share on the second page",
