@@ -4,8 +4,11 @@ import os
 import random
 import signal
 import sqlite3
+import subprocess
+import threading
 import time
 
+from device import Trouble
 from ways.hearing import Reader
 from ways.signin import accounts, nothing_left
 from ways.steps import SLOW, check, stays, wait_for
@@ -115,10 +118,11 @@ def switches(tour):
     tour.step("Back again", back, person)
 
 
-def remove(person, question=()):
+def remove(person, question=(), before_last=lambda: None):
     person.click("More options", "Elm_Button")
     person.click("Remove")
     person.sees("All data related to this account", *question)
+    before_last()
     person.click("Remove", "Elm_Button")
 
 
@@ -204,9 +208,12 @@ def killed(tour):
         person.sign_in()
         person.application = None
         configure(person)
-        remove(person)
-        time.sleep(after)
-        person.application.kill()
+        kill = threading.Timer(after, person.application.kill)
+        try:
+            remove(person, before_last=kill.start)
+        except (Trouble, subprocess.SubprocessError):
+            pass  # it was killed under the pointer
+        kill.join()
         person.application.wait()
         # the next start brings what was broken off to its end
         person.application = None
@@ -220,7 +227,7 @@ def killed(tour):
         return credentials
 
     def fifty():
-        left = [once(random.Random(i).uniform(0, 0.25)) for i in range(50)]
+        left = [once(random.Random(i).uniform(0.2, 0.45)) for i in range(50)]
         return f"{sum(left)} times the account, {left.count(0)} times none"
 
     tour.step("fifty times", fifty)

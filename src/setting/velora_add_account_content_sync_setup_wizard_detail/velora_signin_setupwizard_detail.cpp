@@ -82,9 +82,9 @@ void _velora_signin_setupwizard_detail_create(AppData *ad)
     vd->ad = ad;
     vd->itc_icon = _velora_setup_item_class_create("1icon", __gl_content_get);
     vd->genlist = _velora_setup_list_create(ad->naviframe);
-    vd->first_item = elm_genlist_item_append(
-        vd->genlist, vd->itc_icon, __setup_create_genlist_item_data(0, vd, nullptr, nullptr, "icon_text", 0), nullptr,
-        ELM_GENLIST_ITEM_NONE, nullptr, nullptr);
+    vd->first_item = elm_genlist_item_append(vd->genlist, vd->itc_icon,
+                                             __setup_create_genlist_item_data(0, vd, nullptr, nullptr, "icon_text", 0),
+                                             nullptr, ELM_GENLIST_ITEM_NONE, nullptr, nullptr);
     elm_genlist_item_select_mode_set(vd->first_item, ELM_OBJECT_SELECT_MODE_DISPLAY_ONLY);
     Elm_Object_Item *item = _velora_setup_page_push(ad->naviframe, vd->genlist, "IDS_CLOUD_SK2_NEXT", __button_next_cb,
                                                     __setup_wizard_detail_back_cb, vd);

@@ -125,8 +125,8 @@ Evas_Object *_velora_setup_list_create(Evas_Object *parent)
     return genlist;
 }
 
-// Up and Down go from one row that can be chosen to the next; the toolkit takes them to titles too, which cannot show it.
-// What no key stops at comes into sight with the row beside it.
+// Up and Down go from one row that can be chosen to the next; the toolkit takes them to titles too, which cannot show
+// it. What no key stops at comes into sight with the row beside it.
 static Eina_Bool __list_key_cb(void *data, Evas_Object *genlist, Evas_Object *, Evas_Callback_Type type,
                                void *event_info)
 {
@@ -159,8 +159,7 @@ Elm_Object_Item *_velora_setup_page_push(Evas_Object *naviframe, Evas_Object *li
                                          Evas_Smart_Cb button_cb, Elm_Naviframe_Item_Pop_Cb back_cb, void *data)
 {
     static const char title_id[] = "IDS_STU_HEADER_UPLOAD_CONTENT_TO_VELORA_ABB";
-    Elm_Object_Item *item =
-        elm_naviframe_item_push(naviframe, __text(title_id), nullptr, nullptr, list, nullptr);
+    Elm_Object_Item *item = elm_naviframe_item_push(naviframe, __text(title_id), nullptr, nullptr, list, nullptr);
     elm_object_item_domain_translatable_part_text_set(item, "default", VELORA_DOMAIN, title_id);
     elm_naviframe_item_pop_cb_set(item, back_cb, data);
     ea_screen_reader_name_set(elm_object_parent_widget_get(list), __text(title_id));
@@ -170,7 +169,7 @@ Elm_Object_Item *_velora_setup_page_push(Evas_Object *naviframe, Evas_Object *li
     evas_object_smart_callback_add(button, "clicked", button_cb, data);
     elm_object_item_part_content_set(item, "toolbar", button);
     elm_object_event_callback_add(list, __list_key_cb, button);
-    elm_object_focus_set(list, EINA_TRUE);
+    elm_object_focus_set(elm_genlist_items_count(list) > 1 ? list : button, EINA_TRUE);
     return item;
 }
 

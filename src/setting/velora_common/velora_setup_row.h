@@ -28,11 +28,11 @@ Evas_Object *_velora_setup_list_create(Evas_Object *parent);
 Elm_Object_Item *_velora_setup_page_push(Evas_Object *naviframe, Evas_Object *list, const char *button_id,
                                          Evas_Smart_Cb button_cb, Elm_Naviframe_Item_Pop_Cb back_cb, void *data);
 
-// The size of a theme's font class ("ATO007", "ATO004") as the person has chosen it, and in a narrow window not more than
-// its words can have there. In pixels of a screen 480 wide; 26 without a table of fonts.
+// The size of a theme's font class ("ATO007", "ATO004") as the person has chosen it, and in a narrow window not more
+// than its words can have there. In pixels of a screen 480 wide; 26 without a table of fonts.
 int _velora_setup_font_size(Evas_Object *widget, const char *font_class);
 
 // The illustration of a group of velora_setup_wizard.edj, as wide as the list, with a text (id of domain "velora") in
-// "elm.title": `height` pixels high where the list is 480 wide, more where the text needs it, less where the list is too
-// low. Null when there is no such group. For the list to take.
+// "elm.title": `height` pixels high where the list is 480 wide, more where the text needs it, less where the list is
+// too low. Null when there is no such group. For the list to take.
 Evas_Object *_velora_setup_illustration_create(Evas_Object *list, const char *group, int height, const char *text_id);

@@ -141,8 +141,9 @@ static void __user_name_set(Evas_Object *label, const char *user_name)
 {
     const std::string font = __font("ATO004");
     char *name = elm_entry_utf8_to_markup(user_name);
-    char *markup = g_strdup_printf("<align=center><font=%s text_class=ATO004><font_size=%d>%s</font_size></font></align>",
-                                   font.c_str(), _velora_setup_font_size(label, "ATO004"), name);
+    char *markup =
+        g_strdup_printf("<align=center><font=%s text_class=ATO004><font_size=%d>%s</font_size></font></align>",
+                        font.c_str(), _velora_setup_font_size(label, "ATO004"), name);
     elm_object_text_set(label, markup);
     ea_theme_object_color_set(label, "ATO004");
     g_free(markup);
@@ -338,8 +339,8 @@ static void __page_shown_cb(void *, Evas *, Evas_Object *, void *)
 static void __texts_set(WelcomeViewData *vd)
 {
     char offer[1024];
-    g_snprintf(offer, sizeof offer,
-               __text("IDS_ST_BODY_VELORA_KEEPS_YOUR_MEMORIES_SAFE_GET_PD_GB_FOR_A_YEAR_ABB"), s_offered_gigabytes);
+    g_snprintf(offer, sizeof offer, __text("IDS_ST_BODY_VELORA_KEEPS_YOUR_MEMORIES_SAFE_GET_PD_GB_FOR_A_YEAR_ABB"),
+               s_offered_gigabytes);
     __headline_set(elm_object_part_content_get(vd->words, "elm.swallow.text0"),
                    __text("IDS_ST_BODY_YOUR_STUFF_ANYWHERE_ABB"));
     __headline_set(elm_object_part_content_get(vd->words, "elm.swallow.text1"), offer);

@@ -62,6 +62,11 @@ app_control_h receive(const char *operation, const char *sender)
     return request;
 }
 
+void *user_data()
+{
+    return state().user_data;
+}
+
 void install_viewer(const std::string &mime, const std::string &app_id)
 {
     state().viewers.emplace_back(mime, app_id);

@@ -40,5 +40,7 @@ void run(std::function<void()> script);
 void request(app_control_h request); // the application's launch request callback
 void pause();
 void resume();
+// What app_efl_main was given for the callbacks.
+void *user_data();
 
 } // namespace fake_app
