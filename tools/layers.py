@@ -26,7 +26,7 @@ UPLOAD_VIEW = (
     "retry",
     "queue",
     "result share",
-    "account messages",
+    "messages",
     "view",
 )
 UPLOAD_RANK = {name: rank for rank, names in enumerate(UPLOAD_VIEW) for name in names.split()}

@@ -4,7 +4,7 @@
 #include "velora_add_account_content_sync/signin_record.h"
 #include "velora_common/velora_account.h"
 #include "velora_details_content_sync/details_record.h"
-#include "velora_upload_file/velora_upload_account.h"
+#include "velora_upload_file/velora_uploads.h"
 
 namespace {
 

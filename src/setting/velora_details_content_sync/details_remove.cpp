@@ -6,7 +6,7 @@
 #include "velora_common/velora_popup.h"
 #include "velora_common/velora_signout.h"
 #include "velora_details_content_sync/details_record.h"
-#include "velora_upload_file/velora_upload_account.h"
+#include "velora_upload_file/velora_uploads.h"
 #include <cstdio>
 
 static const char s_topic[] = "remove account";
@@ -85,12 +85,13 @@ static void __delete_button_cb(void *data)
     elm_object_text_set(popup, __question().c_str());
     evas_object_smart_callback_add(popup, "language,changed", __question_language_cb, nullptr);
     evas_object_smart_callback_add(popup, "block,clicked", __delete_account_popup_cancel_cb, vd);
-    __button_add(vd, popup, "button1", "IDS_CLOUD_SK2_CANCEL", __delete_account_popup_cancel_cb);
+    Evas_Object *cancel = __button_add(vd, popup, "button1", "IDS_CLOUD_SK2_CANCEL", __delete_account_popup_cancel_cb);
     Evas_Object *remove = __button_add(vd, popup, "button2", "IDS_CLOUD_BUTTON_REMOVE", __delete_account_popup_ok_cb);
     elm_layout_signal_emit(remove, "platform,button,destructive", "platform");
     _velora_common_register_event_for_popup(popup, __delete_account_popup_cancel_cb, vd);
     evas_object_show(popup);
     _velora_popup_show(vd->ad, {vd, s_topic}, popup);
+    elm_object_focus_set(cancel, EINA_TRUE); // and not the text, because it can be scrolled
 }
 
 static void __create_more_ctxpopup(DetailsViewData *vd)

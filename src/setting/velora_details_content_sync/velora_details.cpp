@@ -220,13 +220,11 @@ static Eina_Bool __back_cb(void *, Elm_Object_Item *)
 
 // The page itself
 
-static Evas_Object *__bar_button_create(DetailsViewData *vd, const char *style, const char *text_id, Evas_Smart_Cb cb,
-                                        void *data)
+// Drawn as a sign; the words are for the screen reader.
+static Evas_Object *__sign_button_create(Evas_Object *nf, const char *style, Evas_Smart_Cb cb, void *data)
 {
-    Evas_Object *button = elm_button_add(vd->ad->naviframe);
+    Evas_Object *button = elm_button_add(nf);
     elm_object_style_set(button, style);
-    // Drawn as a sign; the words are for the screen reader.
-    elm_object_domain_translatable_text_set(button, VELORA_SHARE_DOMAIN, text_id);
     evas_object_smart_callback_add(button, "clicked", cb, data);
     return button;
 }
@@ -244,12 +242,14 @@ static void __edges_create(DetailsViewData *vd)
         if (Evas_Object *former = elm_object_item_part_content_unset(vd->nf_item, part))
             evas_object_del(former);
     vd->more_btn = nullptr;
-    if (!__follows_signin(vd->launch_mode))
-        elm_object_item_part_content_set(
-            vd->nf_item, "prev_btn",
-            __bar_button_create(vd, "naviframe/end_btn/default", "IDS_VELORA_BODY_BACK", __back_button_cb, nf));
+    if (!__follows_signin(vd->launch_mode)) {
+        Evas_Object *back = __sign_button_create(nf, "naviframe/end_btn/default", __back_button_cb, nf);
+        elm_object_domain_translatable_text_set(back, VELORA_SHARE_DOMAIN, "IDS_VELORA_BODY_BACK");
+        elm_object_item_part_content_set(vd->nf_item, "prev_btn", back);
+    }
     if (__has_menu(vd->launch_mode)) {
-        vd->more_btn = __bar_button_create(vd, "naviframe/more/default", "IDS_VELORA_BODY_MORE_OPTIONS", __more_cb, vd);
+        vd->more_btn = __sign_button_create(nf, "naviframe/more/default", __more_cb, vd);
+        elm_object_domain_translatable_text_set(vd->more_btn, VELORA_SHARE_DOMAIN, "IDS_VELORA_BODY_MORE_OPTIONS");
         elm_object_item_part_content_set(vd->nf_item, "toolbar_more_btn", vd->more_btn);
         return;
     }

@@ -28,8 +28,8 @@
 #include "velora_upload_file/upload_thumbnails.h"
 #include "velora_upload_file/upload_waiting.h"
 #include "velora_upload_file/upload_worker.h"
-#include "velora_upload_file/velora_upload_account.h"
 #include "velora_upload_file/velora_upload_view.h"
+#include "velora_upload_file/velora_uploads.h"
 
 UploadViewData *s_vd = nullptr;
 std::atomic<Ecore_Pipe *> s_view_pipe = nullptr;
