@@ -45,6 +45,12 @@ class Details : public UploadPage {
         app = page() ? page()->ad : signin::s_vd ? signin::s_vd->ad : s_vd ? s_vd->ad : app;
         driver::settle();
     }
+    static void speak(const char *language)
+    {
+        setenv("LANGUAGE", language, 1);
+        setlocale(LC_ALL, "C"); // gettext looks again when it is another one
+        setlocale(LC_ALL, "C.UTF-8");
+    }
     // The page for an account that is there, and what it asks for at first.
     static void open(const Wish &wish = {.operation = APP_CONTROL_OPERATION_ACCOUNT_CONFIGURE, .sender = "settings"})
     {
@@ -343,6 +349,12 @@ TEST_F(Details, TheScheduleIsStoredByRowAndByRadio)
                   0);
         open();
         EXPECT_EQ(schedule(), "Every 6 hours");
+        speak("de");
+        evas_object_smart_callback_call(page()->genlist, "language,changed", nullptr);
+        EXPECT_EQ(schedule(), "Alle 6 Stunden");
+        EXPECT_EQ(storage(), "5,00GB / 15,00GB");
+        speak("en");
+        evas_object_smart_callback_call(page()->genlist, "language,changed", nullptr);
         const struct {
             int choice;
             const char *by;
@@ -408,9 +420,7 @@ TEST_F(Details, SizesAreWrittenToTheByte)
         {"ko", 1610612736, "1.50GB"},
     };
     for (const auto &c : cases) {
-        setenv("LANGUAGE", c.language, 1);
-        setlocale(LC_ALL, ""); // makes gettext look again
-        setlocale(LC_ALL, "C.UTF-8");
+        speak(c.language);
         char text[30] = "";
         EXPECT_EQ(__contentsync_storage_status_size_transition(c.bytes, text), 0);
         EXPECT_STREQ(text, c.text);
