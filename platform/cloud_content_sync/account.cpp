@@ -101,6 +101,10 @@ bool Account::sign_in(const Credentials *credentials, std::optional<Credentials>
     const bool is_stored = replace_credentials(credentials ? &next : nullptr, before);
     if (is_stored && former && before && before->secret.empty())
         before->secret = secret_find(file, before->item);
+    if (is_stored && !credentials) { // what was deleted is not to be found in the file either
+        std::scoped_lock lock(writing);
+        writer.run("VACUUM; PRAGMA wal_checkpoint(TRUNCATE)");
+    }
     const std::string unused = !is_stored ? next.item : before ? before->item : "";
     if (!unused.empty() || (is_stored && !credentials))
         secret_remove(file, is_stored && !credentials ? "" : unused);

@@ -1,5 +1,6 @@
 #include "velora_common/velora_signout.h"
 #include "account/account.h"
+#include "notification/notification.h"
 #include "velora_common/velora_account.h"
 #include "velora_common/velora_client.h"
 #include "velora_common/velora_current_popup.h"
@@ -8,6 +9,8 @@
 #include "velora_common/velora_pipe.h"
 #include "velora_common/velora_popup.h"
 #include "velora_common/velora_thread.h"
+#include <clocale>
+#include <libintl.h>
 
 static const char s_topic[] = "sign-out", s_end[] = "sigout_end";
 static const PopupOwner s_owner = {s_topic, s_topic};
@@ -99,13 +102,18 @@ static void __leave(AppData *ad, void *page)
         _velora_app_exit(ad);
 }
 
+static bool __is_account_left()
+{
+    char *email = nullptr;
+    const bool is_left = cloud_content_sync_account_get_email(VELORA_SERVICE, &email) == 0;
+    std::free(email);
+    return is_left;
+}
+
 // The record goes with the account. 0, or what the account service says of a record that is there and stays.
 static int __record_remove()
 {
-    char *email = nullptr;
-    const bool is_account_left = cloud_content_sync_account_get_email(VELORA_SERVICE, &email) == 0;
-    std::free(email);
-    if (is_account_left) { // also one that was activated in the very moment in which it was given up
+    if (__is_account_left()) { // also one that was activated in the very moment in which it was given up
         _velora_common_account_settle();
         return 0;
     }
@@ -178,7 +186,10 @@ static void __add_account_with_popup_sigout_pipe_cb(void *data, void *buffer, un
     if (!__is_end(ad, buffer))
         return;
     s_told = __finish(ad);
-    if (__record_remove() == 0)
+    const int result = __record_remove();
+    if (__is_account_left()) // it could not be taken off the device
+        notification_status_message_post(dcgettext(VELORA_DOMAIN, "IDS_VELORA_BODY_ACCOUNT_NOT_REMOVED", LC_MESSAGES));
+    else if (result == 0)
         __say_signed_out(ad);
 }
 

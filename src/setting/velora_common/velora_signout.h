@@ -18,7 +18,7 @@ int _velora_common_signout(AppData *ad, void *page = nullptr, SignoutScope scope
 int _velora_common_signout_without_remove_popup(AppData *ad, void *page = nullptr,
                                                 SignoutScope scope = SIGNOUT_ACCOUNT);
 // With the wait, and at the end a popup that says that the account is signed out; its OK leaves. When the device's
-// record cannot be removed the page stays.
+// record cannot be removed the page stays; when the account cannot, a short notice says so.
 int _velora_common_add_account_with_popup_signout(AppData *ad, void *page = nullptr);
 
 bool _velora_common_signout_is_under_way();

@@ -1,5 +1,6 @@
 // How full the account's storage is: asked of the service, shown as two sizes and a bar.
 #include "velora_common/velora_log.h"
+#include "velora_common/velora_number.h"
 #include "velora_common/velora_pipe.h"
 #include "velora_details_content_sync/details_record.h"
 #include <cstdio>
@@ -8,15 +9,6 @@
 
 static constexpr double s_warning = 0.9; // full enough to be said
 static const char s_message[] = "storage.";
-
-// The sign between whole and part in the language of the words, which need not be that of the process's numbers: its
-// locale may not be installed.
-static const char *__decimal_sign()
-{
-    static const char id[] = "IDS_VELORA_BODY_DECIMAL_SIGN";
-    const char *sign = __details_text(id);
-    return std::strcmp(sign, id) == 0 ? "." : sign;
-}
 
 int __contentsync_storage_status_size_transition(unsigned long long bytes, char *out)
 {
@@ -31,15 +23,8 @@ int __contentsync_storage_status_size_transition(unsigned long long bytes, char 
         unit_id = "IDS_CLOUD_BODY_MB";
         one = 1.0 / mega;
     }
-    char number[out_size];
-    g_ascii_formatd(number, sizeof number, "%4.2f", static_cast<double>(bytes) * one);
-    char *point = std::strchr(number, '.');
-    if (!point) {
-        VELORA_LOGE("ret<0");
-        return -1;
-    }
-    *point = '\0';
-    if (std::snprintf(out, out_size, "%s%s%s%s", number, __decimal_sign(), point + 1, __details_text(unit_id)) < 0) {
+    const std::string number = _velora_common_number(static_cast<double>(bytes) * one, 2);
+    if (std::snprintf(out, out_size, "%s%s", number.c_str(), __details_text(unit_id)) < 0) {
         VELORA_LOGE("ret<0");
         return -1;
     }

@@ -1,6 +1,7 @@
 #include "velora_upload_file/upload_text.h"
 #include "cloud_content_sync/cloud_content_sync.h"
 #include "velora_common/velora_app_data.h"
+#include "velora_common/velora_number.h"
 #include <clocale>
 #include <cstdio>
 #include <cstring>
@@ -87,7 +88,7 @@ std::string __short_size(gint64 bytes)
         value /= 1024;
         unit++;
     }
-    char text[32];
-    std::snprintf(text, sizeof text, value < 9.95 && unit > 0 ? "%.1f\u00a0%s" : "%.0f\u00a0%s", value, units[unit]);
-    return bytes > 0 && bytes < 512 ? "1\u00a0KB" : text; // something is not nothing
+    if (bytes > 0 && bytes < 512)
+        value = 1; // something is not nothing
+    return _velora_common_number(value, value < 9.95 && unit > 0 ? 1 : 0) + "\u00a0" + units[unit];
 }
