@@ -201,15 +201,19 @@ static Evas_Object *__title_create(Evas_Object *layout, const char *text_id)
     return label;
 }
 
+int _velora_setup_label_height(Evas_Object *label, int width)
+{
+    int height = 0;
+    edje_object_size_min_restricted_calc(elm_layout_edje_get(label), nullptr, &height, width, 0);
+    return height;
+}
+
 // What the words and a small picture need at least, at this width.
 static int __least_height(Evas_Object *label, int width)
 {
-    const double scale = __scale();
     constexpr int margins = 32, picture = 104; // as the groups have them
-    int height = 0;
-    edje_object_size_min_restricted_calc(elm_layout_edje_get(label), nullptr, &height,
-                                         width - static_cast<int>(margins * scale), 0);
-    return height + static_cast<int>((margins + picture) * scale);
+    return _velora_setup_label_height(label, width - static_cast<int>(margins * __scale())) +
+           static_cast<int>((margins + picture) * __scale());
 }
 
 Evas_Object *_velora_setup_illustration_create(Evas_Object *list, const char *group, int height, const char *text_id)

@@ -32,6 +32,9 @@ Elm_Object_Item *_velora_setup_page_push(Evas_Object *naviframe, Evas_Object *li
 // than its words can have there. In pixels of a screen 480 wide; 26 without a table of fonts.
 int _velora_setup_font_size(Evas_Object *widget, const char *font_class);
 
+// How high a label that wraps has to be at a width, in pixels.
+int _velora_setup_label_height(Evas_Object *label, int width);
+
 // The illustration of a group of velora_setup_wizard.edj, as wide as the list, with a text (id of domain "velora") in
 // "elm.title": `height` pixels high where the list is 480 wide, more where the text needs it, less where the list is
 // too low. Null when there is no such group. For the list to take.

@@ -34,8 +34,8 @@ static WelcomeViewData *s_vd;
 static const char s_disclaimer_topic[] = "disclaimer";
 static const char s_previous_id[] = "IDS_CLOUD_BUTTON_PREVIOUS", s_skip_id[] = "IDS_STU_BUTTON_SKIP";
 static constexpr int s_offered_gigabytes = 50;
-static constexpr double s_headline_scale = 1.25; // of what is said below it
-static constexpr int s_room_for_sign = 430;      // pixels of a screen 480 wide
+static constexpr double s_headline_scale = 1.25;                  // of what is said below it
+static constexpr int s_sign_and_gaps = 192, s_words_margins = 48; // of "scroller_lite"
 static constexpr double s_drawn_scale = 1.8;
 // Where the table of colours is missing: readable on light and on dark.
 static constexpr unsigned int s_plain_color = 0x80868E;
@@ -363,10 +363,15 @@ static void __fit_job(void *data)
     __texts_set(vd);
     if (!vd->account.empty())
         __user_name_set(elm_object_part_content_get(vd->layout, "elm.swallow.btn1"), vd->account.c_str());
-    int height = 0;
-    evas_object_geometry_get(elm_object_part_content_get(vd->layout, "elm.swallow.scroller"), nullptr, nullptr, nullptr,
+    int width = 0, height = 0;
+    evas_object_geometry_get(elm_object_part_content_get(vd->layout, "elm.swallow.scroller"), nullptr, nullptr, &width,
                              &height);
-    const bool is_low = height < s_room_for_sign * elm_config_scale_get() / s_drawn_scale;
+    const double scale = elm_config_scale_get() / s_drawn_scale;
+    int wanted = static_cast<int>(s_sign_and_gaps * scale);
+    for (const char *part : {"elm.swallow.text0", "elm.swallow.text1"})
+        wanted += _velora_setup_label_height(elm_object_part_content_get(vd->words, part),
+                                             width - static_cast<int>(s_words_margins * scale));
+    const bool is_low = height < wanted;
     elm_layout_signal_emit(vd->words, is_low ? "velora,sign,hide" : "velora,sign,show", "velora");
 }
 
