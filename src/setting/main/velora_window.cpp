@@ -12,9 +12,34 @@ static void __win_delete_request_cb(void *, Evas_Object *, void *)
     elm_exit();
 }
 
+// A page that slides in takes no clicks, and cannot be popped.
+static bool __is_sliding(const Evas_Object *naviframe)
+{
+    Elm_Object_Item *top = elm_naviframe_top_item_get(naviframe);
+    const Evas_Object *obj = top ? elm_object_item_content_get(top) : nullptr;
+    while (obj && obj != naviframe && !evas_object_freeze_events_get(obj))
+        obj = evas_object_smart_parent_get(obj);
+    return obj && obj != naviframe;
+}
+
+static const char s_left[] = "page that is left once it is there";
+
+static void __slid_in_cb(void *, Evas_Object *naviframe, void *)
+{
+    evas_object_smart_callback_del(naviframe, "transition,finished", __slid_in_cb);
+    if (evas_object_data_del(naviframe, s_left) == elm_naviframe_top_item_get(naviframe))
+        elm_naviframe_item_pop(naviframe);
+}
+
 static void __naviframe_back_cb(void *, Evas_Object *obj, void *)
 {
-    elm_naviframe_item_pop(obj);
+    if (!__is_sliding(obj)) {
+        elm_naviframe_item_pop(obj);
+        return;
+    }
+    evas_object_smart_callback_del(obj, "transition,finished", __slid_in_cb); // once, however often it is pressed
+    evas_object_smart_callback_add(obj, "transition,finished", __slid_in_cb, nullptr);
+    evas_object_data_set(obj, s_left, elm_naviframe_top_item_get(obj));
 }
 
 static void __naviframe_more_cb(void *, Evas_Object *obj, void *)
