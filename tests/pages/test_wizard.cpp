@@ -55,12 +55,14 @@ class Wizard : public UploadPage {
         }
         return false;
     }
+    static bool is_at_service()
+    {
+        return wait_for(
+            [] { return signin::s_vd && signin::s_vd->web_view && !fake_ewk::seen().address.empty() && !ad()->popup; });
+    }
     static bool approve()
     {
-        const auto is_there = [] {
-            return signin::s_vd && signin::s_vd->web_view && !fake_ewk::seen().address.empty() && !ad()->popup;
-        };
-        if (!wait_for(is_there))
+        if (!is_at_service())
             return false;
         fake_cloud_approve("ann@example.com");
         fake_ewk::navigate(web + "/auth_complete?oauth_token=t&uid=1");
@@ -89,6 +91,8 @@ class Wizard : public UploadPage {
         } else if (what == "offline" || what == "online") {
             vconf_set_str("memory/connection/type", what == "online" ? "wifi" : "none");
         } else if (what == "back") {
+            if (signin::s_vd && !is_at_service()) // its wait may take the key with it
+                return false;
             driver::press(ad()->win_main, "XF86Back");
         } else if (what[0] == '?') {
             return wait_shown(what.substr(1));
