@@ -57,8 +57,12 @@ class Wizard : public UploadPage {
     }
     static bool is_at_service()
     {
-        return wait_for(
-            [] { return signin::s_vd && signin::s_vd->web_view && !fake_ewk::seen().address.empty() && !ad()->popup; });
+        return wait_for([] {
+            int x = -1; // the page may still be on its way in
+            if (signin::s_vd && signin::s_vd->web_view)
+                evas_object_geometry_get(signin::s_vd->web_view, &x, nullptr, nullptr, nullptr);
+            return x == 0 && !fake_ewk::seen().address.empty() && !ad()->popup;
+        });
     }
     static bool approve()
     {
