@@ -296,7 +296,7 @@ TEST_F(Wizard, TheChoiceThatIsShownIsTheOneThatIsWritten)
         EXPECT_EQ(choice(), "any");
         fake_cloud_sign_in(""); // another program
         ASSERT_TRUE(step(enable) && step("?Upload via"));
-        EXPECT_TRUE(log.has("The setting could not be saved"));
+        EXPECT_TRUE(wait_for([this] { return log.has("The setting could not be saved"); }));
         elm_genlist_realized_items_update(list);
         EXPECT_EQ(choice(), "any");
         fake_cloud_sign_in("ann@example.com");
