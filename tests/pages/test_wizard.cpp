@@ -55,12 +55,18 @@ class Wizard : public UploadPage {
         }
         return false;
     }
+    static bool is_at_service()
+    {
+        return wait_for([] {
+            int x = -1; // the page may still be on its way in
+            if (signin::s_vd && signin::s_vd->web_view)
+                evas_object_geometry_get(signin::s_vd->web_view, &x, nullptr, nullptr, nullptr);
+            return x == 0 && !fake_ewk::seen().address.empty() && !ad()->popup;
+        });
+    }
     static bool approve()
     {
-        const auto is_there = [] {
-            return signin::s_vd && signin::s_vd->web_view && !fake_ewk::seen().address.empty() && !ad()->popup;
-        };
-        if (!wait_for(is_there))
+        if (!is_at_service())
             return false;
         fake_cloud_approve("ann@example.com");
         fake_ewk::navigate(web + "/auth_complete?oauth_token=t&uid=1");
@@ -89,7 +95,15 @@ class Wizard : public UploadPage {
         } else if (what == "offline" || what == "online") {
             vconf_set_str("memory/connection/type", what == "online" ? "wifi" : "none");
         } else if (what == "back") {
-            driver::press(ad()->win_main, "XF86Back");
+            if (!signin::s_vd) {
+                driver::press(ad()->win_main, "XF86Back");
+                return true;
+            }
+            for (int i = 0; i < 10 && signin::s_vd; i++) { // a page on its way in, or its wait, may take the key
+                driver::press(ad()->win_main, "XF86Back");
+                wait_for([] { return !signin::s_vd; }, 1);
+            }
+            return !signin::s_vd;
         } else if (what[0] == '?') {
             return wait_shown(what.substr(1));
         } else if (what[0] == '!') {
@@ -282,7 +296,7 @@ TEST_F(Wizard, TheChoiceThatIsShownIsTheOneThatIsWritten)
         EXPECT_EQ(choice(), "any");
         fake_cloud_sign_in(""); // another program
         ASSERT_TRUE(step(enable) && step("?Upload via"));
-        EXPECT_TRUE(log.has("The setting could not be saved"));
+        EXPECT_TRUE(wait_for([this] { return log.has("The setting could not be saved"); }));
         elm_genlist_realized_items_update(list);
         EXPECT_EQ(choice(), "any");
         fake_cloud_sign_in("ann@example.com");
