@@ -95,15 +95,7 @@ class Wizard : public UploadPage {
         } else if (what == "offline" || what == "online") {
             vconf_set_str("memory/connection/type", what == "online" ? "wifi" : "none");
         } else if (what == "back") {
-            if (!signin::s_vd) {
-                driver::press(ad()->win_main, "XF86Back");
-                return true;
-            }
-            for (int i = 0; i < 10 && signin::s_vd; i++) { // a page on its way in, or its wait, may take the key
-                driver::press(ad()->win_main, "XF86Back");
-                wait_for([] { return !signin::s_vd; }, 1);
-            }
-            return !signin::s_vd;
+            driver::press(ad()->win_main, "XF86Back");
         } else if (what[0] == '?') {
             return wait_shown(what.substr(1));
         } else if (what[0] == '!') {

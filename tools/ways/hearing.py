@@ -3,6 +3,7 @@
 import re
 import subprocess
 
+from device import Trouble
 from ways.steps import check, wait_for
 
 CONTROLS = ("push button", "list item", "menu item", "check box", "progress bar", "page tab", "entry", "password text", "link")
@@ -26,7 +27,15 @@ class Reader:
                                method, *arguments)
 
     def walk(self, where=("org.a11y.atspi.Registry", "/org/a11y/atspi/accessible/root")):
-        """Every (role, name) of the tree below an object."""
+        """Every (role, name) of the tree below an object; nothing of what goes meanwhile."""
+        try:
+            return self._walk(where)
+        except Trouble as gone:
+            if "UnknownObject" in str(gone):
+                return []
+            raise
+
+    def _walk(self, where):
         role = self.ask(where, "org.a11y.atspi.Accessible.GetRoleName").split("'")[1]
         name = self.ask(where, "org.freedesktop.DBus.Properties.Get", "org.a11y.atspi.Accessible", "Name").strip()[3:-4]
         found = [(role, name)]

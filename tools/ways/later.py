@@ -178,7 +178,7 @@ def icon(tour):
 
     def start():
         person.tap_icon()
-        wait_for("a message", person.texts)
+        person.sees("Storage usage")
 
     def share():
         person.share(path)
@@ -188,9 +188,15 @@ def icon(tour):
         person.choose()
         person.finished("one.txt", "Upload complete")
 
-    tour.step("started by its icon, it shows a message", start)
+    def back_to_settings():
+        person.raise_window()
+        person.key("Escape")
+        wait_for("the settings", lambda: person.find("Storage usage") and not person.find("one.txt"))
+
+    tour.step("started by its icon, it shows the settings", start)
     tour.step("a share shows the folders alone", share)
     tour.step("Done uploads", done)
+    tour.step("Back leads to the settings", back_to_settings)
     tour.step("the sender is told, the file is stored", tour.left, {"one.txt": path})
 
 
