@@ -11,7 +11,8 @@
 
 namespace cloud {
 
-static constexpr auto TICK = std::chrono::milliseconds(1000); // how often stalled transfers are looked for
+// How often stalled transfers are looked for; with none under way there is nothing to look for.
+static constexpr auto TICK = std::chrono::milliseconds(1000), IDLE_TICK = std::chrono::milliseconds(60'000);
 
 Client::Client(Service description, std::shared_ptr<Account> database)
     : auth(std::make_unique<Auth>(*this)), contents(std::make_unique<Contents>(*this)),
@@ -253,7 +254,7 @@ void Client::loop()
         contents->step();
         // Nobody waits for a thumbnail, so it waits for everybody.
         thumbnails->step(!running_upload && contents->is_idle());
-        http.run(TICK);
+        http.run(http.is_idle() ? IDLE_TICK : TICK);
     }
     running_upload.reset();
     running_refresh.reset();

@@ -3,6 +3,7 @@
 #include <cerrno>
 #include <cstdio>
 #include <fcntl.h>
+#include <glib.h>
 #include <unistd.h>
 
 namespace cloud {
@@ -56,7 +57,7 @@ bool Fetch::write(const char *data, size_t count)
 {
     if (size + static_cast<long long>(count) > size_limit)
         return false;
-    g_checksum_update(checksum.get(), reinterpret_cast<const guchar *>(data), static_cast<gssize>(count));
+    checksum.add(data, count);
     while (count > 0) {
         const ssize_t written = ::write(fd, data, count);
         if (written < 0 && errno == EINTR)
@@ -86,7 +87,7 @@ int Fetch::check(const Transfer &transfer)
         return why == CLOUD_CONTENT_SYNC_ERROR_BAD_NAME ? CLOUD_CONTENT_SYNC_ERROR_SERVER : why;
     }
     const std::string digest = sha256_of(transfer.repr_digest);
-    if (!digest.empty() && digest != g_checksum_get_string(checksum.get()))
+    if (!digest.empty() && digest != checksum.hex())
         return CLOUD_CONTENT_SYNC_ERROR_CORRUPTED;
     return fdatasync(fd) == 0 ? 0 : CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE;
 }

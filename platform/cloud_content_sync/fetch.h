@@ -1,7 +1,7 @@
 #pragma once
 // One answer of the service as a file: received under a temporary name, checked, then renamed. Client thread only.
+#include "cloud_content_sync/digest.h"
 #include "cloud_content_sync/http.h"
-#include <glib.h>
 #include <sys/types.h>
 
 namespace cloud {
@@ -42,7 +42,7 @@ class Fetch {
     std::string temporary;
     int fd = -1;
     bool local_failed = false;
-    std::unique_ptr<GChecksum, decltype(&g_checksum_free)> checksum{g_checksum_new(G_CHECKSUM_SHA256), g_checksum_free};
+    Sha256 checksum;
     Transfer *running = nullptr;
 };
 

@@ -69,6 +69,10 @@ class Http {
     void abort(Transfer *transfer);
     // Moves data, calls the done() of what has ended, and waits for more to do, at most `wait`.
     void run(std::chrono::milliseconds wait);
+    bool is_idle() const // nothing is under way
+    {
+        return transfers.empty();
+    }
     // Ends the wait of run(), or of the next one. Any thread.
     void wake();
 

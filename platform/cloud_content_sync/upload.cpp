@@ -4,6 +4,7 @@
 #include <cerrno>
 #include <fcntl.h>
 #include <unistd.h>
+#include <vector>
 
 namespace cloud {
 
@@ -42,14 +43,39 @@ bool Upload::open_local()
 {
     // A FIFO without a writer would block the open of a plain O_RDONLY.
     fd = open(wanted.local_path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
-    return fd >= 0 && fstat(fd, &local) == 0 && S_ISREG(local.st_mode);
+    if (fd < 0 || fstat(fd, &local) != 0 || !S_ISREG(local.st_mode))
+        return false;
+    char more = 0; // what the system makes up as it is read has no size to go by
+    return local.st_size > 0 || pread(fd, &more, 1, 0) == 0;
+}
+
+// The whole file once more, by which a change of its data is told from one of its name or its permissions.
+bool Upload::local_is_what_was_sent() const
+{
+    Sha256 again;
+    std::vector<char> buffer(256 * 1024);
+    long long at = 0;
+    while (true) {
+        const ssize_t got = pread(fd, buffer.data(), buffer.size(), at);
+        if (got < 0 && errno == EINTR)
+            continue;
+        if (got <= 0)
+            return got == 0 && at == local.st_size && again.hex() == digest;
+        again.add(buffer.data(), static_cast<size_t>(got));
+        at += got;
+    }
 }
 
 bool Upload::local_changed() const
 {
     struct stat now = {};
-    return fstat(fd, &now) != 0 || now.st_size != local.st_size || now.st_mtim.tv_sec != local.st_mtim.tv_sec ||
-           now.st_mtim.tv_nsec != local.st_mtim.tv_nsec;
+    const auto differ = [](const timespec &one, const timespec &other) {
+        return one.tv_sec != other.tv_sec || one.tv_nsec != other.tv_nsec;
+    };
+    if (fstat(fd, &now) != 0 || now.st_size != local.st_size || differ(now.st_mtim, local.st_mtim))
+        return true;
+    // A program can put the time of its change back, but not the time at which it did.
+    return differ(now.st_ctim, local.st_ctim) && !local_is_what_was_sent();
 }
 
 void Upload::step()
@@ -92,7 +118,7 @@ size_t Upload::read(char *buffer, size_t size)
         read_error = got < 0 ? CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE : CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED;
         return READ_FAILED;
     }
-    g_checksum_update(checksum.get(), reinterpret_cast<const guchar *>(buffer), got);
+    checksum->add(buffer, static_cast<size_t>(got));
     sent += got;
     if (whole_file_read() && transfer_now)
         transfer_now->stall_limit = std::max<std::chrono::seconds>(transfer_now->stall_limit, ANSWER_LIMIT);
@@ -112,7 +138,7 @@ void Upload::put()
 {
     if (++puts > PUTS_MAX)
         return finish(CLOUD_CONTENT_SYNC_ERROR_SERVER);
-    checksum.reset(g_checksum_new(G_CHECKSUM_SHA256));
+    checksum.emplace();
     sent = 0;
     auto transfer = std::make_unique<Transfer>();
     transfer->method = "PUT";
@@ -129,7 +155,7 @@ void Upload::put_ended(const Transfer &transfer)
 {
     is_putting = false;
     if (whole_file_read())
-        digest = g_checksum_get_string(checksum.get());
+        digest = checksum->hex();
     if (transfer.is_success())
         return stored(transfer);
     if (read_error)
@@ -279,8 +305,7 @@ void Upload::looked(const Transfer &transfer, MultistatusReader &reader)
 void Upload::read_back()
 {
     struct Sum {
-        std::unique_ptr<GChecksum, decltype(&g_checksum_free)> checksum{g_checksum_new(G_CHECKSUM_SHA256),
-                                                                        g_checksum_free};
+        Sha256 checksum;
         long long size = 0;
     };
     auto sum = std::make_shared<Sum>();
@@ -289,7 +314,7 @@ void Upload::read_back()
     transfer->path = target;
     transfer->write = [this, sum](const char *data, size_t size) {
         sum->size += static_cast<long long>(size);
-        g_checksum_update(sum->checksum.get(), reinterpret_cast<const guchar *>(data), static_cast<gssize>(size));
+        sum->checksum.add(data, size);
         return sum->size <= local.st_size;
     };
     transfer->done = [this, sum](Transfer &done) {
@@ -300,7 +325,7 @@ void Upload::read_back()
             return finish_look({Found::ABSENT, 0});
         if (done.result != CURLE_OK || done.status != 200)
             return finish_look({Found::ABSENT, done.error()});
-        const bool same = digest == g_checksum_get_string(sum->checksum.get());
+        const bool same = digest == sum->checksum.hex();
         finish_look({same ? Found::SAME : Found::DIFFERENT, 0});
     };
     transfer_now = client.http.start(std::move(transfer), credentials);

@@ -2,7 +2,8 @@
 // One upload, from the opening of the local file to its last callback.
 #include "cloud_content_sync/client.h"
 #include "cloud_content_sync/dav.h"
-#include <glib.h>
+#include "cloud_content_sync/digest.h"
+#include <optional>
 #include <sys/stat.h>
 
 namespace cloud {
@@ -37,6 +38,7 @@ class Upload {
 
     bool open_local();
     bool local_changed() const;
+    bool local_is_what_was_sent() const;
     size_t read(char *buffer, size_t size);
     void put();
     void put_ended(const Transfer &transfer);
@@ -65,11 +67,11 @@ class Upload {
     Credentials credentials;
     int fd = -1;
     struct stat local = {};
-    std::unique_ptr<GChecksum, decltype(&g_checksum_free)> checksum{nullptr, g_checksum_free};
-    std::string digest; // hexadecimal, once the file was read whole
-    std::string target; // server path of the current attempt
-    long long sent = 0; // bytes of the current attempt
-    int percent = -1;   // last one reported
+    std::optional<Sha256> checksum; // of the current attempt
+    std::string digest;             // hexadecimal, once the file was read whole
+    std::string target;             // server path of the current attempt
+    long long sent = 0;             // bytes of the current attempt
+    int percent = -1;               // last one reported
     int read_error = 0;
     int puts = 0;
     bool lost_reply = false; // an attempt for `target` ended without an answer

@@ -1,9 +1,14 @@
 // What any cloud client promises, whatever the service behind it.
 #include "backend.h"
 #include <atomic>
+#include <filesystem>
+#include <fstream>
+#include <mutex>
 #include <set>
 #include <sys/stat.h>
 #include <unistd.h>
+
+namespace fs = std::filesystem;
 
 static constexpr size_t MEGABYTE = 1 << 20;
 using Transfers = OnBackend;
@@ -224,6 +229,7 @@ TEST_P(Transfers, what_cannot_be_uploaded_is_told_by_the_callback)
         {scratch.path, "/a", CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE},
         {fifo, "/a", CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE},
         {"/dev/null", "/a", CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE},
+        {"/proc/self/status", "/a", CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE},
         {closed, "/a", access(closed.c_str(), R_OK) == 0 ? 0 : CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE},
         {fine, "/", CLOUD_CONTENT_SYNC_ERROR_BAD_NAME},
         {fine, "relative", CLOUD_CONTENT_SYNC_ERROR_BAD_NAME},
@@ -237,23 +243,41 @@ TEST_P(Transfers, what_cannot_be_uploaded_is_told_by_the_callback)
     EXPECT_EQ(upload(handle, fine, "/a"), CLOUD_CONTENT_SYNC_ERROR_NETWORK);
 }
 
-TEST_P(ServerTransfers, a_file_that_changes_on_the_way_is_not_kept)
+TEST_P(ServerTransfers, a_file_whose_data_change_on_the_way_is_not_kept)
 {
     ASSERT_TRUE(open());
-    for (const bool grows : {true, false}) {
+    constexpr int CHANGED = CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED;
+    const struct {
+        const char *name;
+        int at; // per cent
+        std::function<void(const std::string &file)> change;
+        int error;
+    } rows[] = {
+        {"grows", 0, [](const std::string &file) { std::ofstream(file, std::ios::app) << "more"; }, CHANGED},
+        {"shrinks", 0, [](const std::string &file) { fs::resize_file(file, 3 * MEGABYTE); }, CHANGED},
+        {"is written to, and its time put back", 50,
+         [](const std::string &file) {
+             const auto time = fs::last_write_time(file);
+             std::fstream(file, std::ios::in | std::ios::out) << "other";
+             fs::last_write_time(file, time);
+         },
+         CHANGED},
+        {"gets other permissions", 50, [](const std::string &file) { fs::permissions(file, fs::perms::owner_read); },
+         0},
+    };
+    for (const auto &row : rows) {
+        SCOPED_TRACE(row.name);
         const std::string local = scratch.file("changing", some_bytes(20 * MEGABYTE, 1));
         Watch watch;
+        std::once_flag once;
         watch.hook = [&](const Call &call) {
-            if (call.state != 2 || call.progress != 0)
-                return;
-            if (grows)
-                std::ofstream(local, std::ios::app) << "more";
-            else
-                EXPECT_EQ(truncate(local.c_str(), 3 * MEGABYTE), 0);
+            if (call.state == 2 && call.progress >= row.at)
+                std::call_once(once, row.change, local);
         };
         start(handle, local, "/changing", watch);
-        EXPECT_EQ(watch.end(), CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED);
-        EXPECT_EQ(backend->list("/"), Names{});
+        EXPECT_EQ(watch.end(), row.error);
+        EXPECT_EQ(backend->list("/"), row.error ? Names{} : Names{"changing"});
+        fs::remove(local);
     }
 }
 
