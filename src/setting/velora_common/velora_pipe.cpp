@@ -24,6 +24,7 @@ struct Channel {
     Ecore_Pipe *pipe = nullptr;
     Ecore_Pipe_Cb handler = nullptr;
     void *data = nullptr;
+    int handling = 0; // calls of the handler under way; main loop
 
     std::mutex lock;                 // guards all below, and the pipe's write end; never held across a handler
     std::deque<std::string> waiting; // not in the kernel's pipe yet
@@ -98,7 +99,9 @@ static void __pipe_read_cb(void *data, void *buffer, unsigned int size)
     }
     if (!written)
         VELORA_LOGE("ecore_pipe_write failed");
+    channel->handling++;
     channel->handler(channel->data, buffer, size);
+    channel->handling--;
 }
 
 Ecore_Pipe *_velora_common_pipe_add(Ecore_Pipe_Cb handler, void *data)
@@ -123,6 +126,10 @@ void _velora_common_pipe_del(Ecore_Pipe *pipe)
         return;
     const std::lock_guard guard(channel->lock);
     channel->is_deleted = true;
+    // Of a message of which it has read the length alone ecore would forget to free the rest. Nobody hears of it any
+    // more.
+    if (channel->handling == 0)
+        ecore_pipe_wait(pipe, 1, 0.0);
     ecore_pipe_del(pipe);
 }
 
