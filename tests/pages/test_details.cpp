@@ -445,6 +445,8 @@ TEST_F(Details, TheStorageIsWhatTheServiceSays)
         } cases[] = {
             {10000, 1024 - 16, 0, "1.00KB / 9.77KB", 10},
             {10000, 9500, CLOUD_CONTENT_SYNC_ERROR_NETWORK, "1.00KB / 9.77KB", 10},
+            {10000, 8999 - 16, 0, "8.79KB / 9.77KB", 89},
+            {10000, 9000 - 16, 0, "8.79KB / 9.77KB", 90}, // little is left
             {10000, 12000 - 16, 0, "11.72KB / 11.72KB", 100},
             {0, 0, 0, "0KB / 0KB", -1},
             {15ULL << 30, (5ULL << 30) - 16, 0, "5.00GB / 15.00GB", 33},
@@ -457,7 +459,9 @@ TEST_F(Details, TheStorageIsWhatTheServiceSays)
             EXPECT_EQ(storage(), c.text);
             driver::settle();
             Evas_Object *bar = driver::find_widget(page()->genlist, "elm_progressbar");
-            EXPECT_EQ(bar ? static_cast<int>(elm_progressbar_value_get(bar) * 100) : -1, c.percent);
+            ASSERT_EQ(bar ? static_cast<int>(elm_progressbar_value_get(bar) * 100 + 1e-6) : -1, c.percent);
+            const char *state = bar ? edje_object_part_state_get(elm_layout_edje_get(bar), "bar", nullptr) : "default";
+            EXPECT_STREQ(state, c.percent >= 90 ? "warning" : "default");
         }
         fake_cloud_set_storage(15ULL << 30, 0, CLOUD_CONTENT_SYNC_ERROR_SERVER);
         fake_cloud_sign_in("bob@example.com"); // whose figures nobody knows
