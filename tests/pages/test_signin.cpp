@@ -406,6 +406,34 @@ TEST_F(Signin, GivenUpAndAskedForAtOnceBeginsAnew)
     EXPECT_EQ(answers(), (Texts{"gallery succeeded", "gallery succeeded"}));
 }
 
+TEST_F(Signin, AShareWhileTheAccountIsRemovedGetsAnAccountAgain)
+{
+    for (const bool is_told : {false, true}) { // before the notice, and while it is on screen
+        forget_account();
+        fake_cloud_remove("/a.txt");
+        fake_cloud_sign_in("someone@example.org");
+        fake_cloud_refresh_now();
+        fake_ewk::clear();
+        run([&] {
+            request({.operation = APP_CONTROL_OPERATION_ACCOUNT_CONFIGURE, .sender = "settings"});
+            app = details::s_vd->ad;
+            fake_cloud_hold(!is_told);
+            _velora_common_add_account_with_popup_signout(app);
+            ASSERT_TRUE(wait_for([&] { return app->popup && popup_says(is_told ? "signed out" : "Removing"); }));
+            ASSERT_TRUE(wait_for([] { return accounts().find("example.org 1") == std::string::npos; }));
+            share({"a.txt"});
+            fake_cloud_hold(false);
+            ASSERT_TRUE(is_page_there());
+            approve();
+            ASSERT_TRUE(press_done());
+            ASSERT_TRUE(upload());
+            ASSERT_TRUE(wait_for(is_over));
+            EXPECT_EQ(rows(), Texts{"uploaded a.txt"});
+        });
+        EXPECT_EQ(accounts(), somebody);
+    }
+}
+
 TEST_F(Signin, TheSameAccountTwiceIsOneAndAnotherOneTakesItsPlace)
 {
     for (const std::string email : {"someone@example.org", "someone@example.org", "other@example.org"}) {

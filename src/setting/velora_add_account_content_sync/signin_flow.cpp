@@ -380,6 +380,8 @@ static bool __join(AppData *ad)
 
 static void __create(AppData *ad, bool is_signin, void (*done)(AppData *ad), void (*back)(AppData *ad))
 {
+    // What the client was asked for is done; its end is not waited for, and says nothing into this page.
+    _velora_common_signout_end(ad);
     auto *vd = s_vd = new SigninViewData;
     vd->is_signin = is_signin;
     vd->ad = ad;

@@ -98,7 +98,7 @@ static void __leave(AppData *ad, void *page)
 {
     if (page)
         _velora_page_leave(ad, page);
-    else
+    else if (!_velora_pages_have_files()) // which somebody has shared meanwhile
         _velora_app_exit(ad);
 }
 
