@@ -33,13 +33,24 @@ class Tour:
         try:
             told = action(*arguments)
         except Exception as failure:
-            report(False, name, " ".join(str(failure).split()) or type(failure).__name__)
+            report(False, name, " ".join(f"{failure or type(failure).__name__}; {self.traces()}".split()))
             self.failed += 1
             raise
         finally:
             label = re.sub(r"[^a-z0-9]+", "-", words.lower()).strip("-")
             self.person.picture(os.path.join(self.folder, f"{self.name}-{self.count:02}-{label}.png"))
         report(True, name, told)
+
+    def traces(self):
+        """What a failure that is not seen a second time leaves to think about."""
+        person = self.person
+        try:
+            ended = person.application and person.application.poll()
+            shown = "ended with %s" % ended if ended is not None else "shows %r" % [entry[:2] for entry in person.visible()]
+            with open(person.log, encoding="utf-8", errors="replace") as log:
+                return f"the application {shown[:600]}; its last words: {log.read()[-300:]!r}"
+        except Exception as failure:  # pylint: disable=broad-except # the first failure is the one to be told
+            return f"no traces: {failure!r}"
 
     def image(self, name, words="gradient:orange-blue"):
         path = os.path.join(self.person.folder, name)
