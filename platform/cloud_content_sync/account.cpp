@@ -18,6 +18,9 @@ CREATE INDEX IF NOT EXISTS folder_order ON folder(parent, sort, name);
 CREATE TABLE IF NOT EXISTS content(parent TEXT NOT NULL, name TEXT NOT NULL, sort TEXT NOT NULL, size INTEGER NOT NULL,
     mtime INTEGER NOT NULL, etag TEXT NOT NULL, PRIMARY KEY(parent, name)) WITHOUT ROWID;
 CREATE INDEX IF NOT EXISTS content_order ON content(parent, sort, name);
+CREATE TABLE IF NOT EXISTS upload(id INTEGER PRIMARY KEY, account TEXT NOT NULL, local_path TEXT NOT NULL,
+    server_path TEXT NOT NULL, state INTEGER NOT NULL, target TEXT NOT NULL, at INTEGER NOT NULL);
+CREATE INDEX IF NOT EXISTS upload_paths ON upload(account, local_path, server_path);
 )";
 static constexpr char INSERT_CONTENT[] =
     "INSERT OR REPLACE INTO content(parent, name, sort, size, mtime, etag) VALUES(?, ?, ?, ?, ?, ?)";
@@ -32,7 +35,9 @@ bool Account::open()
         std::scoped_lock lock(reading, writing);
         if (!writer.open(path, SCHEMA) || chmod(path.c_str(), 0600) != 0 || !reader.open(path, nullptr))
             return false;
-        has_rows = Stmt(reader, "SELECT 1 FROM folder UNION ALL SELECT 1 FROM content LIMIT 1").row();
+        has_rows =
+            Stmt(reader, "SELECT 1 FROM folder UNION ALL SELECT 1 FROM content UNION ALL SELECT 1 FROM upload LIMIT 1")
+                .row();
     }
     // What a process has left that was killed while it signed out.
     if (has_rows && identity().empty())
@@ -62,6 +67,17 @@ bool Account::change(const std::function<bool()> &work)
 bool Account::while_signed_in(const std::string &who, const std::function<bool()> &work)
 {
     return change([&] { return identity() == who && work(); });
+}
+
+bool Account::write(const std::string &who, const std::function<bool(Db &)> &work)
+{
+    return while_signed_in(who, [&] { return work(writer); });
+}
+
+void Account::read(const std::function<void(const Db &)> &work)
+{
+    std::scoped_lock lock(reading);
+    work(reader);
 }
 
 // The credentials are what makes an account be there. They go last and come last, so a process that is killed leaves
@@ -185,11 +201,11 @@ bool Account::replace(const std::vector<FolderRow> &folders, const std::vector<C
     return while_signed_in(who, [&] { return write_tree(writer, folders, contents, later, who); });
 }
 
-bool Account::insert(const ContentRow &content, const std::string &who)
+bool Account::insert(const ContentRow &content, const std::string &who, const std::function<bool(Db &)> &more)
 {
     return while_signed_in(who, [&] {
         Stmt stmt(writer, INSERT_CONTENT);
-        return insert_content(stmt, content);
+        return insert_content(stmt, content) && (!more || more(writer));
     });
 }
 
@@ -221,7 +237,8 @@ std::string Account::complete_for()
 // Within change().
 bool Account::clear()
 {
-    return writer.run("DELETE FROM folder; DELETE FROM content; DELETE FROM setting WHERE key = 'complete_for'");
+    return writer.run("DELETE FROM folder; DELETE FROM content; DELETE FROM upload; DELETE FROM setting "
+                      "WHERE key = 'complete_for'");
 }
 
 // Within change().

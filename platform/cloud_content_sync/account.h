@@ -42,6 +42,10 @@ class Account {
     // Does `work` while nobody can sign in or out, in a transaction of the database that its result ends. False, and
     // nothing done, when `who`, an identity, is not signed in.
     bool while_signed_in(const std::string &who, const std::function<bool()> &work);
+    // For what other files of the client keep in the database: while_signed_in() with the connection that writes, and
+    // `work` with the one that reads, which others wait for.
+    bool write(const std::string &who, const std::function<bool(Db &)> &work);
+    void read(const std::function<void(const Db &)> &work);
 
     bool folder_exists(const std::string &path);
     // In the order of sort_key().
@@ -53,7 +57,8 @@ class Account {
     // the other changes are for the account `who` and answer false when it is not signed in (any more).
     bool replace(const std::vector<FolderRow> &folders, const std::vector<ContentRow> &contents,
                  const std::vector<ContentRow> &later, const std::string &who);
-    bool insert(const ContentRow &content, const std::string &who);
+    // `more`, which may be empty, is done in the same transaction.
+    bool insert(const ContentRow &content, const std::string &who, const std::function<bool(Db &)> &more = nullptr);
     std::optional<ContentRow> content_at(const std::string &parent, const std::string &name);
     // Changes the row of that parent and name; nothing when there is none.
     bool update(const ContentRow &content, const std::string &who);

@@ -17,7 +17,8 @@ static constexpr auto TICK = std::chrono::milliseconds(1000), IDLE_TICK = std::c
 Client::Client(Service description, std::shared_ptr<Account> database)
     : auth(std::make_unique<Auth>(*this)), contents(std::make_unique<Contents>(*this)),
       storage(std::make_unique<Storage>(*this)), thumbnails(std::make_unique<Thumbnails>(*this)),
-      service(std::move(description)), account(std::move(database)), http(service)
+      service(std::move(description)), account(std::move(database)), ledger(*account), http(service),
+      patience(service.wait_seconds)
 {
 }
 
@@ -145,12 +146,13 @@ void Client::report_progress(const UploadRequest &request, int percent)
     end_callback();
 }
 
-bool Client::report_done(const UploadRequest &request, const ContentRow &stored, const std::string &who)
+bool Client::report_done(const UploadRequest &request, const ContentRow &stored, const std::string &who,
+                         const LedgerRow &record)
 {
     if (!begin_callback(request.id, true))
         return false;
     // A failure costs nothing but the row until the next refresh.
-    if (account->insert(stored, who))
+    if (account->insert(stored, who, [&](Db &db) { return ledger_close(db, record); }))
         stored_meanwhile.push_back(stored);
     {
         std::scoped_lock lock(mutex);
@@ -240,6 +242,62 @@ void Client::step_refresh()
     running_refresh->start();
 }
 
+cloud_content_sync_wait_e Client::waiting_for(int *seconds)
+{
+    std::scoped_lock lock(mutex);
+    const auto left = wait.is_under_way() ? wait.until - Wait::Clock::now() : Wait::Clock::duration::zero();
+    *seconds = std::max(0, static_cast<int>(std::chrono::ceil<std::chrono::seconds>(left).count()));
+    return wait.reason;
+}
+
+static bool has_network()
+{
+    connection_h connection = nullptr;
+    connection_type_e type = CONNECTION_TYPE_WIFI;
+    if (connection_create(&connection) == CONNECTION_ERROR_NONE) {
+        connection_get_type(connection, &type); // what cannot be asked counts as there
+        connection_destroy(connection);
+    }
+    return type != CONNECTION_TYPE_DISCONNECTED;
+}
+
+Wait Client::wait_begin(long long retry_after)
+{
+    const bool is_reachable = retry_after >= 0;
+    if (!is_reachable && !network)
+        connection_watch_create(&network); // before the look, or a change in between would go unseen
+    network_changed = false;
+    const Wait next = patience.next(is_reachable, is_reachable || has_network(), retry_after);
+    if (!next.is_under_way())
+        wait_end();
+    std::scoped_lock lock(mutex);
+    wait = next;
+    return next;
+}
+
+void Client::wait_end()
+{
+    if (network)
+        connection_watch_destroy(network);
+    network = nullptr;
+    std::scoped_lock lock(mutex);
+    wait = {};
+}
+
+// Until there is more to do.
+void Client::rest()
+{
+    std::chrono::milliseconds pause = http.is_idle() ? IDLE_TICK : TICK;
+    if (const auto due = running_upload ? running_upload->due() : std::nullopt)
+        pause = std::clamp(std::chrono::ceil<std::chrono::milliseconds>(*due - Wait::Clock::now()),
+                           std::chrono::milliseconds(0), pause);
+    int fd = -1;
+    if (network)
+        connection_watch_get_fd(network, &fd);
+    if (http.run(pause, fd))
+        network_changed = connection_watch_read(network) == CONNECTION_ERROR_NONE || network_changed;
+}
+
 void Client::loop()
 {
     // Signals are the program's to handle, on its own threads; a connection that breaks must not raise SIGPIPE.
@@ -254,8 +312,9 @@ void Client::loop()
         contents->step();
         // Nobody waits for a thumbnail, so it waits for everybody.
         thumbnails->step(!running_upload && contents->is_idle());
-        http.run(http.is_idle() ? IDLE_TICK : TICK);
+        rest();
     }
+    wait_end();
     running_upload.reset();
     running_refresh.reset();
     contents->end(0);

@@ -3,7 +3,10 @@
 #include "cloud_content_sync/account.h"
 #include "cloud_content_sync/cloud_content_sync.h"
 #include "cloud_content_sync/http.h"
+#include "cloud_content_sync/ledger.h"
+#include "cloud_content_sync/patience.h"
 #include "cloud_content_sync/service.h"
+#include "connection/connection.h"
 #include <condition_variable>
 #include <deque>
 #include <map>
@@ -55,6 +58,8 @@ class Client : public std::enable_shared_from_this<Client> {
     bool cancel(int id);
     void refresh(RefreshRequest request);
     std::optional<std::string> uploaded_path(int id);
+    // What the upload that runs waits for, and the seconds until it is tried again.
+    cloud_content_sync_wait_e waiting_for(int *seconds);
     // A new request's id, to be cancelled by; 0 after stop().
     int new_request();
     bool is_stopping();
@@ -69,9 +74,18 @@ class Client : public std::enable_shared_from_this<Client> {
 
     const Service service;
     const std::shared_ptr<Account> account;
+    Ledger ledger;
 
     // The client thread only, for what runs on it.
     Http http;
+    Patience patience;
+    // Between the two whoever asks for waiting_for() is told. retry_after: as Patience::next has it.
+    Wait wait_begin(long long retry_after);
+    void wait_end();
+    bool has_network_changed() const // since the wait began
+    {
+        return network_changed;
+    }
     bool is_wanted(int id); // neither cancelled nor stopped
     // Around a callback of a request. False when the request is not wanted any more: there is no callback then.
     bool begin_callback(int id, bool is_last);
@@ -79,7 +93,9 @@ class Client : public std::enable_shared_from_this<Client> {
     void report_progress(const UploadRequest &request, int percent);
     // The request's last callback; the file is of the account `who`. False, and nothing done, when the request is not
     // wanted any more.
-    bool report_done(const UploadRequest &request, const ContentRow &stored, const std::string &who);
+    // `record` is taken out of the book with it.
+    bool report_done(const UploadRequest &request, const ContentRow &stored, const std::string &who,
+                     const LedgerRow &record);
     void report_failed(const UploadRequest &request, int error);
     void report_refreshed(const RefreshRequest &request, int error);
     // Ends all requests but those of a sign-in; the error, not 0, is that of their last callbacks.
@@ -89,6 +105,7 @@ class Client : public std::enable_shared_from_this<Client> {
 
   private:
     void loop();
+    void rest();
     void step_upload();
     void step_refresh();
 
@@ -101,9 +118,12 @@ class Client : public std::enable_shared_from_this<Client> {
     std::deque<UploadRequest> upload_queue;
     std::vector<RefreshRequest> refresh_queue;
     std::map<int, std::string> landed;
+    Wait wait; // what the upload that runs waits for
 
     std::unique_ptr<Upload> running_upload;   // client thread
     std::unique_ptr<Refresh> running_refresh; // client thread
+    connection_watch_h network = nullptr;     // while an upload waits for it; client thread
+    bool network_changed = false;             // client thread
     std::thread thread;
     std::thread::id thread_id;
 };

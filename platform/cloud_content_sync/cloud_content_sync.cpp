@@ -123,6 +123,58 @@ int cloud_content_sync_cancel_server_storage_info(cloud_content_sync_h handle, v
     return handle->client->storage->cancel(user_data) ? DONE : CLOUD_CONTENT_SYNC_ERROR_NOT_FOUND;
 }
 
+int cloud_content_sync_get_wait(cloud_content_sync_h handle, cloud_content_sync_wait_e *reason, int *seconds)
+{
+    if (!handle || !reason || !seconds)
+        return INVALID;
+    *reason = handle->client->waiting_for(seconds);
+    return DONE;
+}
+
+// A change of the book for the account that is signed in.
+static int change_queue(cloud_content_sync_h handle, const char *const *local_paths, const char *const *server_paths,
+                        int count, bool (cloud::Ledger::*change)(const std::string &, const cloud::LedgerPaths &))
+{
+    if (!handle || !local_paths || !server_paths || count < 0)
+        return INVALID;
+    cloud::LedgerPaths files;
+    files.reserve(static_cast<size_t>(count));
+    for (int i = 0; i < count; i++) {
+        if (!local_paths[i] || !server_paths[i])
+            return INVALID;
+        files.emplace_back(local_paths[i], server_paths[i]);
+    }
+    const std::string who = handle->client->account->identity();
+    if (who.empty())
+        return CLOUD_CONTENT_SYNC_ERROR_NO_ACCOUNT;
+    return (handle->client->ledger.*change)(who, files) ? DONE : CLOUD_CONTENT_SYNC_ERROR_DB_FAILED;
+}
+
+int cloud_content_sync_queue_add(cloud_content_sync_h handle, const char *const *local_paths,
+                                 const char *const *server_paths, int count)
+{
+    return change_queue(handle, local_paths, server_paths, count, &cloud::Ledger::add);
+}
+
+int cloud_content_sync_queue_remove(cloud_content_sync_h handle, const char *const *local_paths,
+                                    const char *const *server_paths, int count)
+{
+    return change_queue(handle, local_paths, server_paths, count, &cloud::Ledger::remove);
+}
+
+int cloud_content_sync_queue_foreach(cloud_content_sync_h handle, cloud_content_sync_queue_cb cb, void *user_data)
+{
+    if (!handle || !cb)
+        return INVALID;
+    const std::string who = handle->client->account->identity();
+    if (who.empty())
+        return CLOUD_CONTENT_SYNC_ERROR_NO_ACCOUNT;
+    for (const cloud::LedgerRow &row : handle->client->ledger.waiting(who))
+        if (!cb(row.local_path.c_str(), row.server_path.c_str(), user_data))
+            break;
+    return DONE;
+}
+
 int cloud_content_sync_refresh_meta(cloud_content_sync_h handle, int content_types, cloud_content_sync_refresh_cb cb,
                                     void *user_data)
 {

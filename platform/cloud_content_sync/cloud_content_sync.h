@@ -168,6 +168,31 @@ int cloud_content_sync_name_get_next(const char *name, char **next);
 // LOCAL_CHANGED: what was stored of the changed file is then removed.
 int cloud_content_sync_upload(cloud_content_sync_h handle, const char *local_path, const char *server_path, int *req_id,
                               cloud_content_sync_transfer_cb cb, void *user_data);
+// What the upload that runs waits for before it is tried again, and in how many seconds that is at the latest. It
+// begins and ends with a callback (RUNNING) of the upload, and the seconds of a busy service pass with one each.
+enum cloud_content_sync_wait_e {
+    CLOUD_CONTENT_SYNC_WAIT_NONE = 0,
+    CLOUD_CONTENT_SYNC_WAIT_NO_NETWORK = 1,    // the device has none; as long as it takes
+    CLOUD_CONTENT_SYNC_WAIT_NOT_REACHABLE = 2, // the service does not answer, or not whole
+    CLOUD_CONTENT_SYNC_WAIT_SERVICE_BUSY = 3,  // it asked for time (429, 503 with Retry-After)
+};
+int cloud_content_sync_get_wait(cloud_content_sync_h handle, cloud_content_sync_wait_e *reason, int *seconds);
+
+// The book of uploads, which outlives the process: files that are going to be uploaded, until each of them is stored,
+// cancelled or has failed. An upload finds its entry by its paths, and looks first whether an earlier attempt has
+// stored the file; one without an entry gets one. Sign-out empties the book.
+//
+// Enters files in this order, all or none. NO_ACCOUNT, DB_FAILED (a full disk): the uploads themselves do not need it.
+int cloud_content_sync_queue_add(cloud_content_sync_h handle, const char *const *local_paths,
+                                 const char *const *server_paths, int count);
+// Takes one entry a file out of those for which no upload has begun. Errors as above; what is not there is none.
+int cloud_content_sync_queue_remove(cloud_content_sync_h handle, const char *const *local_paths,
+                                    const char *const *server_paths, int count);
+// Calls back with every entry that has not ended, in order, on the caller's thread, until the callback returns false.
+// The texts are valid during the call. NO_ACCOUNT.
+typedef bool (*cloud_content_sync_queue_cb)(const char *local_path, const char *server_path, void *user_data);
+int cloud_content_sync_queue_foreach(cloud_content_sync_h handle, cloud_content_sync_queue_cb cb, void *user_data);
+
 // Where a finished upload really landed (it may be the next free name). Known until the handle is destroyed, and within
 // the last callback already; NOT_FOUND for a request that has not succeeded.
 int cloud_content_sync_get_uploaded_path(cloud_content_sync_h handle, int req_id, char **server_path);

@@ -177,6 +177,9 @@ void Http::finish(CURL *easy, CURLcode result)
     curl_multi_remove_handle(multi.get(), easy);
     transfer->result = result;
     curl_easy_getinfo(easy, CURLINFO_RESPONSE_CODE, &transfer->status);
+    curl_off_t seconds = 0;
+    if (curl_easy_getinfo(easy, CURLINFO_RETRY_AFTER, &seconds) == CURLE_OK)
+        transfer->retry_after = seconds;
     transfer->done(*transfer);
 }
 
@@ -199,13 +202,15 @@ void Http::end_stalled()
         finish(easy, CURLE_OPERATION_TIMEDOUT);
 }
 
-void Http::run(std::chrono::milliseconds wait)
+bool Http::run(std::chrono::milliseconds wait, int fd)
 {
     int running = 0;
     curl_multi_perform(multi.get(), &running);
     dispatch();
     end_stalled();
-    curl_multi_poll(multi.get(), nullptr, 0, static_cast<int>(wait.count()), nullptr);
+    curl_waitfd other = {.fd = fd, .events = CURL_WAIT_POLLIN, .revents = 0};
+    curl_multi_poll(multi.get(), &other, fd >= 0 ? 1 : 0, static_cast<int>(wait.count()), nullptr);
+    return other.revents != 0;
 }
 
 void Http::wake()

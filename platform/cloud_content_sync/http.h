@@ -34,7 +34,8 @@ struct Transfer {
     long status = 0;
     std::string etag;
     std::string repr_digest;
-    bool was_resent = false; // libcurl found the connection dead and wanted to send the body a second time
+    long long retry_after = 0; // seconds, by the service's Retry-After; 0: it gave none
+    bool was_resent = false;   // libcurl found the connection dead and wanted to send the body a second time
 
     // Kept by Http.
     std::chrono::seconds stall_limit{60};
@@ -48,6 +49,10 @@ struct Transfer {
     }
     // The request cannot have reached the service.
     bool never_sent() const;
+    // The service is busy: the seconds to wait before the next attempt, 0 when it names none; -1 when it is not.
+    long long asks_to_wait() const;
+    // The answer does not say whether the request was carried out: who answers, or passes the answer on, gave up.
+    bool leaves_open() const;
     // One of cloud_content_sync_error_e for a request that did not succeed.
     int error() const;
 };
@@ -67,8 +72,9 @@ class Http {
     Transfer *start(std::unique_ptr<Transfer> transfer, const Credentials &credentials);
     // Ends a transfer and closes its connection; done() is not called. Null is allowed.
     void abort(Transfer *transfer);
-    // Moves data, calls the done() of what has ended, and waits for more to do, at most `wait`.
-    void run(std::chrono::milliseconds wait);
+    // Moves data, calls the done() of what has ended, and waits for more to do, at most `wait`. The wait ends as well
+    // when the descriptor `fd` can be read, which is answered; -1: there is none.
+    bool run(std::chrono::milliseconds wait, int fd = -1);
     bool is_idle() const // nothing is under way
     {
         return transfers.empty();

@@ -1,6 +1,7 @@
 #include "cloud_content_sync/service.h"
 #include "base/base.h"
 #include "cloud_content_sync/names.h"
+#include <algorithm>
 #include <glib.h>
 
 namespace cloud {
@@ -52,6 +53,9 @@ std::optional<Service> service_find(const std::string &name)
     service.ca_file = string_of(file, "Service", "CAFile");
     if (const int seconds = g_key_file_get_integer(file, "Service", "StallTimeout", nullptr); seconds > 0)
         service.stall_seconds = seconds;
+    if (const int seconds = g_key_file_get_integer(file, "Service", "WaitLimit", nullptr);
+        seconds > 0 || g_key_file_has_key(file, "Service", "WaitLimit", nullptr))
+        service.wait_seconds = std::max(seconds, 0);
     service.api = string_of(file, "Service", "Api");
     if (!is_http(service.storage) || (!service.api.empty() && !is_http(service.api)))
         return {};

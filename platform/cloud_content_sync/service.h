@@ -14,6 +14,7 @@ struct Service {
     std::string callback;  // where they send the person who has decided; empty when there are no pages
     std::string ca_file;   // certificates to trust instead of the system's, or empty
     int stall_seconds = 60;
+    int wait_seconds = 300; // that uploads wait for a service in trouble
     int auth_seconds = 180; // that a request of a sign-in may take
 };
 

@@ -22,6 +22,17 @@ bool Transfer::never_sent() const
     }
 }
 
+long long Transfer::asks_to_wait() const
+{
+    const bool is_busy = status == 429 || (status == 503 && retry_after > 0);
+    return result == CURLE_OK && is_busy ? retry_after : -1;
+}
+
+bool Transfer::leaves_open() const
+{
+    return result == CURLE_OK && (status == 408 || (status >= 500 && status <= 504 && status != 501));
+}
+
 int Transfer::error() const
 {
     if (result == CURLE_WRITE_ERROR || result == CURLE_WEIRD_SERVER_REPLY || result == CURLE_UNSUPPORTED_PROTOCOL)

@@ -4,6 +4,7 @@
 #include <cerrno>
 #include <fcntl.h>
 #include <unistd.h>
+#include <utility>
 #include <vector>
 
 namespace cloud {
@@ -29,6 +30,8 @@ void Upload::start()
 {
     if (const int error = credentials_load(client.service.name, credentials))
         return finish(error);
+    who = account_identity(client.service, credentials);
+    record = client.ledger.begin(who, wanted.local_path, wanted.server_path);
     target = wanted.server_path;
     if (!path_is_valid(target) || target == "/")
         return finish(CLOUD_CONTENT_SYNC_ERROR_BAD_NAME);
@@ -36,7 +39,87 @@ void Upload::start()
         return finish(CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE);
     percent = 0;
     client.report_progress(wanted, percent);
+    if (record.target.empty())
+        return put();
+    // An earlier attempt has sent it there, and nobody knows what came of it.
+    is_unknown = true;
+    resume();
+}
+
+// Is what an earlier attempt has sent the file, and is it there? A look costs less than a second copy in the cloud.
+void Upload::resume()
+{
+    if (path_is_valid(record.target))
+        target = record.target;
+    lost_reply = false;
+    checksum.emplace();
+    sent = 0;
+    is_hashing = true;
+    client.http.wake();
+}
+
+// In pieces, so that a cancel need not wait for the end of a long file.
+void Upload::hash_some()
+{
+    static constexpr long long PIECE = 16LL << 20;
+    std::vector<char> buffer(256 * 1024);
+    const long long until = std::min<long long>(local.st_size, sent + PIECE);
+    while (sent < until)
+        if (read(buffer.data(), buffer.size()) == READ_FAILED)
+            return finish(read_error);
+    if (!whole_file_read())
+        return client.http.wake();
+    is_hashing = false;
+    digest = checksum->hex();
+    look(true, &Upload::resumed);
+}
+
+void Upload::resumed(const Look &result)
+{
+    if (result.error)
+        return trouble(result.error, result.retry_after);
+    if (result.found == Found::SAME)
+        return verified(result);
+    is_unknown = result.found == Found::ABSENT; // it may still be on its way
+    target = wanted.server_path;
     put();
+}
+
+// Ends with the error, or waits for what it comes from to pass.
+void Upload::trouble(int error, long long retry_after)
+{
+    if (!client.is_wanted(wanted.id) || (error != CLOUD_CONTENT_SYNC_ERROR_NETWORK && retry_after < 0))
+        return finish(error);
+    wait = client.wait_begin(retry_after);
+    if (!wait.is_under_way())
+        return finish(error);
+    client.report_progress(wanted, std::max(percent, 0)); // who looks at the request now learns why nothing moves
+}
+
+void Upload::wait_step()
+{
+    const auto now = Wait::Clock::now();
+    if (now < wait.until && !client.has_network_changed()) {
+        if (wait.reason == CLOUD_CONTENT_SYNC_WAIT_SERVICE_BUSY && now >= wait.told_until) {
+            wait.told_until = now + std::chrono::seconds(1);
+            client.report_progress(wanted, std::max(percent, 0));
+        }
+        return;
+    }
+    wait = {};
+    client.wait_end();
+    close(std::exchange(fd, -1)); // it may have become another one meanwhile
+    if (!open_local())
+        return finish(CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE);
+    read_error = 0;
+    return is_unknown ? resume() : put();
+}
+
+std::optional<Wait::Clock::time_point> Upload::due() const
+{
+    if (!wait.is_under_way())
+        return {};
+    return wait.reason == CLOUD_CONTENT_SYNC_WAIT_SERVICE_BUSY ? std::min(wait.until, wait.told_until) : wait.until;
 }
 
 bool Upload::open_local()
@@ -92,6 +175,10 @@ void Upload::step()
         transfer_now = nullptr;
         return created ? remove_stored(0) : finish(0);
     }
+    if (wait.is_under_way())
+        return wait_step();
+    if (is_hashing)
+        return hash_some();
     const int now = local.st_size > 0 ? static_cast<int>(sent * 100 / local.st_size) : 0;
     if (is_putting && now > percent) {
         percent = now;
@@ -140,6 +227,8 @@ void Upload::put()
         return finish(CLOUD_CONTENT_SYNC_ERROR_SERVER);
     checksum.emplace();
     sent = 0;
+    // A database that cannot be written costs this knowledge, not the upload.
+    static_cast<void>(client.ledger.sent(who, record, target));
     auto transfer = std::make_unique<Transfer>();
     transfer->method = "PUT";
     transfer->path = target;
@@ -162,7 +251,14 @@ void Upload::put_ended(const Transfer &transfer)
         return finish(read_error);
     if (transfer.result != CURLE_OK)
         return put_unanswered(transfer);
-    if (transfer.status == 412 && lost_reply)
+    if (transfer.asks_to_wait() >= 0)
+        return trouble(transfer.error(), transfer.asks_to_wait());
+    if (transfer.leaves_open() && whole_file_read()) {
+        is_unknown = true;
+        put_error = transfer.error();
+        return look(true, &Upload::refused);
+    }
+    if (transfer.status == 412 && (lost_reply || is_unknown))
         return look(true, &Upload::settled);
     if (transfer.status == 412)
         return try_next_name();
@@ -173,25 +269,43 @@ void Upload::put_ended(const Transfer &transfer)
 
 void Upload::put_unanswered(const Transfer &transfer)
 {
+    if (transfer.never_sent())
+        puts--;
     const bool stalled_midway = transfer.result == CURLE_OPERATION_TIMEDOUT && !whole_file_read();
-    if (transfer.never_sent() || stalled_midway || !client.is_wanted(wanted.id))
+    if (!client.is_wanted(wanted.id))
         return finish(transfer.error());
-    if (lost_reply)
-        return finish(CLOUD_CONTENT_SYNC_ERROR_NETWORK); // the second attempt was lost as well
+    if (transfer.never_sent() || stalled_midway)
+        return trouble(transfer.error());
+    is_unknown = true;
+    put_error = transfer.error();
+    if (!whole_file_read()) // it cannot be told whether it is there, and hardly is
+        return trouble(put_error);
+    look(true, lost_reply ? &Upload::refused : &Upload::settled);
     lost_reply = true;
-    look(true, &Upload::settled);
 }
 
 // After an attempt without an answer: is it there?
 void Upload::settled(const Look &result)
 {
     if (result.error)
-        return finish(result.error);
+        return trouble(result.error, result.retry_after);
     if (result.found == Found::SAME)
         return verified(result);
     if (result.found == Found::ABSENT)
         return put();
+    is_unknown = false;
     try_next_name();
+}
+
+// After an attempt that is not worth another one at once: is it there all the same?
+void Upload::refused(const Look &result)
+{
+    if (result.error)
+        return trouble(result.error, result.retry_after);
+    if (result.found == Found::SAME)
+        return verified(result);
+    is_unknown = result.found == Found::ABSENT;
+    trouble(put_error);
 }
 
 // After a refusal that a folder of that name explains.
@@ -208,7 +322,7 @@ void Upload::try_next_name()
     if (++names_tried > NAMES_MAX)
         return finish(CLOUD_CONTENT_SYNC_ERROR_FORBIDDEN);
     target = join(parent_of(target), next_free_name(name_of(target)));
-    lost_reply = false;
+    lost_reply = is_unknown = false;
     // Looking costs less than sending a body in vain.
     look(false, &Upload::next_name_looked_at);
 }
@@ -216,7 +330,7 @@ void Upload::try_next_name()
 void Upload::next_name_looked_at(const Look &result)
 {
     if (result.error)
-        return finish(result.error);
+        return trouble(result.error, result.retry_after);
     if (result.found == Found::ABSENT)
         return put();
     try_next_name();
@@ -236,20 +350,24 @@ void Upload::stored(const Transfer &transfer)
     const std::string answered = sha256_of(transfer.repr_digest);
     if (answered.empty())
         return look(true, &Upload::verified);
-    verified({answered == digest ? Found::SAME : Found::DIFFERENT, 0});
+    verified({.found = answered == digest ? Found::SAME : Found::DIFFERENT});
 }
 
 void Upload::verified(const Look &result)
 {
-    if (result.error)
-        return finish(result.error);
+    if (result.error) { // it is stored, and nobody has seen how
+        is_unknown = true;
+        return trouble(result.error, result.retry_after);
+    }
     // What differs may be another client's by now, so it stays.
+    is_unknown = false;
     if (result.found != Found::SAME)
         return finish(CLOUD_CONTENT_SYNC_ERROR_CORRUPTED);
+    client.patience.over();
     if (local_changed())
         return remove_stored(CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED);
     const ContentRow row{parent_of(target), name_of(target), local.st_size, time(nullptr), stored_etag};
-    if (!client.report_done(wanted, row, account_identity(client.service, credentials)))
+    if (!client.report_done(wanted, row, who, record))
         return remove_stored(0); // cancelled in the last moment
     ended = true;
 }
@@ -284,21 +402,21 @@ void Upload::looked(const Transfer &transfer, MultistatusReader &reader)
     if (transfer.result != CURLE_OK && look_attempts < LOOKS_MAX)
         return look(look_by_digest, look_done);
     if (transfer.result == CURLE_OK && transfer.status == 404)
-        return finish_look({Found::ABSENT, 0});
+        return finish_look({.found = Found::ABSENT});
     // Services redirect the path of a folder that lacks its final "/".
     if (transfer.result == CURLE_OK && transfer.status >= 300 && transfer.status < 400)
-        return finish_look({Found::DIFFERENT, 0});
+        return finish_look({.found = Found::DIFFERENT});
     if (transfer.result != CURLE_OK || transfer.status != 207)
-        return finish_look({Found::ABSENT, transfer.error()});
+        return finish_look({.error = transfer.error(), .retry_after = transfer.asks_to_wait()});
     if (!reader.finish() || reader.entries.empty())
-        return finish_look({Found::ABSENT, CLOUD_CONTENT_SYNC_ERROR_SERVER});
+        return finish_look({.error = CLOUD_CONTENT_SYNC_ERROR_SERVER});
     const DavEntry &entry = reader.entries.front();
     const bool may_be_same = !entry.is_folder && whole_file_read() && (entry.size < 0 || entry.size == local.st_size);
     if (!look_by_digest || !may_be_same)
-        return finish_look({Found::DIFFERENT, 0});
+        return finish_look({.found = Found::DIFFERENT});
     if (entry.sha256.empty())
         return read_back();
-    finish_look({entry.sha256 == digest ? Found::SAME : Found::DIFFERENT, 0});
+    finish_look({.found = entry.sha256 == digest ? Found::SAME : Found::DIFFERENT});
 }
 
 // The service knows no digests: the file is read back.
@@ -320,13 +438,13 @@ void Upload::read_back()
     transfer->done = [this, sum](Transfer &done) {
         transfer_now = nullptr;
         if (sum->size > local.st_size)
-            return finish_look({Found::DIFFERENT, 0});
+            return finish_look({.found = Found::DIFFERENT});
         if (done.result == CURLE_OK && done.status == 404)
-            return finish_look({Found::ABSENT, 0});
+            return finish_look({.found = Found::ABSENT});
         if (done.result != CURLE_OK || done.status != 200)
-            return finish_look({Found::ABSENT, done.error()});
+            return finish_look({.error = done.error(), .retry_after = done.asks_to_wait()});
         const bool same = digest == sum->checksum.hex();
-        finish_look({same ? Found::SAME : Found::DIFFERENT, 0});
+        finish_look({.found = same ? Found::SAME : Found::DIFFERENT});
     };
     transfer_now = client.http.start(std::move(transfer), credentials);
 }
@@ -353,6 +471,11 @@ void Upload::remove_stored(int error)
 void Upload::finish(int error)
 {
     ended = true;
+    client.wait_end();
+    if (error != 0 && is_unknown)
+        client.ledger.give_up(who, record);
+    else
+        client.ledger.close(who, record);
     // After a cancel nobody is there to be told.
     client.report_failed(wanted, error);
 }

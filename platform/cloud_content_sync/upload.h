@@ -3,6 +3,8 @@
 #include "cloud_content_sync/client.h"
 #include "cloud_content_sync/dav.h"
 #include "cloud_content_sync/digest.h"
+#include "cloud_content_sync/ledger.h"
+#include "cloud_content_sync/patience.h"
 #include <optional>
 #include <sys/stat.h>
 
@@ -20,6 +22,8 @@ class Upload {
     // Reports progress and takes note of a cancel. It is called often, and never from within a libcurl callback, so
     // what it calls may do as it likes.
     void step();
+    // When step() is to be called although nothing moves; nothing: there is no such time.
+    std::optional<std::chrono::steady_clock::time_point> due() const;
     // Breaks it off; what is stored by now stays. The error is that of the last callback.
     void end(int error);
     bool has_ended() const
@@ -32,11 +36,18 @@ class Upload {
     enum class Found { ABSENT, SAME, DIFFERENT };
     struct Look {
         Found found = Found::ABSENT;
-        int error = 0; // not zero: the service could not be asked, `found` means nothing
+        int error = 0;              // not zero: the service could not be asked, `found` means nothing
+        long long retry_after = -1; // seconds that the service has asked for, -1 when it has not
     };
     using LookDone = void (Upload::*)(const Look &);
 
     bool open_local();
+    void resume();
+    void hash_some();
+    void resumed(const Look &look);
+    void refused(const Look &look);
+    void trouble(int error, long long retry_after = -1);
+    void wait_step();
     bool local_changed() const;
     bool local_is_what_was_sent() const;
     size_t read(char *buffer, size_t size);
@@ -75,6 +86,12 @@ class Upload {
     int read_error = 0;
     int puts = 0;
     bool lost_reply = false; // an attempt for `target` ended without an answer
+    bool is_unknown = false; // an attempt may have stored the file under `target`, and nobody has seen it there
+    int put_error = 0;       // of the attempt that is being looked after
+    LedgerRow record;        // in the book of uploads
+    std::string who;         // whose upload it is
+    Wait wait;               // for better times, before the next attempt
+    bool is_hashing = false; // of what an earlier attempt has sent
     bool created = false;    // this request made what is stored under `target`
     std::string stored_etag;
     int names_tried = 0;

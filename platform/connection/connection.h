@@ -47,6 +47,17 @@ enum connection_cellular_state_e {
 int connection_create(connection_h *connection);
 int connection_destroy(connection_h connection);
 
+// Tells when the network may have changed: an address, a link or a route of the kernel (rtnetlink(7)), or the settings
+// store. Nothing polls. OPERATION_FAILED when the kernel refuses.
+typedef struct connection_watch_s *connection_watch_h;
+int connection_watch_create(connection_watch_h *watch);
+int connection_watch_destroy(connection_watch_h watch);
+// A descriptor of the watch's own that can be read (poll(2), POLLIN) once something may have changed.
+int connection_watch_get_fd(connection_watch_h watch, int *fd);
+// Takes note of what has happened, so that the descriptor rests until something else does. OPERATION_FAILED when
+// nothing has.
+int connection_watch_read(connection_watch_h watch);
+
 // The type of the connection that is used by default. Where NetworkManager does not say (it does not manage the
 // interface, or the connection is a tunnel), it is the interface of the default route, or else of a route to a network
 // that is not link-local, by its kind in /sys/class/net.

@@ -14,7 +14,8 @@
 static Backend introduce(const std::string &url)
 {
     const auto descriptions = std::make_shared<TempFolder>();
-    descriptions->file("Test.conf", "[Service]\nStorage=" + url + "/dav/\nApi=" + url + "\nWeb=" + url + "\n");
+    descriptions->file("Test.conf",
+                       "[Service]\nStorage=" + url + "/dav/\nApi=" + url + "\nWeb=" + url + "\nWaitLimit=0\n");
     setenv("CLOUD_SERVICES_DIR", descriptions->path.c_str(), 1);
     EXPECT_EQ(cloud_content_sync_credentials_set("Test", USER, USER, PASSWORD), 0);
     const auto ask = [url](const char *method, const std::string &path, const std::string &body = "") {

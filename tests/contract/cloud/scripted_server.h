@@ -145,14 +145,14 @@ inline constexpr char WRONG_DIGEST[] = "Repr-Digest: sha-256=:AAAAul+wow4m6Dsqxb
 
 class Scripted : public testing::Test {
   protected:
-    void serve(ScriptedServer::Script script, int stall_seconds = 1)
+    void serve(ScriptedServer::Script script, int stall_seconds = 1, int wait_seconds = 0)
     {
         TearDown();
         setenv("CLOUD_SECRETS", "file", 1); // no keyring of whoever runs the tests
         server = std::make_unique<ScriptedServer>(std::move(script));
-        home.file("Test.conf", "[Service]\nStorage=" + server->url + "/r%20t/\nApi=" + server->url +
-                                   "/api/\nWeb=" + server->url +
-                                   "\nAuthTimeout=1\nStallTimeout=" + std::to_string(stall_seconds) + "\n");
+        home.file("Test.conf", "[Service]\nStorage=" + server->url + "/r%20t/\nApi=" + server->url + "/api/\nWeb=" +
+                                   server->url + "\nAuthTimeout=1\nStallTimeout=" + std::to_string(stall_seconds) +
+                                   "\nWaitLimit=" + std::to_string(wait_seconds) + "\n");
         setenv("CLOUD_SERVICES_DIR", home.path.c_str(), 1);
         ASSERT_EQ(cloud_content_sync_credentials_set("Test", nullptr, nullptr, "token"), 0);
         ASSERT_EQ(cloud_content_sync_create("Test", &handle), 0);

@@ -161,10 +161,11 @@ TEST_F(Scripted, what_happens_in_the_middle)
 // What becomes of an upload of "hello", by the answers that the service gives to it one after the other.
 TEST_F(Scripted, an_upload_and_its_answers)
 {
-    constexpr int BAD = CLOUD_CONTENT_SYNC_ERROR_CORRUPTED;
+    constexpr int BAD = CLOUD_CONTENT_SYNC_ERROR_CORRUPTED, NETWORK = CLOUD_CONTENT_SYNC_ERROR_NETWORK,
+                  SERVER = CLOUD_CONTENT_SYNC_ERROR_SERVER;
     const std::string local = scratch.file("hello", "hello"), repr = HELLO_DIGEST, wrong = WRONG_DIGEST;
     const std::string created = answer("201 Created"), none = answer("404 Not Found"), taken = answer("412 Taken");
-    const std::string stored = answer("201 Created", "", repr);
+    const std::string stored = answer("201 Created", "", repr), bad = answer("502 Bad Gateway");
     const auto found = [](const std::string &size, const std::string &hex) {
         const std::string digest = hex.empty() ? "" : "<v:sha256>" + hex + "</v:sha256>";
         return multistatus(file("/r%20t/x.txt", size, digest));
@@ -175,6 +176,9 @@ TEST_F(Scripted, an_upload_and_its_answers)
         int error;
         std::string requests; // first letters of the methods
         std::string landed = "/x.txt";
+        Names again = {}; // the answers to another try after the failure, which succeeds
+        std::string requests_again;
+        int wait_seconds = 0;
     } const rows[] = {
         {"digest in the answer", {stored}, 0, "U"},
         {"wrong digest", {answer("201 Created", "", wrong)}, BAD, "U"},
@@ -186,10 +190,12 @@ TEST_F(Scripted, an_upload_and_its_answers)
         {"vanished", {created, none}, BAD, "UL"},
         {"lost, stored", {"", found("5", HELLO_HEX)}, 0, "UL"},
         {"lost, nothing there", {"", none, stored}, 0, "ULU"},
-        {"lost twice", {"", none, ""}, CLOUD_CONTENT_SYNC_ERROR_NETWORK, "ULU"},
+        {"lost twice, stored", {"", none, "", found("5", HELLO_HEX)}, 0, "ULUL"},
+        {"lost twice", {"", none, "", none}, NETWORK, "ULUL", "/x.txt", {none, stored}, "LU"},
         {"lost, then stored late", {"", none, taken, found("5", HELLO_HEX)}, 0, "ULUL"},
         {"lost, another's file", {"", found("9", "00"), none, stored}, 0, "ULLU", "/x(1).txt"},
-        {"lost, nobody to ask", {"", "", ""}, CLOUD_CONTENT_SYNC_ERROR_NETWORK, "ULL"},
+        {"lost, nobody to ask", {"", "", ""}, NETWORK, "ULL", "/x.txt", {found("5", HELLO_HEX)}, "L"},
+        {"lost and waited for", {"", "", "", found("5", HELLO_HEX)}, 0, "ULLL", "/x.txt", {}, "", 5},
         {"never answered", {"HTTP/1.1 100 Continue\r\n\r\n\x01", none, stored}, 0, "ULU"},
         {"taken twice", {taken, found("1", ""), none, stored}, 0, "ULLU", "/x(2).txt"},
         {"folder of that name",
@@ -201,7 +207,14 @@ TEST_F(Scripted, an_upload_and_its_answers)
         {"400", {answer("400 Bad Request")}, CLOUD_CONTENT_SYNC_ERROR_BAD_NAME, "U"},
         {"401", {answer("401 Unauthorized")}, CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED, "U"},
         {"403", {answer("403 Forbidden")}, CLOUD_CONTENT_SYNC_ERROR_FORBIDDEN, "U"},
-        {"500", {answer("500 Broken")}, CLOUD_CONTENT_SYNC_ERROR_SERVER, "U"},
+        {"500, stored", {answer("500 Broken"), found("5", HELLO_HEX)}, 0, "UL"},
+        {"500, not stored", {answer("500 Broken"), none}, SERVER, "UL", "/x.txt", {none, stored}, "LU"},
+        {"502 to all", {bad, bad}, SERVER, "UL", "/x.txt", {found("5", HELLO_HEX)}, "L"},
+        {"504, another's", {answer("504 Late"), found("9", "00")}, SERVER, "UL", "/x.txt", {stored}, "U"},
+        {"verified by nobody", {created, bad}, SERVER, "UL", "/x.txt", {found("5", HELLO_HEX)}, "L"},
+        {"another's name, 502", {taken, none, bad, bad}, SERVER, "ULUL", "/x(1).txt", {found("5", HELLO_HEX)}, "L"},
+        {"busy", {answer("429 Busy", "", "Retry-After: 1\r\n"), stored}, 0, "UU", "/x.txt", {}, "", 5},
+        {"busy for too long", {answer("503 Busy", "", "Retry-After: 60\r\n")}, SERVER, "U", "/x.txt", {stored}, "U", 5},
         {"307", {answer("307 Moved", "", "Location: http://127.0.0.1:1/\r\n")}, CLOUD_CONTENT_SYNC_ERROR_SERVER, "U"},
         {"507", {answer("507 Full")}, CLOUD_CONTENT_SYNC_ERROR_STORAGE_FULL, "U"},
     };
@@ -209,19 +222,24 @@ TEST_F(Scripted, an_upload_and_its_answers)
         // Before the row's answers an upload succeeds, so that they come on a connection that was used already.
         Names answers = row.answers;
         answers.insert(answers.begin(), stored);
+        answers.insert(answers.end(), row.again.begin(), row.again.end());
         answers.push_back(answer("500 Too many requests"));
         size_t next = 0;
-        serve([&](const Request &) { return answers[std::min(next++, answers.size() - 1)]; });
+        serve([&](const Request &) { return answers[std::min(next++, answers.size() - 1)]; }, 1, row.wait_seconds);
         ASSERT_EQ(upload(handle, local, "/before"), 0) << row.what;
         std::string landed;
         EXPECT_EQ(upload(handle, local, "/x.txt", &landed), row.error) << row.what;
         EXPECT_EQ(landed, row.error ? "" : row.landed) << row.what;
+        if (!row.again.empty()) {
+            EXPECT_EQ(upload(handle, local, "/x.txt", &landed), 0) << row.what;
+            EXPECT_EQ(landed, row.landed) << row.what;
+        }
         std::string requests;
         for (const Request &request : server->requests())
             requests += request.method == "PUT"        ? "U"
                         : request.method == "PROPFIND" ? "L"
                                                        : request.method.substr(0, 1);
-        EXPECT_EQ(requests, "U" + row.requests) << row.what;
+        EXPECT_EQ(requests, "U" + row.requests + row.requests_again) << row.what;
         EXPECT_EQ(server->requests().at(1).connection, 1) << row.what << ": the connection was not kept";
     }
 }
