@@ -260,7 +260,7 @@ static bool step_once(Transfer &transfer, const std::string &bearer)
     return false;
 }
 
-void Http::run(std::chrono::milliseconds wait)
+bool Http::run(std::chrono::milliseconds wait, int)
 {
     std::unique_lock lock(fake().mutex);
     FakeClient &self = fake().clients[this];
@@ -271,16 +271,17 @@ void Http::run(std::chrono::milliseconds wait)
     self.is_woken = false;
     const auto one = next();
     if (one == self.requests.end())
-        return;
+        return false;
     if (fake().held && is_counted(**one))
         fake().permits--;
     if (step_once(**one, self.bearers[*one]))
-        return;
+        return false;
     self.bearers.erase(*one);
     const auto owned = transfers.extract((*one)->easy.get());
     self.requests.erase(one);
     lock.unlock();
     owned.mapped()->done(*owned.mapped());
+    return false;
 }
 
 } // namespace cloud
