@@ -38,8 +38,9 @@ def wait_for(what, condition, seconds=20.0, pause=0.05):
 
 class Device:
     def __init__(self, build, data=None, size="480x800", language=None, scale=None, dark=False,
-                 keep_display=False, maximized=True, secure=False):
+                 keep_display=False, maximized=True, secure=False, wait_limit=None):
         self.build, self.size, self.maximized, self.secure = build, size, maximized, secure
+        self.wait_limit = wait_limit  # seconds that uploads wait for a service in trouble
         self.width = int(size.split("x")[0])
         self.home = tempfile.mkdtemp(prefix="velora-")
         self.data = data or os.path.join(self.home, "cloud")
@@ -209,6 +210,8 @@ class Device:
         self.port = urllib.parse.urlsplit(self.web).port
         with open(os.path.join(self.env["CLOUD_SERVICES_DIR"], "Velora.conf"), "w", encoding="utf-8") as file:
             file.write(f"[Service]\nWeb={self.web}/\nApi={self.web}/\nStorage={self.web}/dav/\n")
+            if self.wait_limit is not None:
+                file.write(f"WaitLimit={self.wait_limit}\n")
             if self.authority:
                 file.write(f"CAFile={self.authority}\n")
         return cloud

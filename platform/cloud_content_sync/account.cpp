@@ -20,7 +20,7 @@ CREATE TABLE IF NOT EXISTS content(parent TEXT NOT NULL, name TEXT NOT NULL, sor
 CREATE INDEX IF NOT EXISTS content_order ON content(parent, sort, name);
 CREATE TABLE IF NOT EXISTS upload(id INTEGER PRIMARY KEY, account TEXT NOT NULL, local_path TEXT NOT NULL,
     server_path TEXT NOT NULL, state INTEGER NOT NULL, target TEXT NOT NULL, at INTEGER NOT NULL);
-CREATE INDEX IF NOT EXISTS upload_paths ON upload(account, local_path, server_path);
+CREATE UNIQUE INDEX IF NOT EXISTS upload_paths ON upload(account, local_path, server_path);
 )";
 static constexpr char INSERT_CONTENT[] =
     "INSERT OR REPLACE INTO content(parent, name, sort, size, mtime, etag) VALUES(?, ?, ?, ?, ?, ?)";
@@ -72,6 +72,14 @@ bool Account::while_signed_in(const std::string &who, const std::function<bool()
 bool Account::write(const std::string &who, const std::function<bool(Db &)> &work)
 {
     return while_signed_in(who, [&] { return work(writer); });
+}
+
+bool Account::write_now(const std::string &who, const std::function<bool(Db &)> &work)
+{
+    if (!write(who, work))
+        return false;
+    std::scoped_lock lock(writing);
+    return writer.run("PRAGMA wal_checkpoint(FULL)");
 }
 
 void Account::read(const std::function<void(const Db &)> &work)

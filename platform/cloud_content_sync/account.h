@@ -45,6 +45,8 @@ class Account {
     // For what other files of the client keep in the database: while_signed_in() with the connection that writes, and
     // `work` with the one that reads, which others wait for.
     bool write(const std::string &who, const std::function<bool(Db &)> &work);
+    // The same, and it is on the disk on return, so that it survives a flat battery.
+    bool write_now(const std::string &who, const std::function<bool(Db &)> &work);
     void read(const std::function<void(const Db &)> &work);
 
     bool folder_exists(const std::string &path);

@@ -73,11 +73,19 @@ int Client::new_request()
     return last_id;
 }
 
-bool Client::cancel(int id)
+bool Client::is_kept(int id)
+{
+    std::scoped_lock lock(mutex);
+    return kept.count(id) > 0;
+}
+
+bool Client::cancel(int id, bool keeps_entry)
 {
     bool was_live = false;
     {
         std::unique_lock lock(mutex);
+        if (keeps_entry)
+            kept.insert(id);
         was_live = live.erase(id) > 0;
         if (!on_own_thread())
             callback_ended.wait(lock, [&] { return calling != id; });

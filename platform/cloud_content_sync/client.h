@@ -53,9 +53,10 @@ class Client : public std::enable_shared_from_this<Client> {
     void stop();
     // *id is written before the request can call back.
     void upload(UploadRequest request, int *id);
+    // With keeps_entry an upload's entry in the book stays, for another process to go on with.
     // False when no such request is queued or running. In both cases no callback of it runs any more on return, but for
     // the one from within which this is called.
-    bool cancel(int id);
+    bool cancel(int id, bool keeps_entry = false);
     void refresh(RefreshRequest request);
     std::optional<std::string> uploaded_path(int id);
     // What the upload that runs waits for, and the seconds until it is tried again.
@@ -86,6 +87,7 @@ class Client : public std::enable_shared_from_this<Client> {
     {
         return network_changed;
     }
+    bool is_kept(int id);
     bool is_wanted(int id); // neither cancelled nor stopped
     // Around a callback of a request. False when the request is not wanted any more: there is no callback then.
     bool begin_callback(int id, bool is_last);
@@ -114,6 +116,7 @@ class Client : public std::enable_shared_from_this<Client> {
     bool stopping = false;
     int last_id = 0;
     int calling = 0;    // request whose callback runs now
+    std::set<int> kept; // were cancelled, but for their entries in the book
     std::set<int> live; // queued or running, and not cancelled
     std::deque<UploadRequest> upload_queue;
     std::vector<RefreshRequest> refresh_queue;

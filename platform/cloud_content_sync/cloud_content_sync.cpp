@@ -423,6 +423,13 @@ int cloud_content_sync_cancel(cloud_content_sync_h handle, int req_id)
     return handle->client->cancel(req_id) ? DONE : NOT_FOUND;
 }
 
+int cloud_content_sync_suspend(cloud_content_sync_h handle, int req_id)
+{
+    if (!handle)
+        return INVALID;
+    return handle->client->cancel(req_id, true) ? DONE : NOT_FOUND;
+}
+
 int cloud_content_sync_credentials_set(const char *service_name, const char *email, const char *user,
                                        const char *secret)
 {

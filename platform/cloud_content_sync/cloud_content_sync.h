@@ -185,7 +185,7 @@ int cloud_content_sync_get_wait(cloud_content_sync_h handle, cloud_content_sync_
 // Enters files in this order, all or none. NO_ACCOUNT, DB_FAILED (a full disk): the uploads themselves do not need it.
 int cloud_content_sync_queue_add(cloud_content_sync_h handle, const char *const *local_paths,
                                  const char *const *server_paths, int count);
-// Takes one entry a file out of those for which no upload has begun. Errors as above; what is not there is none.
+// Takes entries out; those of uploads that have begun go with them. Errors as above; what is not there is none.
 int cloud_content_sync_queue_remove(cloud_content_sync_h handle, const char *const *local_paths,
                                     const char *const *server_paths, int count);
 // Calls back with every entry that has not ended, in order, on the caller's thread, until the callback returns false.
@@ -200,6 +200,8 @@ int cloud_content_sync_get_uploaded_path(cloud_content_sync_h handle, int req_id
 // on return: one that is running is waited for, unless this is called from within it. What it has stored so far is
 // removed. NOT_FOUND when there is no such request or it has had its last callback.
 int cloud_content_sync_cancel(cloud_content_sync_h handle, int req_id);
+// The same for an upload that another process is to go on with: its entry in the book stays.
+int cloud_content_sync_suspend(cloud_content_sync_h handle, int req_id);
 
 // The credentials by which the device's user is known to a service, as a sign-in or a set-up tool leaves them.
 // user null: bearer token in secret (RFC 6750); otherwise HTTP Basic (RFC 7617). secret null: nobody is signed in any

@@ -4,28 +4,34 @@
 namespace cloud {
 
 namespace {
-enum State { WAITING = 0, SENT = 1, GIVEN_UP = 2 };
+// Of a row: 0 waits, 1 was sent to its target, 2 was given up.
 constexpr long long KEPT_SECONDS = 30LL * 24 * 60 * 60; // what was given up may be tried again for so long
 } // namespace
 
-static bool add_row(Stmt &stmt, const std::string &who, const std::string &local, const std::string &server)
+// The row's id; 0 when it cannot be written.
+static long long add_row(Stmt &stmt, const std::string &who, const std::string &local, const std::string &server)
 {
     stmt.reset();
-    return stmt.bind(1, who).bind(2, local).bind(3, server).bind(4, static_cast<long long>(time(nullptr))).done();
+    stmt.bind(1, who).bind(2, local).bind(3, server).bind(4, static_cast<long long>(time(nullptr)));
+    const long long id = stmt.row() ? stmt.integer(0) : 0;
+    return id != 0 && stmt.done() ? id : 0;
 }
 
+// What was given up waits again, with what is known of it.
 static constexpr char INSERT[] =
-    "INSERT INTO upload(account, local_path, server_path, state, target, at) VALUES(?, ?, ?, 0, '', ?)";
+    "INSERT INTO upload(account, local_path, server_path, state, target, at) VALUES(?, ?, ?, 0, '', ?) "
+    "ON CONFLICT(account, local_path, server_path) DO UPDATE SET state = min(state, 1), at = excluded.at "
+    "RETURNING id";
 
 bool Ledger::add(const std::string &who, const LedgerPaths &files)
 {
-    return account.write(who, [&](Db &db) {
+    return account.write_now(who, [&](Db &db) {
         Stmt old(db, "DELETE FROM upload WHERE state = 2 AND at < ?");
         if (!old.bind(1, static_cast<long long>(time(nullptr)) - KEPT_SECONDS).done())
             return false;
         Stmt stmt(db, INSERT);
         for (const auto &[local, server] : files)
-            if (!add_row(stmt, who, local, server))
+            if (add_row(stmt, who, local, server) == 0)
                 return false;
         return true;
     });
@@ -34,8 +40,7 @@ bool Ledger::add(const std::string &who, const LedgerPaths &files)
 bool Ledger::remove(const std::string &who, const LedgerPaths &files)
 {
     return account.write(who, [&](Db &db) {
-        Stmt stmt(db, "DELETE FROM upload WHERE id = (SELECT id FROM upload WHERE account = ? AND local_path = ? "
-                      "AND server_path = ? AND state = 0 ORDER BY id LIMIT 1)");
+        Stmt stmt(db, "DELETE FROM upload WHERE account = ? AND local_path = ? AND server_path = ? AND state < 2");
         for (const auto &[local, server] : files) {
             stmt.reset();
             if (!stmt.bind(1, who).bind(2, local).bind(3, server).done())
@@ -62,8 +67,7 @@ LedgerRow Ledger::begin(const std::string &who, const std::string &local_path, c
 {
     LedgerRow found{0, local_path, server_path, ""};
     account.read([&](const Db &db) {
-        Stmt stmt(db, "SELECT id, target FROM upload WHERE account = ? AND local_path = ? AND server_path = ? "
-                      "ORDER BY target = '', id LIMIT 1");
+        Stmt stmt(db, "SELECT id, target FROM upload WHERE account = ? AND local_path = ? AND server_path = ?");
         if (!stmt.bind(1, who).bind(2, local_path).bind(3, server_path).row())
             return;
         found.id = stmt.integer(0);
@@ -79,9 +83,9 @@ bool Ledger::sent(const std::string &who, LedgerRow &row, const std::string &tar
     return account.write(who, [&](Db &db) {
         if (row.id == 0) {
             Stmt insert(db, INSERT);
-            if (!add_row(insert, who, row.local_path, row.server_path))
+            row.id = add_row(insert, who, row.local_path, row.server_path);
+            if (row.id == 0)
                 return false;
-            row.id = sqlite3_last_insert_rowid(db.handle.get());
         }
         row.target = target;
         Stmt stmt(db, "UPDATE upload SET state = 1, target = ?, at = ? WHERE id = ?");

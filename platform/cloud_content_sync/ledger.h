@@ -24,12 +24,12 @@ class Ledger {
 
     // Files that are going to be uploaded, in this order. All or none; false when they cannot be written.
     bool add(const std::string &who, const LedgerPaths &files);
-    // Takes out one row a pair, of those that wait.
+    // Takes them out, but for those that were given up.
     bool remove(const std::string &who, const LedgerPaths &files);
     // What waits or was under way, in order; not what was given up.
     std::vector<LedgerRow> waiting(const std::string &who);
 
-    // The row that an upload of these paths goes on with: one with a target, else the first that waits, else a new one.
+    // The row that an upload of these paths goes on with; there is one for each pair of paths, or a new one.
     LedgerRow begin(const std::string &who, const std::string &local_path, const std::string &server_path);
     // To be called before a body is sent to `target`.
     bool sent(const std::string &who, LedgerRow &row, const std::string &target);

@@ -474,7 +474,7 @@ void Upload::finish(int error)
     client.wait_end();
     if (error != 0 && is_unknown)
         client.ledger.give_up(who, record);
-    else
+    else if (error != 0 || !client.is_kept(wanted.id))
         client.ledger.close(who, record);
     // After a cancel nobody is there to be told.
     client.report_failed(wanted, error);

@@ -153,6 +153,15 @@ int notification_update_progress(notification_h noti, int priv_id, double progre
     return outcome(done, failed);
 }
 
+int notification_set_heir(notification_h noti, int priv_id, const char *content)
+{
+    if (!noti || !content)
+        return NOTIFICATION_ERROR_INVALID_PARAMETER;
+    bool failed = false;
+    const bool done = store_set_heir(noti->package, priv_id, content, failed);
+    return outcome(done, failed);
+}
+
 int notification_delete(notification_h noti)
 {
     if (!noti)

@@ -88,6 +88,11 @@ notification_h notification_load(const char *pkgname, int priv_id);
 int notification_update_content(notification_h noti, int priv_id, const char *content);
 int notification_update_progress(notification_h noti, int priv_id, double progress);
 
+// Names what is to become of the posted, ongoing notification when its process ends without deleting it, or the machine
+// does: a normal one with this content, and the same title, pictures and launch request.
+// NOTIFICATION_ERROR_NOT_EXIST_ID when it is gone.
+int notification_set_heir(notification_h noti, int priv_id, const char *content);
+
 // Takes the posted notification away; the handle still wants notification_free. NOTIFICATION_ERROR_NOT_EXIST_ID when it
 // was never posted or is gone.
 int notification_delete(notification_h noti);

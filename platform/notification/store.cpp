@@ -13,7 +13,9 @@ constexpr const char *SCHEMA =
     " layout INTEGER NOT NULL, places INTEGER NOT NULL, progress REAL NOT NULL, title TEXT, content TEXT, info TEXT,"
     " info_sub TEXT, icon TEXT, indicator TEXT, launch TEXT, boot TEXT, closed INTEGER NOT NULL DEFAULT 0);"
     // Who posted an ongoing notification. The time of its start tells a process from a later one of the same number.
-    "CREATE TABLE IF NOT EXISTS poster (id INTEGER PRIMARY KEY, pid INTEGER NOT NULL, started INTEGER NOT NULL)";
+    "CREATE TABLE IF NOT EXISTS poster (id INTEGER PRIMARY KEY, pid INTEGER NOT NULL, started INTEGER NOT NULL);"
+    // What an ongoing notification becomes when its poster is gone.
+    "CREATE TABLE IF NOT EXISTS heir (id INTEGER PRIMARY KEY, content TEXT NOT NULL)";
 
 Db *store()
 {
@@ -129,9 +131,17 @@ bool store_forget_orphans()
     posters.reset();
     bool changed = false;
     for (const long long id : orphans) {
-        Stmt remove(*db, "DELETE FROM notification WHERE id = ?1");
+        Stmt inherit(*db,
+                     "UPDATE notification SET type = ?2, flags = 0, layout = ?3, progress = 0, closed = 0, content ="
+                     " (SELECT content FROM heir WHERE heir.id = ?1) WHERE id = ?1 AND id IN (SELECT id FROM heir)");
+        inherit.bind(1, id)
+            .bind(2, static_cast<long long>(NOTIFICATION_TYPE_NOTI))
+            .bind(3, static_cast<long long>(NOTIFICATION_LY_NOTI_EVENT_SINGLE));
+        Stmt remove(*db, "DELETE FROM notification WHERE id = ?1 AND id NOT IN (SELECT id FROM heir)");
         bool failed = false;
+        changed = change(*db, inherit, failed) || changed;
         changed = change(*db, remove.bind(1, id), failed) || changed;
+        Stmt(*db, "DELETE FROM heir WHERE id = ?1").bind(1, id).done();
         Stmt(*db, "DELETE FROM poster WHERE id = ?1").bind(1, id).done();
     }
     return changed;
@@ -188,6 +198,20 @@ bool store_set_progress(const std::string &package, int id, double progress, boo
     Stmt update(*db, "UPDATE notification SET progress = ?3 WHERE id = ?1 AND package = ?2");
     update.bind(1, static_cast<long long>(id)).bind(2, package).bind(3, progress);
     return change(*db, update, failed);
+}
+
+bool store_set_heir(const std::string &package, int id, const char *content, bool &failed)
+{
+    Db *db = store();
+    failed = !db;
+    if (!db)
+        return false;
+    // It is to be there after the machine's next start, whatever becomes of the ongoing one.
+    Stmt last(*db, "UPDATE notification SET boot = NULL WHERE id = ?1 AND package = ?2");
+    if (!change(*db, last.bind(1, static_cast<long long>(id)).bind(2, package), failed))
+        return false;
+    Stmt heir(*db, "INSERT OR REPLACE INTO heir VALUES (?1, ?2)");
+    return change(*db, heir.bind(1, static_cast<long long>(id)).bind(2, content), failed);
 }
 
 bool store_delete(const std::string &package, int id, bool &failed)

@@ -27,11 +27,13 @@ int text_index(int type);
 bool store_insert(notification_s &noti); // gives it its id
 // null: all packages, 0: all ids; a list of all leaves out those that store_forget_orphans would take away
 std::vector<notification_s> store_list(const char *package, int id = 0);
-// Takes away the ongoing notifications of processes that ended without doing so; true when there were any.
+// Takes away the ongoing notifications of processes that ended without doing so, or puts their heirs in their place;
+// true when there were any.
 bool store_forget_orphans();
-// These three are false when there is no such notification or the store fails; `failed` tells which.
+// These four are false when there is no such notification or the store fails; `failed` tells which.
 bool store_set_content(const std::string &package, int id, const char *content, bool &failed);
 bool store_set_progress(const std::string &package, int id, double progress, bool &failed);
+bool store_set_heir(const std::string &package, int id, const char *content, bool &failed);
 bool store_delete(const std::string &package, int id, bool &failed);
 bool store_delete_type(const std::string &package, int type); // NOTIFICATION_TYPE_NONE: both
 void store_set_closed(int id);

@@ -10,6 +10,7 @@
 #include "velora_details_content_sync/velora_details.h"
 #include "velora_setup_wizard/velora_setupwizard.h"
 #include "velora_upload_file/velora_upload_view.h"
+#include "velora_upload_file/velora_uploads.h"
 
 #include <algorithm>
 
@@ -23,7 +24,8 @@ struct Opened {
 std::vector<Opened> opened;
 AppData *app; // the application's one record
 int page_ends, page_abandons;
-char pages[16]; // stand for pages by their addresses
+bool is_something_left; // by an earlier process
+char pages[16];         // stand for pages by their addresses
 
 void page_opened(const char *page, AppData *ad)
 {
@@ -54,6 +56,14 @@ void _velora_setupwizard_view_create(AppData *ad)
 void _velora_signin_setupwizard_create(AppData *ad)
 {
     page_opened("camera upload", ad);
+}
+bool _velora_upload_view_has_left(AppData *)
+{
+    return is_something_left;
+}
+void _velora_upload_view_go_on(AppData *ad, void (*later)(AppData *ad))
+{
+    page_opened(later ? "asks to go on" : "goes on", ad);
 }
 void _velora_details_create(AppData *ad)
 {
@@ -107,9 +117,13 @@ TEST_F(Shell, OpensThePageThatARequestIsFor)
         const char *page; // null: none
         int mode;
         std::vector<std::string> queue;
+        bool is_left = false;
     } cases[] = {
         {{}, true, "details", 0, {}},
         {{}, false, "sign-in", 1, {}},
+        {{}, true, "asks to go on", 0, {}, true},
+        {{}, false, "sign-in", 1, {}, true},
+        {{.operation = tap}, true, "goes on", 4, {}, true},
         {{.launch_mode = "velora_signin"}, true, "details", 4, {}},
         {{.launch_mode = "Velora_Signin"}, true, "sign-in", 1, {}},
         {{.launch_mode = wizard}, false, "welcome", 2, {}},
@@ -129,6 +143,7 @@ TEST_F(Shell, OpensThePageThatARequestIsFor)
         SCOPED_TRACE(testing::Message() << (c.wish.operation ? c.wish.operation : "no operation") << " "
                                         << (c.wish.launch_mode ? c.wish.launch_mode : ""));
         opened.clear();
+        is_something_left = c.is_left;
         std::filesystem::remove(home.path + "/accounts.db");
         if (c.has_account)
             add_account();

@@ -198,4 +198,4 @@ def full(tour):
 
 
 WAYS = {"upload": (upload, {}), "cancel": (cancel, {"service": SLOW}), "remove": (remove, {"service": SLOW}),
-        "retry": (retry, {"service": SLOW}), "full": (full, {"service": ("--quota", "100000")})}
+        "retry": (retry, {"service": SLOW, "wait_limit": 1}), "full": (full, {"service": ("--quota", "100000")})}

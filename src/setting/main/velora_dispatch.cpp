@@ -12,6 +12,7 @@
 #include "velora_details_content_sync/velora_details.h"
 #include "velora_setup_wizard/velora_setupwizard.h"
 #include "velora_upload_file/velora_upload_view.h"
+#include "velora_upload_file/velora_uploads.h"
 #include <cstdlib>
 #include <cstring>
 #include <vector>
@@ -171,6 +172,9 @@ static void __dispatch_details(AppData *ad)
 {
     if (ad->launch_mode == LAUNCH_MODE_NONE && !_velora_pages_are_empty()) {
         _velora_request_finish(ad, _velora_request_last());
+    } else if (__velora_account_exists() == 0 && ad->launch_mode == LAUNCH_MODE_NONE &&
+               _velora_upload_view_has_left(ad)) {
+        _velora_upload_view_go_on(ad, _velora_details_create);
     } else if (__velora_account_exists() == 0) {
         _velora_details_create(ad);
     } else {
@@ -220,7 +224,10 @@ bool __velora_dispatch(AppData *ad, app_control_h request, const char *operation
             elm_win_activate(ad->win_main);
         else
             VELORA_LOGE("ad->win_main is null");
-        __nothing_more(ad);
+        if (ad->win_main && __velora_account_exists() == 0 && _velora_upload_view_has_left(ad))
+            _velora_upload_view_go_on(ad, nullptr);
+        else
+            __nothing_more(ad);
     } else if (g_strcmp0(operation, APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD_RESULT) == 0) {
         __dispatch_upload_result(ad, request);
     } else {

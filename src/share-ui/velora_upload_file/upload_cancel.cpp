@@ -1,5 +1,6 @@
 #include "velora_upload_file/upload_cancel.h"
 #include "velora_common/velora_log.h"
+#include "velora_upload_file/upload_book.h"
 #include "velora_upload_file/upload_notification.h"
 #include "velora_upload_file/upload_progress.h"
 #include "velora_upload_file/upload_row.h"
@@ -14,8 +15,8 @@ static const RunFile *__file_of(const UploadViewData *vd, const UploadItem *item
     return file->item.get() == item ? file : nullptr;
 }
 
-// False when the notification need not tell of it.
-static bool __take_out(UploadItem *item, UploadViewData *vd)
+// False when the notification need not tell of it. What waited is added to *taken.
+static bool __take_out(UploadItem *item, UploadViewData *vd, std::vector<const RunFile *> *taken)
 {
     const RunFile *file = __file_of(vd, item);
     if (!file) { // of a run that has ended meanwhile
@@ -37,6 +38,8 @@ static bool __take_out(UploadItem *item, UploadViewData *vd)
         elm_object_item_del(item->gen_it);
     item->gen_it = nullptr;
     const bool was_running = seen == UPLOAD_STATE_UPLOADING;
+    if (!was_running)
+        taken->push_back(file);
     const int result = was_running ? cloud_content_sync_cancel(run.client.get(), item->request) : 0;
     __worker_wake(run);
     if (result != 0)
@@ -55,15 +58,17 @@ static void __tell_remaining(UploadViewData *vd)
 
 void __uploading_file_mutil_cancel(UploadItem *item, UploadViewData *vd)
 {
-    if (__take_out(item, vd))
-        __tell_remaining(vd);
+    __uploads_cancel(vd, {item});
 }
 
 void __uploads_cancel(UploadViewData *vd, const std::vector<UploadItem *> &items)
 {
+    std::vector<const RunFile *> taken;
     bool is_told = false;
     for (auto item = items.rbegin(); item != items.rend(); ++item)
-        is_told |= __take_out(*item, vd);
+        is_told |= __take_out(*item, vd, &taken);
+    if (!taken.empty())
+        __book_forget(*vd->run, taken);
     if (is_told)
         __tell_remaining(vd);
 }

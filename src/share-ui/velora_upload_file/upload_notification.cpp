@@ -6,8 +6,10 @@
 #include "velora_common/velora_app_data.h"
 #include "velora_common/velora_log.h"
 #include "velora_common/velora_paths.h"
+#include <clocale>
 #include <cstdio>
 #include <ctime>
+#include <libintl.h>
 #include <memory>
 #include <vector>
 
@@ -139,6 +141,9 @@ int __progress_noti_new(const char *text, int *noti_id)
     if (__noti_insert(noti.get(), request.get(), &id) != 0)
         return -1;
     *noti_id = id;
+    __noti_step(notification_set_heir(noti.get(), id,
+                                      dcgettext(VELORA_SHARE_DOMAIN, "IDS_VELORA_BODY_INTERRUPTED", LC_MESSAGES)),
+                "notification_set_heir");
     return 0;
 }
 

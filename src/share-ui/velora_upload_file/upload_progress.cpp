@@ -3,6 +3,7 @@
 #include "velora_upload_file/upload_row.h"
 #include "velora_upload_file/upload_state.h"
 #include "velora_upload_file/upload_text.h"
+#include "velora_upload_file/upload_wait.h"
 #include "velora_upload_file/upload_waiting.h"
 #include <algorithm>
 #include <cstdio>
@@ -52,7 +53,8 @@ static void __show_run(UploadViewData *vd)
     std::snprintf(words, sizeof words, __text("%d of %d · %s of %s"), std::min(report.seen_ended, remaining), remaining,
                   __short_size(sent).c_str(), __short_size(all).c_str());
     const double done = all > 0 ? static_cast<double>(sent) / static_cast<double>(all) : 0;
-    __info_set(vd, words, done);
+    const std::string waiting = __wait_text(run);
+    __info_set(vd, waiting.empty() ? words : waiting.c_str(), done);
 }
 
 static void __show_end(UploadViewData *vd)

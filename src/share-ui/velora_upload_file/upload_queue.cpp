@@ -54,6 +54,13 @@ static Eina_Bool __idler_load_cb(void *data)
     return ECORE_CALLBACK_CANCEL;
 }
 
+void __run_of(UploadViewData *vd, std::vector<UploadItemHold> items, const std::string &folder)
+{
+    __uploads_show(vd, PHASE_UPLOADING);
+    __run_create(vd, std::move(items), folder);
+    ecore_idler_add(__idler_load_cb, vd);
+}
+
 void __btn_upload_cb(void *data, Evas_Object *, void *)
 {
     auto *vd = static_cast<UploadViewData *>(data);
@@ -65,9 +72,7 @@ void __btn_upload_cb(void *data, Evas_Object *, void *)
         return;
     AppData *ad = vd->ad;
     elm_win_lower(ad->win_main); // back to the application that shares, while the files go up
-    __uploads_show(vd, PHASE_UPLOADING);
-    __run_create(vd, __waiting_give(), ad->folder_path ? ad->folder_path : "/");
-    ecore_idler_add(__idler_load_cb, vd);
+    __run_of(vd, __waiting_give(), ad->folder_path ? ad->folder_path : "/");
     if (ad->xwin && ecore_x_display_get())
         ecore_x_icccm_transient_for_unset(ad->xwin);
 }

@@ -31,6 +31,7 @@ struct RunReport {
     gint64 seen_bytes = 0;                         // of the latter; main loop
     std::unique_ptr<std::atomic<bool>[]> selected; // one flag a file; main loop, and the worker when a file has ended
     std::atomic<int> callbacks = 0;                // of transfers that are running; client thread
+    bool waits = false;                            // the notification says what for; client thread
     std::atomic<bool> is_stopping = false;         // the worker has to leave; main loop
     std::counting_semaphore<> wake{0};             // a transfer ended or was cancelled, or the worker has to leave
 };

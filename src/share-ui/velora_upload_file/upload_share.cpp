@@ -6,6 +6,7 @@
 #include "velora_common/velora_pages.h"
 #include "velora_common/velora_popup.h"
 #include "velora_upload_file/upload_browser.h"
+#include "velora_upload_file/upload_left.h"
 #include "velora_upload_file/upload_meta.h"
 #include "velora_upload_file/upload_page.h"
 #include "velora_upload_file/upload_path_bar.h"
@@ -84,12 +85,14 @@ void __browse_begin(UploadViewData *vd)
     __cloud_thumbnails_watch(vd, true);
     __meta_refresh_start(vd);
     __folder_show(vd);
-    if (ad->is_meta_refreshed)
+    if (ad->is_meta_refreshed) {
         __say_nothing_to_upload(vd);
-    else
+        __left_ask(vd);
+    } else {
         _velora_popup_show(ad, {vd, s_wait},
                            _velora_common_create_processing_popup_with_cancel(
                                ad->win_main, "IDS_VELORA_STATE_LOADING_TITLE", __popup_hide_cb, vd));
+    }
 }
 
 bool __next_share_begin(UploadViewData *vd)
@@ -133,6 +136,7 @@ void __share_meta_done(UploadViewData *vd)
         return;
     __folder_show(vd);
     __say_nothing_to_upload(vd);
+    __left_ask(vd);
 }
 
 void __share_meta_changed(UploadViewData *vd)

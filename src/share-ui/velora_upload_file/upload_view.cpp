@@ -12,6 +12,7 @@
 #include "velora_upload_file/upload_browser.h"
 #include "velora_upload_file/upload_cancel.h"
 #include "velora_upload_file/upload_icon.h"
+#include "velora_upload_file/upload_left.h"
 #include "velora_upload_file/upload_list.h"
 #include "velora_upload_file/upload_menu.h"
 #include "velora_upload_file/upload_messages.h"
@@ -34,6 +35,15 @@
 UploadViewData *s_vd = nullptr;
 std::atomic<Ecore_Pipe *> s_view_pipe = nullptr;
 
+// The notification of a run that was cut short outlives the process: then it says that the rest can be uploaded.
+static void __noti_leave(UploadViewData *vd)
+{
+    if (vd->run->queued() > 0)
+        vd->ad->noti_priv_id = -1;
+    else if (vd->run->noti_id != -1)
+        __progress_noti_delete(vd->run->noti_id);
+}
+
 // The worker ends first, then what its callbacks reach; the client itself stays.
 static void __destroy_view(void *data)
 {
@@ -47,8 +57,7 @@ static void __destroy_view(void *data)
     __delete_all_callback_ctxpopup();
     if (vd->run) {
         __worker_stop(vd->run.get());
-        if (vd->run->noti_id != -1)
-            __progress_noti_delete(vd->run->noti_id);
+        __noti_leave(vd);
     }
     if (vd->is_select_mode)
         __selection_cancel(vd);
@@ -75,8 +84,10 @@ static void __destroy_view(void *data)
 static void __abandon_view(void *data)
 {
     auto *vd = static_cast<UploadViewData *>(data);
-    if (vd->run)
+    if (vd->run) {
         __worker_stop(vd->run.get());
+        __noti_leave(vd);
+    }
     s_view_pipe = nullptr;
     vd->client = nullptr;
     vd->run = nullptr;
@@ -138,6 +149,23 @@ static void __say_no_client(UploadViewData *vd)
                            vd->ad->win_main, "IDS_CLOUD_BODY_SERVER_ERROR_OCCURRED_TRY_LATER", __popup_exit_cb, vd));
 }
 
+static UploadViewData *__view_build(AppData *ad)
+{
+    _velora_common_local_data_connect();
+    VELORA_LOGI("Create velora upload file view");
+    auto *vd = s_vd = new UploadViewData;
+    vd->ad = ad;
+    _velora_pages_add(ad, vd, {__destroy_view, __abandon_view, __has_files});
+    __page_create(vd, __btn_back_cb, __more_create_folder_cb);
+    __item_classes_create(vd);
+    vd->genlist = __genlist_create(vd);
+    s_view_pipe = vd->pipe = _velora_common_pipe_add(__pipe_cb, vd);
+    vd->client = _velora_common_client_get(ad);
+    if (!vd->client)
+        __say_no_client(vd);
+    return vd;
+}
+
 void _velora_upload_view_create(AppData *ad)
 {
     if (!ad) {
@@ -153,24 +181,48 @@ void _velora_upload_view_create(AppData *ad)
         __reenter(s_vd);
         return;
     }
-    _velora_common_local_data_connect();
-    VELORA_LOGI("Create velora upload file view");
-    auto *vd = s_vd = new UploadViewData;
-    vd->ad = ad;
-    _velora_pages_add(ad, vd, {__destroy_view, __abandon_view, __has_files});
-    __page_create(vd, __btn_back_cb, __more_create_folder_cb);
-    __item_classes_create(vd);
-    vd->genlist = __genlist_create(vd);
-    s_view_pipe = vd->pipe = _velora_common_pipe_add(__pipe_cb, vd);
-    vd->client = _velora_common_client_get(ad);
-    if (!vd->client) {
-        __say_no_client(vd);
-    } else if (ad->launch_mode == LAUNCH_MODE_UPLOAD_RESULT) {
+    UploadViewData *vd = __view_build(ad);
+    if (!vd->client)
+        return;
+    if (ad->launch_mode == LAUNCH_MODE_UPLOAD_RESULT) {
         __result_show(vd);
     } else {
         __waiting_take(ad);
         __browse_begin(vd);
     }
+}
+
+static void (*s_later)(AppData *ad);
+
+static void __give_way(AppData *ad)
+{
+    __destroy_view(s_vd);
+    s_later(ad);
+}
+
+static void __later_job(void *data)
+{
+    if (data == s_vd)
+        _velora_pages_go_on(s_vd->ad, s_vd, __give_way);
+}
+
+void _velora_upload_view_go_on(AppData *ad, void (*later)(AppData *ad))
+{
+    const bool is_new = !s_vd;
+    UploadViewData *vd = is_new ? __view_build(ad) : s_vd;
+    if (!is_new)
+        _velora_pages_join(ad, vd);
+    if (!vd->client)
+        return;
+    if (!later) {
+        __left_go_on(vd);
+        return;
+    }
+    s_later = later;
+    if (is_new)
+        __uploads_show(vd, PHASE_ENDED);
+    // The popup's button must not end under its own click.
+    __left_ask(vd, [](UploadViewData *view) { ecore_job_add(__later_job, view); });
 }
 
 void __signed_in_again(AppData *)

@@ -2,8 +2,10 @@
 #include "velora_common/velora_log.h"
 #include "velora_common/velora_pipe.h"
 #include "velora_common/velora_thread.h"
+#include "velora_upload_file/upload_book.h"
 #include "velora_upload_file/upload_notification.h"
 #include "velora_upload_file/upload_text.h"
+#include "velora_upload_file/upload_wait.h"
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
@@ -62,6 +64,7 @@ static void __transfer_report(const RunFile &file, int state, int progress, int 
     while (seen != UPLOAD_STATE_CANCELED && !item->state.compare_exchange_weak(seen, state))
         ;
     __send_of(file, __is_end_state(state) ? "store" : "update");
+    __wait_noti_update(*file.run);
     __show_progress(*file.run, progress / 100.0);
 }
 
@@ -101,7 +104,9 @@ static bool __transfer(const RunFile &file)
     while (__is_under_way(item) && !run.report.is_stopping)
         static_cast<void>(run.report.wake.try_acquire_for(std::chrono::seconds(1)));
     // A cancel on the main loop may come before it can know the request; nothing of it may run on behind our back.
-    if (refused == 0 && !__is_end_state(item->state))
+    if (refused == 0 && run.report.is_stopping)
+        cloud_content_sync_suspend(run.client.get(), req_id); // the next process goes on with it
+    else if (refused == 0 && !__is_end_state(item->state))
         cloud_content_sync_cancel(run.client.get(), req_id);
     // The last callback may still be on its way out; the file is its until then.
     while (run.report.callbacks > 0)
@@ -170,11 +175,15 @@ void *__thread_upload_file(void *data)
         return nullptr;
     }
     RunResult result;
+    std::vector<const RunFile *> passed; // which may have been taken out before they were entered
     VELORA_LOGI("uploading!");
+    __book_enter(*run);
     for (const RunFile &file : run->files) {
         run->report.current = file.index;
-        if (file.item->state != UPLOAD_STATE_WAITING)
+        if (file.item->state != UPLOAD_STATE_WAITING) {
+            passed.push_back(&file);
             continue;
+        }
         __progress_noti_set_count(run->noti_id, run->report.success + run->report.fail, run->remaining());
         if (!__transfer(file))
             return nullptr; // the view is being taken down: nobody to report to
@@ -187,6 +196,11 @@ void *__thread_upload_file(void *data)
         if (run->remaining() <= 0)
             __run_send(*run, "end");
     }
+    if (result.is_storage_full)
+        for (const RunFile &file : run->files)
+            if (file.item->state == UPLOAD_STATE_WAITING)
+                passed.push_back(&file); // they count as failed
+    __book_forget(*run, passed);
     __run_end(*run, result);
     return nullptr;
 }

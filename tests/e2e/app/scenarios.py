@@ -94,11 +94,17 @@ def application_killed(person):
     wait_for("the service to let go of half a file", lambda: not os.listdir(os.path.join(person.data, "tmp")))
     person.request.wait(20)
     person.has_stored({})
+    person.notified("Upload interrupted")
     small = person.file("small")
-    person.upload(small)
+    person.share(small)
+    person.sees("Go on uploading?", "2 files have not been uploaded yet.")
+    person.click("Upload", "Elm_Button")
+    person.hurry()
+    person.notified("2 files", "Upload complete")
+    person.choose()  # for the other one
     person.finished("small", "Upload complete")
     person.leave()
-    person.has_stored({"small": small})
+    person.has_stored({"one": paths[0], "two": paths[1], "small": small})
 
 
 def window_closed(person):
@@ -111,6 +117,14 @@ def window_closed(person):
     person.ends()
     wait_for("the service to let go of half a file", lambda: not os.listdir(os.path.join(person.data, "tmp")))
     person.has_stored({name: path for name, path in paths.items() if f"{FOLDER}/{name}" in person.all_files()})
+    person.notified("Upload interrupted")
+    person.tap_icon()
+    person.click("Upload", "Elm_Button")
+    person.hurry()
+    person.finished("Upload complete")
+    person.raise_window()
+    person.key("Escape")
+    person.has_stored(paths)
 
 
 def no_bus(person):
