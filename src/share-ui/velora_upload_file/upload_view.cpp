@@ -35,15 +35,6 @@
 UploadViewData *s_vd = nullptr;
 std::atomic<Ecore_Pipe *> s_view_pipe = nullptr;
 
-// The notification of a run that was cut short outlives the process: then it says that the rest can be uploaded.
-static void __noti_leave(UploadViewData *vd)
-{
-    if (vd->run->queued() > 0)
-        vd->ad->noti_priv_id = -1;
-    else if (vd->run->noti_id != -1)
-        __progress_noti_delete(vd->run->noti_id);
-}
-
 // The worker ends first, then what its callbacks reach; the client itself stays.
 static void __destroy_view(void *data)
 {
@@ -57,7 +48,8 @@ static void __destroy_view(void *data)
     __delete_all_callback_ctxpopup();
     if (vd->run) {
         __worker_stop(vd->run.get());
-        __noti_leave(vd);
+        if (vd->run->noti_id != -1)
+            __progress_noti_delete(vd->run->noti_id);
     }
     if (vd->is_select_mode)
         __selection_cancel(vd);
@@ -86,7 +78,8 @@ static void __abandon_view(void *data)
     auto *vd = static_cast<UploadViewData *>(data);
     if (vd->run) {
         __worker_stop(vd->run.get());
-        __noti_leave(vd);
+        if (vd->run->queued() > 0)
+            vd->ad->noti_priv_id = -1; // it stays, and says from now on that the rest can be uploaded
     }
     s_view_pipe = nullptr;
     vd->client = nullptr;
