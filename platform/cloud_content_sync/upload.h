@@ -36,7 +36,7 @@ class Upload {
     };
     using LookDone = void (Upload::*)(const Look &);
 
-    bool open_local();
+    int open_local();
     bool local_changed() const;
     bool local_is_what_was_sent() const;
     size_t read(char *buffer, size_t size);
