@@ -2,6 +2,7 @@
 #include <algorithm>
 #include <cstdlib>
 #include <cstring>
+#include <unordered_map>
 
 namespace {
 constexpr struct {
@@ -94,33 +95,61 @@ GVariant *request_to_variant(const app_control_s &request)
     return g_variant_builder_end(&dictionary);
 }
 
+namespace {
+// Values are taken child by child: whoever asks GLib for a part by a format or a key gets all of it made one block
+// first, and in a block it finds the n-th text by looking at all before it.
+struct VariantUnref {
+    void operator()(GVariant *variant) const
+    {
+        g_variant_unref(variant);
+    }
+};
+using Variant = std::unique_ptr<GVariant, VariantUnref>;
+
+Variant child(const Variant &parent, gsize index)
+{
+    return Variant(g_variant_get_child_value(parent.get(), index));
+}
+
+void extra_from_variant(const Variant &entries, app_control_s &request)
+{
+    std::unordered_map<std::string, size_t> places; // a sender may give any number of keys
+    const gsize count = g_variant_n_children(entries.get());
+    for (gsize i = 0; i < count; i++) {
+        const Variant entry = child(entries, i), texts = child(entry, 2);
+        Extra extra{
+            g_variant_get_bytestring(child(entry, 0).get()), g_variant_get_boolean(child(entry, 1).get()) != 0, {}};
+        const gsize length = g_variant_n_children(texts.get());
+        if (!extra.array && length != 1)
+            continue;
+        extra.values.reserve(length);
+        for (gsize at = 0; at < length; at++)
+            extra.values.emplace_back(g_variant_get_bytestring(child(texts, at).get()));
+        const auto [place, is_new] = places.emplace(extra.key, request.extra.size());
+        if (is_new)
+            request.extra.push_back(std::move(extra));
+        else
+            request.extra[place->second] = std::move(extra);
+    }
+}
+} // namespace
+
 void request_from_variant(GVariant *dictionary, app_control_s &request)
 {
-    for (const auto &[name, field] : text_fields) {
-        const char *text = nullptr;
-        if (g_variant_lookup(dictionary, name, "^&ay", &text))
-            request.*field = text;
+    const Variant whole(g_variant_ref(dictionary));
+    const gsize count = g_variant_n_children(dictionary);
+    for (gsize i = 0; i < count; i++) {
+        const Variant pair = child(whole, i), name = child(pair, 0);
+        const Variant value(g_variant_get_variant(child(pair, 1).get()));
+        const std::string key = g_variant_get_string(name.get(), nullptr);
+        for (const auto &[text_name, field] : text_fields)
+            if (key == text_name && g_variant_is_of_type(value.get(), G_VARIANT_TYPE_BYTESTRING))
+                request.*field = g_variant_get_bytestring(value.get());
+        if (key == "window" && g_variant_is_of_type(value.get(), G_VARIANT_TYPE_UINT32))
+            request.window = g_variant_get_uint32(value.get());
+        if (key == "extra" && g_variant_is_of_type(value.get(), G_VARIANT_TYPE("a(aybaay)")))
+            extra_from_variant(value, request);
     }
-    g_variant_lookup(dictionary, "window", "u", &request.window);
-    GVariantIter *entries = nullptr;
-    if (!g_variant_lookup(dictionary, "extra", "a(aybaay)", &entries))
-        return;
-    while (GVariant *entry = g_variant_iter_next_value(entries)) {
-        const char *key = nullptr;
-        gboolean array = FALSE;
-        GVariantIter *texts = nullptr;
-        g_variant_get(entry, "(^&aybaay)", &key, &array, &texts);
-        std::vector<std::string> values;
-        while (GVariant *text = g_variant_iter_next_value(texts)) {
-            values.emplace_back(g_variant_get_bytestring(text));
-            g_variant_unref(text);
-        }
-        if (array || values.size() == 1)
-            request.set(key, array, std::move(values));
-        g_variant_iter_free(texts);
-        g_variant_unref(entry);
-    }
-    g_variant_iter_free(entries);
 }
 
 int app_control_create(app_control_h *request)

@@ -104,8 +104,9 @@ int app_control_foreach_app_matched(app_control_h request, app_control_app_match
 // application or one that is not installed goes to what the desktop has for it. APP_NOT_FOUND: nobody takes the
 // request; LAUNCH_REJECTED: the program could not be started. With NONE a callback that is not null runs exactly once,
 // later: SUCCEEDED, FAILED or CANCELED as the receiver replied, SUCCEEDED when an ordinary program was started,
-// CANCELED when the receiver left without a reply, FAILED when it could not be reached. There is no time limit: a
-// person may be at work there.
+// CANCELED when the receiver left without a reply, FAILED when it could not be reached or turned the request down,
+// which it does while 1,000 requests, or 128 MiB of them, wait there for their answer. There is no time limit: a person
+// may be at work there.
 int app_control_send_launch_request(app_control_h request, app_control_reply_cb callback, void *user_data);
 
 // Answers a received request (or its clone). `reply` may be null. INVALID_PARAMETER: the request was not received from

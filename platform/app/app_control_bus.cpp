@@ -2,6 +2,7 @@
 #include "app/bus.h"
 #include "base/base.h"
 #include <algorithm>
+#include <atomic>
 
 namespace {
 constexpr char introspection[] = R"(<node>
@@ -18,6 +19,11 @@ constexpr char introspection[] = R"(<node>
 
 enum { request_name_do_not_queue = 4, request_name_exists = 3 }; // as D-Bus numbers them for RequestName
 
+// What may wait for an answer here, so that nobody can fill the memory: so many requests, and while so many bytes wait
+// no further one.
+constexpr int waiting_max = 1000;
+constexpr size_t waiting_bytes_max = size_t{128} << 20;
+
 struct Receiver {
     std::string id;
     std::vector<std::string> aliases;
@@ -26,12 +32,77 @@ struct Receiver {
     std::vector<guint> objects;
     std::vector<std::weak_ptr<Answer>> answers;
     bool leaving = false;
+    guint gate = 0;
 };
 
 Receiver &receiver()
 {
     static Receiver the;
     return the;
+}
+
+// Shared with the bus's thread.
+std::atomic<int> waiting;
+std::atomic<size_t> waiting_bytes;
+std::atomic<const std::vector<std::string> *> object_paths; // never freed
+
+// The place of a request that has passed the gate, until it is answered.
+class Place {
+  public:
+    explicit Place(GVariant *parameters) : bytes(g_variant_get_size(parameters)) {}
+    Place(const Place &) = delete;
+    Place &operator=(const Place &) = delete;
+    ~Place()
+    {
+        waiting--;
+        waiting_bytes -= bytes;
+    }
+
+  private:
+    const size_t bytes;
+};
+
+// Whether method_called is going to get this message.
+bool is_request(GDBusMessage *message)
+{
+    static constexpr struct {
+        const char *interface, *member, *signature;
+    } calls[] = {
+        {"com.orvant.AppControl", "Launch", "a{sv}"},
+        {"org.freedesktop.Application", "Activate", "a{sv}"},
+        {"org.freedesktop.Application", "Open", "asa{sv}"},
+        {"org.freedesktop.Application", "ActivateAction", "sava{sv}"},
+    };
+    const std::vector<std::string> *paths = object_paths.load();
+    const char *path = g_dbus_message_get_path(message);
+    return path && paths && g_dbus_message_get_body(message) && std::ranges::find(*paths, path) != paths->end() &&
+           std::ranges::any_of(calls, [message](const auto &call) {
+               return g_strcmp0(g_dbus_message_get_interface(message), call.interface) == 0 &&
+                      g_strcmp0(g_dbus_message_get_member(message), call.member) == 0 &&
+                      g_strcmp0(g_dbus_message_get_signature(message), call.signature) == 0;
+           });
+}
+
+// On the bus's thread: a flood is turned away here and never reaches the main loop.
+GDBusMessage *pass_gate(GDBusConnection *bus, GDBusMessage *message, gboolean incoming, gpointer)
+{
+    if (!incoming || g_dbus_message_get_message_type(message) != G_DBUS_MESSAGE_TYPE_METHOD_CALL ||
+        !is_request(message))
+        return message;
+    // This thread alone adds.
+    if (waiting < waiting_max && waiting_bytes < waiting_bytes_max) {
+        waiting++;
+        waiting_bytes += g_variant_get_size(g_dbus_message_get_body(message));
+        return message;
+    }
+    if (!(g_dbus_message_get_flags(message) & G_DBUS_MESSAGE_FLAGS_NO_REPLY_EXPECTED)) {
+        GDBusMessage *refusal = g_dbus_message_new_method_error_literal(
+            message, "org.freedesktop.DBus.Error.LimitsExceeded", "too many requests wait here for their answer");
+        g_dbus_connection_send_message(bus, refusal, G_DBUS_SEND_MESSAGE_FLAGS_NONE, nullptr, nullptr);
+        g_object_unref(refusal);
+    }
+    g_object_unref(message);
+    return nullptr;
 }
 
 void finish_launch(GDBusMethodInvocation *invocation, const app_control_s *reply, app_control_result_e result)
@@ -49,15 +120,16 @@ void finish_launch(GDBusMethodInvocation *invocation, const app_control_s *reply
     g_dbus_method_invocation_return_value(invocation, g_variant_new("(@a{sv})", g_variant_dict_end(&answer)));
 }
 
-app_control_h launch_request(GVariant *parameters, GDBusMethodInvocation *invocation)
+app_control_h launch_request(GVariant *parameters, GDBusMethodInvocation *invocation, std::shared_ptr<Place> place)
 {
     auto *request = new app_control_s;
     GVariant *record = g_variant_get_child_value(parameters, 0);
     request_from_variant(record, *request);
     g_variant_unref(record);
-    request->answer = std::make_shared<Answer>([invocation](const app_control_s *reply, app_control_result_e result) {
-        finish_launch(invocation, reply, result);
-    });
+    request->answer = std::make_shared<Answer>(
+        [invocation, kept = std::move(place)](const app_control_s *reply, app_control_result_e result) {
+            finish_launch(invocation, reply, result);
+        });
     bus_watch_answer(request->answer);
     return request;
 }
@@ -104,19 +176,21 @@ void method_called(GDBusConnection *, const char *, const char *, const char *, 
                    GVariant *parameters, GDBusMethodInvocation *invocation, gpointer)
 {
     Receiver &the = receiver();
+    auto place = std::make_shared<Place>(parameters);
     if (the.leaving) {
         g_dbus_method_invocation_return_dbus_error(invocation, BUS_ERROR_LEAVING, "the application is ending");
         return;
     }
     const std::string name = method;
     if (name == "Launch") {
-        the.receive(launch_request(parameters, invocation));
+        the.receive(launch_request(parameters, invocation, std::move(place)));
         return;
     }
     app_control_h request = name == "Open"             ? open_request(parameters)
                             : name == "ActivateAction" ? action_request(parameters)
                                                        : new app_control_s;
-    request->answer = std::make_shared<Answer>([](const app_control_s *, app_control_result_e) {});
+    request->answer =
+        std::make_shared<Answer>([kept = std::move(place)](const app_control_s *, app_control_result_e) {});
     g_dbus_method_invocation_return_value(invocation, nullptr);
     the.receive(request);
 }
@@ -247,6 +321,12 @@ Role bus_own(std::function<void(app_control_h)> receive)
         return Role::alone;
     the.leaving = false;
     the.receive = std::move(receive);
+    auto *paths = new std::vector<std::string>;
+    for (const std::string &name : bus_own_ids())
+        paths->push_back(bus_path(name));
+    object_paths = paths;
+    if (!the.gate)
+        the.gate = g_dbus_connection_add_filter(bus_connection(), pass_gate, nullptr, nullptr);
     // the objects come first: whoever sees the name finds them
     for (const std::string &name : bus_own_ids())
         export_object(name);

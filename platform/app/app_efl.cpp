@@ -22,6 +22,7 @@ struct Application {
     bool paused = false;
     Ecore_Timer *service_timer = nullptr;
     std::deque<std::unique_ptr<app_control_s>> queue;
+    bool queue_begun = false;
     std::vector<Evas_Object *> windows;        // watched ones
     std::vector<Evas_Object *> hidden_windows; // those of them that are iconified or hidden
 };
@@ -93,10 +94,18 @@ void watch_windows()
     }
 }
 
+Eina_Bool handle_next(void *);
+
 void handle_request(void *)
 {
+    if (app.queue.empty())
+        return;
     const auto request = std::move(app.queue.front());
     app.queue.pop_front();
+    // First, for the callback may run a loop of its own.
+    app.queue_begun = !app.queue.empty();
+    if (app.queue_begun)
+        ecore_timer_add(0.0, handle_next, nullptr);
     g_clear_pointer(&app.service_timer, ecore_timer_del);
     follow_language();
     if (app.callbacks->app_control)
@@ -104,12 +113,19 @@ void handle_request(void *)
     watch_windows();
 }
 
+Eina_Bool handle_next(void *)
+{
+    handle_request(nullptr);
+    return ECORE_CALLBACK_CANCEL;
+}
+
 // Requests are handled from a job: the callback may take its time or run a loop, and one that ends the application
-// finds a running loop.
+// finds a running loop. One in each turn of the loop, so that many requests do not keep everything else waiting.
 void queue_request(app_control_h request)
 {
     app.queue.emplace_back(request);
-    ecore_job_add(handle_request, nullptr);
+    if (!std::exchange(app.queue_begun, true))
+        ecore_job_add(handle_request, nullptr);
 }
 
 // Seconds without a request until a program started for one gives up.

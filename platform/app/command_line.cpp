@@ -16,11 +16,11 @@ constexpr char reply_prefix[] = "reply: ";
 
 void append_to_array(app_control_s &request, const std::string &key, const std::string *value)
 {
-    const Extra *have = request.find(key);
-    std::vector<std::string> values = have && have->array ? have->values : std::vector<std::string>();
-    if (value)
-        values.push_back(*value);
-    request.set(key, true, std::move(values));
+    const auto have = std::ranges::find(request.extra, key, &Extra::key);
+    if (have == request.extra.end() || !have->array)
+        request.set(key, true, value ? std::vector{*value} : std::vector<std::string>());
+    else if (value)
+        have->values.push_back(*value);
 }
 
 std::string file_argument(const std::string &argument)

@@ -168,7 +168,8 @@ bool start_ordinary(GAppInfo *info, const app_control_s &request)
             texts.push_back(escaped_uri(path));
     GList *uris = nullptr;
     for (const std::string &text : texts)
-        uris = g_list_append(uris, const_cast<char *>(text.c_str()));
+        uris = g_list_prepend(uris, const_cast<char *>(text.c_str()));
+    uris = g_list_reverse(uris);
     GError *error = nullptr;
     const bool started = g_app_info_launch_uris(info, uris, nullptr, &error);
     g_list_free(uris);

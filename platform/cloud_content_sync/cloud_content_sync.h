@@ -32,13 +32,14 @@ enum cloud_content_sync_error_e {
     CLOUD_CONTENT_SYNC_ERROR_NETWORK = 20,       // the service cannot be reached
     CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED = 21,  // the service refuses the credentials (401)
     CLOUD_CONTENT_SYNC_ERROR_SERVER = 22,        // the service answered with another error
-    CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE = 23,    // the local file is missing, unreadable or not a regular file
+    CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE = 23,    // the local file is missing, unreadable or a folder
     CLOUD_CONTENT_SYNC_ERROR_CORRUPTED = 24,     // what is stored is not what was sent
     CLOUD_CONTENT_SYNC_ERROR_FORBIDDEN = 25,     // the service refuses the operation (403, 409, 423)
     CLOUD_CONTENT_SYNC_ERROR_STORAGE_FULL = 26,  // the account's storage is full (507)
     CLOUD_CONTENT_SYNC_ERROR_BAD_NAME = 27,      // the service cannot store a file of this name
     CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED = 28, // the local file changed while it was sent
     CLOUD_CONTENT_SYNC_ERROR_CERTIFICATE = 29,   // the service's certificate is not to be trusted; of a sign-in alone
+    CLOUD_CONTENT_SYNC_ERROR_LOCAL_PRIVATE = 32, // the local file is not one that somebody can have meant to upload
 };
 // States of a transfer and of a refresh. Callbacks bring RUNNING, DONE and FAILED; what is queued is silent.
 enum cloud_content_sync_state_e {
@@ -162,7 +163,8 @@ int cloud_content_sync_name_get_next(const char *name, char **next);
 // callback.
 //
 // cb may be null. A null or empty argument answers INVALID_PARAMETER and there is no request; all else is reported by
-// the callback: NO_ACCOUNT, LOCAL_FILE, BAD_NAME (also for a server_path that is not absolute or has an empty, "." or
+// the callback: NO_ACCOUNT, LOCAL_FILE, LOCAL_PRIVATE, BAD_NAME (also for a server_path that is not absolute or has an
+// empty, "." or
 // ".." segment), FORBIDDEN (also when the folder does not exist), STORAGE_FULL, CORRUPTED, UNAUTHORIZED, SERVER,
 // NETWORK (also when nothing moves for a minute, or no answer comes for five minutes after the last byte), and
 // LOCAL_CHANGED: what was stored of the changed file is then removed.
@@ -193,6 +195,10 @@ int cloud_content_sync_queue_remove(cloud_content_sync_h handle, const char *con
 typedef bool (*cloud_content_sync_queue_cb)(const char *local_path, const char *server_path, void *user_data);
 int cloud_content_sync_queue_foreach(cloud_content_sync_h handle, cloud_content_sync_queue_cb cb, void *user_data);
 
+// Whether an upload would take this local file as it is now: LOCAL_FILE; LOCAL_PRIVATE for a file of the client's own,
+// of another user who has not opened it to everybody, and for what is no file with data: a device, a socket, a pipe, a
+// file that the system makes up. Uploads decide for themselves by the file that they have open. Reads the file system.
+int cloud_content_sync_check_local(const char *local_path);
 // Where a finished upload really landed (it may be the next free name). Known until the handle is destroyed, and within
 // the last callback already; NOT_FOUND for a request that has not succeeded.
 int cloud_content_sync_get_uploaded_path(cloud_content_sync_h handle, int req_id, char **server_path);

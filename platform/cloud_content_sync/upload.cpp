@@ -1,8 +1,8 @@
 #include "cloud_content_sync/upload.h"
+#include "cloud_content_sync/local_file.h"
 #include "cloud_content_sync/names.h"
 #include <algorithm>
 #include <cerrno>
-#include <fcntl.h>
 #include <unistd.h>
 #include <utility>
 #include <vector>
@@ -35,8 +35,8 @@ void Upload::start()
     target = wanted.server_path;
     if (!path_is_valid(target) || target == "/")
         return finish(CLOUD_CONTENT_SYNC_ERROR_BAD_NAME);
-    if (!open_local())
-        return finish(CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE);
+    if (const int error = open_local())
+        return finish(error);
     percent = 0;
     client.report_progress(wanted, percent);
     if (record.target.empty())
@@ -109,8 +109,8 @@ void Upload::wait_step()
     wait = {};
     client.wait_end();
     close(std::exchange(fd, -1)); // it may have become another one meanwhile
-    if (!open_local())
-        return finish(CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE);
+    if (const int error = open_local())
+        return finish(error);
     read_error = 0;
     return is_unknown ? resume() : put();
 }
@@ -122,14 +122,14 @@ std::optional<Wait::Clock::time_point> Upload::due() const
     return wait.reason == CLOUD_CONTENT_SYNC_WAIT_SERVICE_BUSY ? std::min(wait.until, wait.told_until) : wait.until;
 }
 
-bool Upload::open_local()
+int Upload::open_local()
 {
-    // A FIFO without a writer would block the open of a plain O_RDONLY.
-    fd = open(wanted.local_path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
-    if (fd < 0 || fstat(fd, &local) != 0 || !S_ISREG(local.st_mode))
-        return false;
+    int error = CLOUD_CONTENT_SYNC_ERROR_NONE;
+    fd = local_file_open(wanted.local_path, &local, &error);
     char more = 0; // what the system makes up as it is read has no size to go by
-    return local.st_size > 0 || pread(fd, &more, 1, 0) == 0;
+    if (!error && local.st_size == 0 && pread(fd, &more, 1, 0) != 0)
+        return CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE;
+    return error;
 }
 
 // The whole file once more, by which a change of its data is told from one of its name or its permissions.

@@ -41,13 +41,13 @@ class Upload {
     };
     using LookDone = void (Upload::*)(const Look &);
 
-    bool open_local();
     void resume();
     void hash_some();
     void resumed(const Look &look);
     void refused(const Look &look);
     void trouble(int error, long long retry_after = -1);
     void wait_step();
+    int open_local();
     bool local_changed() const;
     bool local_is_what_was_sent() const;
     size_t read(char *buffer, size_t size);

@@ -100,8 +100,18 @@ class Shell : public Application {
             if (reply.reply)
                 app_control_get_extra_data(reply.reply, "result", &result);
             const CString owned(result);
-            all.push_back(reply.sender + (reply.result == APP_CONTROL_RESULT_SUCCEEDED ? " succeeded " : " canceled ") +
-                          (result ? result : "-"));
+            char **refused = nullptr;
+            int count = 0;
+            if (reply.reply)
+                app_control_get_extra_data_array(reply.reply, "refused", &refused, &count);
+            all.push_back(reply.sender +
+                          (reply.result == APP_CONTROL_RESULT_SUCCEEDED  ? " succeeded "
+                           : reply.result == APP_CONTROL_RESULT_CANCELED ? " canceled "
+                                                                         : " failed ") +
+                          (count    ? refused[0]
+                           : result ? result
+                                    : "-"));
+            g_strfreev(refused);
         }
         return all;
     }
@@ -136,6 +146,8 @@ TEST_F(Shell, OpensThePageThatARequestIsFor)
         {{.operation = share, .uri = "/a/b 100%.jpg"}, true, "upload", 7, {"/a/b 100%.jpg"}},
         {{.operation = share, .uri = "/a"}, false, "sign-in", 7, {"/a"}},
         {{.operation = shares, .paths = {"/b", "file:///a", "/b"}}, true, "upload", 7, {"/b", "/a", "/b"}},
+        {{.operation = shares, .paths = {"/b", "/dev/null"}}, true, "upload", 7, {"/b"}},
+        {{.operation = shares, .paths = {"/dev/null"}}, true, nullptr, 0, {}},
         {{.operation = tap}, true, nullptr, 0, {}},
         {{.operation = result_tap, .paths = {"/x"}, .display_type = "fail"}, true, "upload", 8, {"/x"}},
     };
@@ -192,6 +204,10 @@ TEST_F(Shell, AnswersThoseWhoWait)
         bool is_settings_waiting = false;
     } cases[] = {
         {"share", {{.operation = share, .sender = "a"}}, {"a succeeded -"}},
+        {"all refused", {{.operation = share, .uri = "/dev/null", .sender = "a"}}, {"a failed /dev/null"}},
+        {"one refused",
+         {{.operation = shares, .paths = {"/dev/null", "/a"}, .sender = "a"}},
+         {"a succeeded /dev/null"}},
         {"wizard", {{.launch_mode = wizard, .sender = "a"}}, {"a succeeded rbutton_skip"}, "rbutton_skip"},
         {"settings", {{.operation = configure, .sender = "a"}}, {"a canceled -"}, "lbutton_click"},
         {"settings that wait", {{.operation = configure, .sender = "a"}}, {"a succeeded -"}, nullptr, true},

@@ -1,6 +1,8 @@
 // Which page a launch request opens.
 #include "account/account.h"
+#include "cloud_content_sync/cloud_content_sync.h"
 #include "main/velora_shell.h"
+#include "notification/notification.h"
 #include "velora_add_account_content_sync/velora_signin.h"
 #include "velora_add_account_content_sync_setup_wizard/velora_signin_setupwizard.h"
 #include "velora_common/velora_account.h"
@@ -13,8 +15,11 @@
 #include "velora_setup_wizard/velora_setupwizard.h"
 #include "velora_upload_file/velora_upload_view.h"
 #include "velora_upload_file/velora_uploads.h"
+#include <clocale>
 #include <cstdlib>
 #include <cstring>
+#include <libintl.h>
+#include <string>
 #include <vector>
 
 static int __velora_get_launch_mode(const char *mode_string)
@@ -101,26 +106,66 @@ static void __queue_paths(AppData *ad, char **uris, int count)
     ad->upload_list = _velora_upload_items_append(ad->upload_list, paths.data(), static_cast<int>(paths.size()));
 }
 
-static void __queue_shared(AppData *ad, app_control_h request)
+// Takes what nobody can have meant to share out of the paths. Only so many are looked at here, as the person waits;
+// what comes behind them is refused when its turn comes to be uploaded.
+static std::vector<std::string> __refuse_private(std::vector<char *> *paths)
 {
-    char *operation = nullptr;
-    app_control_get_operation(request, &operation);
-    if (g_strcmp0(operation, APP_CONTROL_OPERATION_SHARE) == 0) {
-        char *uri = nullptr;
-        if (app_control_get_uri(request, &uri) == APP_CONTROL_ERROR_NONE && uri)
-            __queue_paths(ad, &uri, 1);
-        std::free(uri);
-    } else {
-        char **paths = nullptr;
-        int count = 0;
-        app_control_get_extra_data_array(request, APP_CONTROL_DATA_PATH, &paths, &count);
-        __queue_paths(ad, paths, count);
-        __string_array_free(&paths, &count);
+    constexpr size_t looked_at = 1000;
+    std::vector<std::string> refused;
+    std::vector<char *> others;
+    for (size_t i = 0; i < paths->size(); i++) {
+        const char *path = __convert_uri_to_path((*paths)[i]);
+        if (i < looked_at && cloud_content_sync_check_local(path) == CLOUD_CONTENT_SYNC_ERROR_LOCAL_PRIVATE)
+            refused.emplace_back(path);
+        else
+            others.push_back((*paths)[i]);
     }
-    std::free(operation);
+    *paths = std::move(others);
+    return refused;
 }
 
-// False when the network popup is showing instead. What was shared before there was a network comes along.
+static void __say_refused(const std::vector<std::string> &refused)
+{
+    if (refused.empty())
+        return;
+    g_autofree char *name = g_filename_display_basename(refused.front().c_str());
+    for (char *at = name; *at; at++)
+        if (g_ascii_iscntrl(*at))
+            *at = '?';
+    std::string text = name;
+    if (refused.size() > 1)
+        text += " (+" + std::to_string(refused.size() - 1) + ")";
+    text += std::string(": ") + dcgettext(VELORA_DOMAIN, "IDS_VELORA_BODY_FILE_NOT_SHARED", LC_MESSAGES);
+    notification_status_message_post(text.c_str());
+}
+
+// Queues the files of the first share that is held, which is then taken. False when all of them were refused.
+static bool __queue_held(AppData *ad, app_control_h request)
+{
+    char *operation = nullptr, *uri = nullptr, **array = nullptr;
+    int count = 0;
+    std::vector<char *> paths;
+    app_control_get_operation(request, &operation);
+    if (g_strcmp0(operation, APP_CONTROL_OPERATION_SHARE) == 0) {
+        if (app_control_get_uri(request, &uri) == APP_CONTROL_ERROR_NONE && uri)
+            paths.push_back(uri);
+    } else {
+        app_control_get_extra_data_array(request, APP_CONTROL_DATA_PATH, &array, &count);
+        paths.assign(array, array + count);
+    }
+    std::vector<std::string> refused = __refuse_private(&paths);
+    __queue_paths(ad, paths.data(), static_cast<int>(paths.size()));
+    __say_refused(refused);
+    const bool is_left = refused.empty() || !paths.empty();
+    _velora_request_held_taken(ad, std::move(refused), paths.size());
+    std::free(operation);
+    std::free(uri);
+    __string_array_free(&array, &count);
+    return is_left;
+}
+
+// False when no page is opened: the network popup is showing instead, or every file was refused. What was shared before
+// there was a network comes along.
 static bool __dispatch_share(AppData *ad)
 {
     ad->is_welcome_shown = false;
@@ -133,9 +178,12 @@ static bool __dispatch_share(AppData *ad)
         return false;
     }
     ad->launch_mode = LAUNCH_MODE_SHARE;
-    while (app_control_h held = _velora_request_held()) {
-        __queue_shared(ad, held);
-        _velora_request_held_taken();
+    bool is_left = false;
+    while (app_control_h held = _velora_request_held())
+        is_left |= __queue_held(ad, held);
+    if (!is_left) {
+        _velora_request_finish(ad, _velora_request_last());
+        return false;
     }
     if (__velora_account_exists() == 0)
         _velora_upload_view_create(ad);

@@ -15,6 +15,7 @@ struct Request {
     bool is_share = false;
     bool is_held = false;
     std::optional<std::string> result;
+    std::vector<std::string> refused; // of what was shared
 };
 
 static std::vector<Request> s_requests; // in the order in which they came
@@ -71,10 +72,15 @@ app_control_h _velora_request_held()
     return held == s_requests.end() ? nullptr : held->control;
 }
 
-void _velora_request_held_taken()
+void _velora_request_held_taken(AppData *ad, std::vector<std::string> refused, size_t others)
 {
-    if (const auto held = std::ranges::find(s_requests, true, &Request::is_held); held != s_requests.end())
-        held->is_held = false;
+    const auto held = std::ranges::find(s_requests, true, &Request::is_held);
+    if (held == s_requests.end())
+        return;
+    held->is_held = false;
+    held->refused = std::move(refused);
+    if (!held->refused.empty() && others == 0)
+        _velora_request_answer(ad, held->number, APP_CONTROL_RESULT_FAILED);
 }
 
 static void __reply(const Request &request, app_control_result_e result)
@@ -85,6 +91,11 @@ static void __reply(const Request &request, app_control_result_e result)
     if (request.result &&
         app_control_add_extra_data(reply, "result", request.result->c_str()) != APP_CONTROL_ERROR_NONE)
         VELORA_LOGE("app_control_add_extra_data failed");
+    std::vector<const char *> refused;
+    for (const std::string &path : request.refused)
+        refused.push_back(path.c_str());
+    if (!refused.empty())
+        app_control_add_extra_data_array(reply, "refused", refused.data(), static_cast<int>(refused.size()));
     if (app_control_reply_to_launch_request(reply, request.control, result) != APP_CONTROL_ERROR_NONE)
         VELORA_LOGE("app_control_reply_to_launch_request failed");
     app_control_destroy(reply);

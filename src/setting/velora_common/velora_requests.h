@@ -4,6 +4,8 @@
 // A reply is expected by whoever shares, by the setup wizard, and by everyone while the settings application's cloud
 // page waits. Requests are known by numbers, which are never given out twice; 0 stands for none. Main loop only.
 #include "velora_common/velora_app_data.h"
+#include <string>
+#include <vector>
 
 // Keeps a clone of a request, which becomes the last one and AppData's `app_control`. Its number.
 int _velora_request_add(AppData *ad, app_control_h request);
@@ -19,8 +21,9 @@ void _velora_request_result_set(int number, const char *result);
 void _velora_request_hold_last();
 // The first share that is held, or null. It is the library's until it is answered.
 app_control_h _velora_request_held();
-// The first held share is taken now.
-void _velora_request_held_taken();
+// The first held share is taken now, but for `refused`, some paths of it that are not uploaded, and of `others` that
+// are: its sender finds them in the reply, as the array "refused". With no others it is answered, as one that failed.
+void _velora_request_held_taken(AppData *ad, std::vector<std::string> refused, size_t others);
 
 // Answers a request if it expects an answer, and forgets it.
 void _velora_request_answer(AppData *ad, int number, app_control_result_e result);

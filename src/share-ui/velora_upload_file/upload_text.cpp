@@ -66,6 +66,8 @@ const char *__failure_text(int error)
         return __text("IDS_VELORA_BODY_SIGN_IN_AGAIN");
     case CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE:
         return __text("IDS_VELORA_BODY_FILE_MISSING");
+    case CLOUD_CONTENT_SYNC_ERROR_LOCAL_PRIVATE:
+        return __text("IDS_VELORA_BODY_FILE_PRIVATE");
     case CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED:
         return __text("IDS_VELORA_BODY_FILE_CHANGED");
     case CLOUD_CONTENT_SYNC_ERROR_FORBIDDEN:

@@ -5,6 +5,7 @@
 #include "temp_home.h"
 #include <algorithm>
 #include <atomic>
+#include <csignal>
 #include <gtest/gtest.h>
 #include <map>
 
@@ -194,6 +195,27 @@ TEST_F(Bus, EveryRequestEndsOnce)
     EXPECT_TRUE(run_until([&] { return open.calls == 1; }));
     EXPECT_EQ(open.result, APP_CONTROL_RESULT_CANCELED);
     EXPECT_EQ(send("echo", nullptr, {}, "com.example.missing"), APP_CONTROL_ERROR_APP_NOT_FOUND);
+}
+
+TEST_F(Bus, MoreRequestsThanMayWaitAreRefused)
+{
+    const pid_t toy = std::stoi(exchange("echo")["pid"]);
+    // Without replies, for the bus has a limit of its own for those.
+    const auto keep = [](int count) {
+        app_control_s request;
+        request.operation = APP_CONTROL_OPERATION_PREFIX "keep";
+        for (int i = 0; i < count; i++)
+            g_dbus_connection_call(bus_connection(), "com.example.toy", "/com/example/toy", "com.orvant.AppControl",
+                                   "Launch", g_variant_new("(@a{sv})", request_to_variant(request)), nullptr,
+                                   G_DBUS_CALL_FLAGS_NONE, -1, nullptr, nullptr, nullptr);
+    };
+    keep(900);
+    EXPECT_EQ(exchange("echo").result, APP_CONTROL_RESULT_SUCCEEDED);
+    keep(200);
+    EXPECT_EQ(exchange("echo").result, APP_CONTROL_RESULT_FAILED);
+    kill(toy, SIGKILL);
+    EXPECT_TRUE(run_until([] { return !bus_name_owned("com.example.toy"); }));
+    EXPECT_EQ(exchange("echo").result, APP_CONTROL_RESULT_SUCCEEDED);
 }
 
 TEST_F(Bus, TakesTheDesktopsCalls)

@@ -1,6 +1,8 @@
 // What any cloud client promises, whatever the service behind it.
 #include "backend.h"
+#include "base/base.h"
 #include <atomic>
+#include <fcntl.h>
 #include <filesystem>
 #include <fstream>
 #include <mutex>
@@ -221,15 +223,34 @@ TEST_P(Transfers, what_cannot_be_uploaded_is_told_by_the_callback)
     const std::string closed = scratch.file("closed", "closed");
     ASSERT_EQ(mkfifo(fifo.c_str(), 0600), 0);
     ASSERT_EQ(chmod(closed.c_str(), 0), 0);
+    const std::string own = platform_data_dir() + "/cloud/Test.credentials", linked = scratch.path + "/linked",
+                      hard_linked = scratch.path + "/hard", foreign = scratch.file("foreign", "x"),
+                      open_to_all = scratch.file("open", "x");
+    ASSERT_EQ(symlink(own.c_str(), linked.c_str()), 0);
+    ASSERT_EQ(link(own.c_str(), hard_linked.c_str()), 0);
+    chmod(foreign.c_str(), 0640);
+    chmod(open_to_all.c_str(), 0644);
+    if (geteuid() == 0) { // nobody else can give files away
+        ASSERT_EQ(chown(foreign.c_str(), 1, 0), 0);
+        ASSERT_EQ(chown(open_to_all.c_str(), 1, 0), 0);
+    }
+    const int opened = ::open(fine.c_str(), O_RDONLY | O_CLOEXEC);
     struct Row {
         std::string local, server;
         int error;
     } const rows[] = {
         {scratch.path + "/missing", "/a", CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE},
         {scratch.path, "/a", CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE},
-        {fifo, "/a", CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE},
-        {"/dev/null", "/a", CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE},
-        {"/proc/self/status", "/a", CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE},
+        {fifo, "/a", CLOUD_CONTENT_SYNC_ERROR_LOCAL_PRIVATE},
+        {"/dev/null", "/a", CLOUD_CONTENT_SYNC_ERROR_LOCAL_PRIVATE},
+        {"/proc/self/status", "/a", CLOUD_CONTENT_SYNC_ERROR_LOCAL_PRIVATE},
+        {"/sys/kernel/uevent_seqnum", "/a", CLOUD_CONTENT_SYNC_ERROR_LOCAL_PRIVATE},
+        {"/proc/self/fd/" + std::to_string(opened), "/a", CLOUD_CONTENT_SYNC_ERROR_LOCAL_PRIVATE},
+        {own, "/a", CLOUD_CONTENT_SYNC_ERROR_LOCAL_PRIVATE},
+        {linked, "/a", CLOUD_CONTENT_SYNC_ERROR_LOCAL_PRIVATE},
+        {hard_linked, "/a", CLOUD_CONTENT_SYNC_ERROR_LOCAL_PRIVATE},
+        {foreign, "/a", geteuid() == 0 ? CLOUD_CONTENT_SYNC_ERROR_LOCAL_PRIVATE : 0},
+        {open_to_all, "/a", 0},
         {closed, "/a", access(closed.c_str(), R_OK) == 0 ? 0 : CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE},
         {fine, "/", CLOUD_CONTENT_SYNC_ERROR_BAD_NAME},
         {fine, "relative", CLOUD_CONTENT_SYNC_ERROR_BAD_NAME},
@@ -239,6 +260,7 @@ TEST_P(Transfers, what_cannot_be_uploaded_is_told_by_the_callback)
     };
     for (const Row &row : rows)
         EXPECT_EQ(upload(handle, row.local, row.server), row.error) << row.local << " -> " << row.server;
+    close(opened);
     backend->go_down();
     EXPECT_EQ(upload(handle, fine, "/a"), CLOUD_CONTENT_SYNC_ERROR_NETWORK);
 }
