@@ -19,6 +19,7 @@ UPLOAD_VIEW = (
     "record worker",
     "signin",
     "names page path_bar row state",
+    "listed",
     "meta progress thumbnails types",
     "cancel icon open",
     "browser select",

@@ -169,11 +169,11 @@ static Changes &__changes()
     return *the;
 }
 
-// Writes what may be written now, with the lock held. 0, or -1 when there is no such notification.
-static int __changes_write(Changes &changes)
+// Writes what may be written by `time`, with the lock held. 0, or -1 when there is no such notification.
+static int __changes_write(Changes &changes, NotiPace::Time time = std::chrono::steady_clock::now())
 {
     int result = 0;
-    while (const std::optional<NotiChange> change = changes.pace.take(std::chrono::steady_clock::now())) {
+    while (const std::optional<NotiChange> change = changes.pace.take(time)) {
         const Notification noti = __noti_load(change->noti_id);
         if (!noti) {
             VELORA_LOGE("notification_load failed");
@@ -237,6 +237,12 @@ int __progress_noti_set_count(int noti_id, int finished, int remaining)
 int __progress_noti_set_progress(int noti_id, double progress)
 {
     return __change({.noti_id = noti_id, .progress = progress});
+}
+
+void __progress_noti_flush()
+{
+    const std::lock_guard hold(__changes().lock);
+    __changes_write(__changes(), NotiPace::Time::max());
 }
 
 int __progress_noti_delete(int noti_id)

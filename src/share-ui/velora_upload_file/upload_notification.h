@@ -11,6 +11,8 @@ int __progress_noti_set_content(int noti_id, const char *text);
 int __progress_noti_set_count(int noti_id, int finished, int remaining);
 // progress: 0.0 to 1.0.
 int __progress_noti_set_progress(int noti_id, double progress);
+// Writes at once what waits for its time: the person has done something, and looks for what it did.
+void __progress_noti_flush();
 // 0 also when it is gone already; -1 for an id that is none.
 int __progress_noti_delete(int noti_id);
 
