@@ -58,14 +58,27 @@ static void __upload_row_append(UploadViewData *vd, size_t nth, int type)
     __row_tappable_set(record->gen_it, __is_tappable(vd, type));
 }
 
-// Makes rows ahead of what has been seen, more than any window shows.
-static Eina_Bool __more_rows_cb(void *data)
+static constexpr int slice = 4; // rows that are made at once: the list needs milliseconds to measure each
+
+// Makes some rows more. False when there are enough: more than any window shows beyond what has been seen.
+static bool __rows_make(UploadViewData *vd, int count)
 {
     constexpr int ahead = 100;
-    auto *vd = static_cast<UploadViewData *>(data);
-    for (; s_listed.next < s_listed.total() && s_listed.appended < s_listed.seen + ahead; s_listed.next++)
-        if (const int type = __type_of(s_listed.next); type != ITEM_TYPE_CONTENT)
-            __upload_row_append(vd, s_listed.next, type);
+    for (; s_listed.next < s_listed.total() && s_listed.appended < s_listed.seen + ahead; s_listed.next++) {
+        const int type = __type_of(s_listed.next);
+        if (type == ITEM_TYPE_CONTENT)
+            continue;
+        if (count-- == 0)
+            return true;
+        __upload_row_append(vd, s_listed.next, type);
+    }
+    return false;
+}
+
+static Eina_Bool __more_rows_cb(void *data)
+{
+    if (__rows_make(static_cast<UploadViewData *>(data), slice))
+        return ECORE_CALLBACK_RENEW;
     s_listed.more = nullptr;
     return ECORE_CALLBACK_CANCEL;
 }
@@ -106,7 +119,8 @@ static void __row_gone(const ItemData *)
 static void __listed_begin(UploadViewData *vd, Listed listed)
 {
     s_listed = std::move(listed);
-    __more_rows_cb(vd);
+    if (__rows_make(vd, slice))
+        __more_rows(vd);
 }
 
 void __listed_show_run(UploadViewData *vd, RunHold run, Evas_Smart_Cb tapped)

@@ -38,6 +38,8 @@ static Eina_Bool __idler_load_cb(void *data)
     // The view went away before the loop was idle, or something else has the list.
     if (s_vd != vd || !vd->run || vd->run->is_joinable)
         return ECORE_CALLBACK_CANCEL;
+    if (!__run_prepare(vd, 0.01))
+        return ECORE_CALLBACK_RENEW;
     __run_begin(vd);
     if (vd->phase == PHASE_UPLOADING)
         __run_rows_show(vd);
