@@ -14,10 +14,13 @@ import sys
 SHORT_HEADER = 20
 # The files of the upload view without "upload_" and ending, from the bottom up: each knows those of earlier lines alone.
 UPLOAD_VIEW = (
+    "pace",
     "notification run text waiting",
+    "book wait",
     "record worker",
     "signin",
     "names page path_bar row state",
+    "listed",
     "meta progress thumbnails types",
     "cancel icon open",
     "browser select",
@@ -25,6 +28,7 @@ UPLOAD_VIEW = (
     "list start",
     "retry",
     "queue",
+    "left",
     "result share",
     "messages",
     "view",

@@ -1,6 +1,6 @@
 #include "velora_upload_file/upload_browser.h"
-#include "velora_common/velora_genlist.h"
 #include "velora_common/velora_log.h"
+#include "velora_upload_file/upload_listed.h"
 #include "velora_upload_file/upload_meta.h"
 #include "velora_upload_file/upload_open.h"
 #include "velora_upload_file/upload_path_bar.h"
@@ -179,7 +179,7 @@ static void __again_cb(void *data, Evas_Object *, void *)
 void __folder_show(UploadViewData *vd)
 {
     const bool was_focused = elm_object_focus_get(vd->genlist);
-    remove_genlist_item(vd->genlist);
+    __listed_clear(vd);
     // What is there before the first refresh may be half a tree, or another account's.
     const ViewState unreachable = __meta_state(vd);
     const bool is_signed_out = unreachable == VIEW_STATE_SIGNED_OUT;

@@ -51,6 +51,7 @@ static void __tell_remaining(UploadViewData *vd)
 {
     const UploadRun &run = *vd->run;
     __progress_noti_set_count(run.noti_id, run.report.success + run.report.fail, run.remaining());
+    __progress_noti_flush();
     __progress_line_update(vd);
     if (run.remaining() < 1)
         __run_send(run, "end");

@@ -3,6 +3,7 @@
 #include "velora_upload_file/upload_cancel.h"
 #include "velora_upload_file/upload_icon.h"
 #include "velora_upload_file/upload_keys.h"
+#include "velora_upload_file/upload_listed.h"
 #include "velora_upload_file/upload_page.h"
 #include "velora_upload_file/upload_text.h"
 #include <cstdlib>
@@ -175,21 +176,11 @@ Evas_Object *__genlist_create(UploadViewData *vd)
     elm_object_style_set(genlist, "dialogue");
     elm_genlist_mode_set(genlist, ELM_LIST_COMPRESS);
     evas_object_smart_callback_add(genlist, "language,changed", __language_changed_cb, nullptr);
+    __listed_watch(genlist);
     __list_keys_add(genlist);
     evas_object_show(genlist);
     elm_object_part_content_set(vd->layout, "elm.swallow.genlist", genlist);
     return genlist;
-}
-
-void __upload_row_append(UploadViewData *vd, UploadItem *item, const char *name, int type, Evas_Smart_Cb tapped)
-{
-    auto *record = new ItemData;
-    record->name = name;
-    record->type = type;
-    record->item.reset(_velora_upload_item_ref(item));
-    Elm_Genlist_Item_Class *const classes[] = {nullptr, vd->itc_uploading, vd->itc_file, vd->itc_fail};
-    __row_append(vd, classes[type], record, tapped);
-    __row_tappable_set(record->gen_it, type == ITEM_TYPE_FAILED || vd->is_select_mode);
 }
 
 void __upload_row_restyle(UploadViewData *vd, Elm_Object_Item *row, int type)
@@ -198,7 +189,7 @@ void __upload_row_restyle(UploadViewData *vd, Elm_Object_Item *row, int type)
     record->type = type;
     Elm_Genlist_Item_Class *const classes[] = {nullptr, vd->itc_uploading, vd->itc_file, vd->itc_fail};
     elm_genlist_item_item_class_update(row, classes[type]);
-    __row_tappable_set(row, type == ITEM_TYPE_FAILED || (vd->is_select_mode && type == ITEM_TYPE_UPLOADING));
+    __row_tappable_set(row, __is_tappable(vd, type));
     elm_genlist_item_update(row);
 }
 
@@ -209,6 +200,8 @@ void __upload_row_progress(const UploadItem *item)
         VELORA_LOGI("upload_item->gen_it is NULL");
         return;
     }
+    if (!__row_record(item->gen_it)->is_realized) // it is made anew when it comes into sight
+        return;
     const int state = item->state;
     Evas_Object *bar = elm_object_item_part_content_get(item->gen_it, "elm.swallow.progressbar");
     if (bar && state == UPLOAD_STATE_UPLOADING && g_strcmp0(elm_object_style_get(bar), "list_progress") == 0) {

@@ -6,8 +6,6 @@ Evas_Object *__genlist_create(UploadViewData *vd);
 void __item_classes_create(UploadViewData *vd);
 void __item_classes_free(UploadViewData *vd);
 
-// Appends the row of an upload, of a type that is not ITEM_TYPE_CONTENT; `tapped` is called with its record.
-void __upload_row_append(UploadViewData *vd, UploadItem *item, const char *name, int type, Evas_Smart_Cb tapped);
 // Makes an upload's row one of another type.
 void __upload_row_restyle(UploadViewData *vd, Elm_Object_Item *row, int type);
 // Shows how far an upload is in its row.

@@ -3,6 +3,7 @@
 #include "velora_common/velora_log.h"
 #include "velora_common/velora_pages.h"
 #include "velora_upload_file/upload_list.h"
+#include "velora_upload_file/upload_listed.h"
 #include "velora_upload_file/upload_menu.h"
 #include "velora_upload_file/upload_notification.h"
 #include "velora_upload_file/upload_open.h"
@@ -80,7 +81,7 @@ static void __run_ended(UploadViewData *vd)
         elm_win_activate(vd->ad->win_main); // they are waiting for an answer
         return;
     }
-    if (!elm_genlist_first_item_get(vd->genlist) && vd->phase == PHASE_ENDED)
+    if (vd->phase == PHASE_ENDED && __listed_is_empty(vd))
         __state_show(vd, VIEW_STATE_STOPPED);
     __progress_line_update(vd);
     const auto is_failed_so = [](const RunFile &file) {
@@ -121,7 +122,8 @@ static void __item_message(UploadViewData *vd, const Message &message)
         __row_store(vd, file);
     else
         __upload_row_progress(file.item.get());
-    __progress_line_update(vd);
+    if (vd->phase == PHASE_UPLOADING) // the line may be about a result that is looked at meanwhile
+        __progress_line_update(vd);
 }
 
 static void __run_message(UploadViewData *vd, const Message &message)

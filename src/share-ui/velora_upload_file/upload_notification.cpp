@@ -1,4 +1,3 @@
-// The ongoing notification of a running queue, and the result that stays behind. No state of its own: any thread.
 #include "velora_upload_file/upload_notification.h"
 #include "app/app_control.h"
 #include "notification/notification.h"
@@ -6,11 +5,16 @@
 #include "velora_common/velora_app_data.h"
 #include "velora_common/velora_log.h"
 #include "velora_common/velora_paths.h"
+#include "velora_upload_file/upload_pace.h"
 #include <clocale>
+#include <condition_variable>
 #include <cstdio>
 #include <ctime>
 #include <libintl.h>
 #include <memory>
+#include <mutex>
+#include <thread>
+#include <utility>
 #include <vector>
 
 struct NotificationFree {
@@ -156,16 +160,76 @@ static Notification __noti_load(int noti_id)
     return Notification(notification_load(VELORA_SHARE_PACKAGE, noti_id));
 }
 
-int __progress_noti_set_content(int noti_id, const char *text)
+// The changes that wait for their time. It is left behind when the process ends, for its thread may be at work.
+struct Changes {
+    std::mutex lock; // held while one is written, so that they are written in their order
+    std::condition_variable offered;
+    NotiPace pace;
+    bool is_served = false; // by a thread
+};
+
+static Changes &__changes()
 {
-    const Notification noti = __noti_load(noti_id);
-    if (!noti) {
-        if (noti_id >= 1)
+    static Changes *the = new Changes;
+    return *the;
+}
+
+// Writes what may be written by `time`, with the lock held. 0, or -1 when there is no such notification.
+static int __changes_write(Changes &changes, NotiPace::Time time = std::chrono::steady_clock::now())
+{
+    int result = 0;
+    while (const std::optional<NotiChange> change = changes.pace.take(time)) {
+        const Notification noti = __noti_load(change->noti_id);
+        if (!noti) {
             VELORA_LOGE("notification_load failed");
+            result = -1;
+        } else if (change->content)
+            notification_update_content(noti.get(), change->noti_id, change->content->c_str());
+        else
+            notification_update_progress(noti.get(), change->noti_id, change->progress);
+        changes.pace.wrote(std::chrono::steady_clock::now());
+    }
+    return result;
+}
+
+// Sees to what was offered too early to be written, and leaves when nothing has been for a while.
+static void __changes_serve()
+{
+    constexpr std::chrono::seconds patience(2);
+    Changes &changes = __changes();
+    std::unique_lock hold(changes.lock);
+    while (true) {
+        if (const std::optional<NotiPace::Time> due = changes.pace.due())
+            changes.offered.wait_until(hold, *due);
+        else if (!changes.offered.wait_for(hold, patience, [&changes] { return changes.pace.due().has_value(); }))
+            break;
+        __changes_write(changes);
+    }
+    changes.is_served = false;
+}
+
+static int __change(NotiChange change)
+{
+    if (change.noti_id < 1) {
+        VELORA_LOGE("Invalid noti id");
         return -1;
     }
-    notification_update_content(noti.get(), noti_id, text);
-    return 0;
+    Changes &changes = __changes();
+    const std::lock_guard hold(changes.lock);
+    const bool was_waiting = changes.pace.due().has_value();
+    changes.pace.offer(std::move(change));
+    const int result = __changes_write(changes);
+    if (was_waiting || !changes.pace.due())
+        return result;
+    if (!std::exchange(changes.is_served, true))
+        std::thread(__changes_serve).detach();
+    changes.offered.notify_one();
+    return result;
+}
+
+int __progress_noti_set_content(int noti_id, const char *text)
+{
+    return __change({.noti_id = noti_id, .content = text});
 }
 
 int __progress_noti_set_count(int noti_id, int finished, int remaining)
@@ -177,18 +241,19 @@ int __progress_noti_set_count(int noti_id, int finished, int remaining)
 
 int __progress_noti_set_progress(int noti_id, double progress)
 {
-    const Notification noti = __noti_load(noti_id);
-    if (!noti) {
-        if (noti_id >= 1)
-            VELORA_LOGE("notification_load failed");
-        return -1;
-    }
-    notification_update_progress(noti.get(), noti_id, progress);
-    return 0;
+    return __change({.noti_id = noti_id, .progress = progress});
+}
+
+void __progress_noti_flush()
+{
+    const std::lock_guard hold(__changes().lock);
+    __changes_write(__changes(), NotiPace::Time::max());
 }
 
 int __progress_noti_delete(int noti_id)
 {
+    const std::lock_guard hold(__changes().lock);
+    __changes().pace.forget(noti_id);
     const Notification noti = __noti_load(noti_id);
     if (!noti)
         return noti_id < 1 ? -1 : 0;

@@ -1,6 +1,6 @@
 #include "velora_upload_file/upload_progress.h"
+#include "velora_upload_file/upload_listed.h"
 #include "velora_upload_file/upload_page.h"
-#include "velora_upload_file/upload_row.h"
 #include "velora_upload_file/upload_state.h"
 #include "velora_upload_file/upload_text.h"
 #include "velora_upload_file/upload_wait.h"
@@ -59,11 +59,8 @@ static void __show_run(UploadViewData *vd)
 
 static void __show_end(UploadViewData *vd)
 {
-    int uploaded = 0, failed = 0;
-    for (Elm_Object_Item *row = elm_genlist_first_item_get(vd->genlist); row; row = elm_genlist_item_next_get(row)) {
-        uploaded += __row_record(row)->type == ITEM_TYPE_UPLOADED;
-        failed += __row_record(row)->type == ITEM_TYPE_FAILED;
-    }
+    const int uploaded = static_cast<int>(__listed(vd, ITEM_TYPE_UPLOADED).size());
+    const int failed = static_cast<int>(__listed(vd, ITEM_TYPE_FAILED).size());
     char words[160] = "";
     if (failed > 0)
         std::snprintf(words, sizeof words, __text_of("%d files not uploaded · Tap one to try again", failed), failed);

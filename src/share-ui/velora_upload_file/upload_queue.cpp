@@ -1,7 +1,6 @@
 #include "velora_upload_file/upload_queue.h"
-#include "velora_common/velora_genlist.h"
 #include "velora_common/velora_log.h"
-#include "velora_upload_file/upload_list.h"
+#include "velora_upload_file/upload_listed.h"
 #include "velora_upload_file/upload_page.h"
 #include "velora_upload_file/upload_path_bar.h"
 #include "velora_upload_file/upload_progress.h"
@@ -9,13 +8,12 @@
 #include "velora_upload_file/upload_start.h"
 #include "velora_upload_file/upload_state.h"
 #include "velora_upload_file/upload_waiting.h"
-#include "velora_upload_file/upload_worker.h"
 
 void __uploads_show(UploadViewData *vd, ViewPhase phase)
 {
     __title_buttons_delete(vd);
     __path_bar_delete();
-    remove_genlist_item(vd->genlist); // a long list that still measures its rows would keep idlers waiting
+    __listed_clear(vd); // a long list that still measures its rows would keep idlers waiting
     elm_object_signal_emit(vd->layout, "elm.navi.hide", "elm");
     __title_set(vd, "IDS_KQ_HEADER_VELORA_UPLOADS_ABB");
     __state_show(vd, VIEW_STATE_NONE);
@@ -24,17 +22,9 @@ void __uploads_show(UploadViewData *vd, ViewPhase phase)
 
 void __run_rows_show(UploadViewData *vd)
 {
-    remove_genlist_item(vd->genlist);
+    __listed_clear(vd);
     __state_show(vd, VIEW_STATE_NONE);
-    for (const RunFile &file : vd->run->files) {
-        const int state = file.item->state;
-        if (state == UPLOAD_STATE_CANCELED)
-            continue;
-        const int type = state == UPLOAD_STATE_DONE     ? ITEM_TYPE_UPLOADED
-                         : state == UPLOAD_STATE_FAILED ? ITEM_TYPE_FAILED
-                                                        : ITEM_TYPE_UPLOADING;
-        __upload_row_append(vd, file.item.get(), __landed_name(file).c_str(), type, __velora_uploading_item_selected);
-    }
+    __listed_show_run(vd, vd->run, __velora_uploading_item_selected);
     __progress_line_update(vd);
 }
 
@@ -48,6 +38,8 @@ static Eina_Bool __idler_load_cb(void *data)
     // The view went away before the loop was idle, or something else has the list.
     if (s_vd != vd || !vd->run || vd->run->is_joinable)
         return ECORE_CALLBACK_CANCEL;
+    if (!__run_prepare(vd, 0.01))
+        return ECORE_CALLBACK_RENEW;
     __run_begin(vd);
     if (vd->phase == PHASE_UPLOADING)
         __run_rows_show(vd);

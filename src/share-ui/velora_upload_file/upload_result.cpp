@@ -1,6 +1,6 @@
 #include "velora_upload_file/upload_result.h"
 #include "velora_common/velora_log.h"
-#include "velora_upload_file/upload_list.h"
+#include "velora_upload_file/upload_listed.h"
 #include "velora_upload_file/upload_names.h"
 #include "velora_upload_file/upload_notification.h"
 #include "velora_upload_file/upload_progress.h"
@@ -41,20 +41,16 @@ static void __rows_append(UploadViewData *vd)
     __state_show(vd, is_failure && ad->result_path_count == 0 ? VIEW_STATE_FULL : VIEW_STATE_NONE);
     const std::string folder = __folder_of_result(ad);
     const TakenNames taken = __names_of(vd, folder);
-    const GList *entry = ad->upload_list;
-    for (int i = 0; i < ad->result_path_count; i++, entry = entry->next) {
-        if (!entry) {
-            VELORA_LOGE("upload_item is NULL");
-            return;
-        }
+    std::vector<UploadItemHold> items;
+    for (const GList *entry = ad->upload_list; entry; entry = entry->next) {
         auto *item = static_cast<UploadItem *>(entry->data);
         item->size = ecore_file_size(item->path);
         item->server_path = __get_server_path(taken, folder.c_str(), item->path);
-        if (is_success || is_failure)
-            __upload_row_append(vd, item, __last_segment(ad->result_paths[i]),
-                                is_success ? ITEM_TYPE_UPLOADED : ITEM_TYPE_FAILED,
-                                is_success ? nullptr : __velora_uploading_item_selected);
+        items.emplace_back(_velora_upload_item_ref(item));
     }
+    if (is_success || is_failure)
+        __listed_show_items(vd, std::move(items), is_success ? ITEM_TYPE_UPLOADED : ITEM_TYPE_FAILED,
+                            is_success ? nullptr : __velora_uploading_item_selected);
 }
 
 void __result_show(UploadViewData *vd)
@@ -64,6 +60,6 @@ void __result_show(UploadViewData *vd)
     __retry_popup_end(vd);
     __uploads_show(vd, PHASE_RESULT);
     __rows_append(vd);
-    _velora_upload_list_free(&vd->ad->upload_list); // the rows hold their items
+    _velora_upload_list_free(&vd->ad->upload_list); // the list holds its items
     __progress_line_update(vd);
 }

@@ -3,6 +3,7 @@
 #include "velora_common/velora_log.h"
 #include "velora_common/velora_popup.h"
 #include "velora_upload_file/upload_list.h"
+#include "velora_upload_file/upload_listed.h"
 #include "velora_upload_file/upload_progress.h"
 #include "velora_upload_file/upload_select.h"
 #include "velora_upload_file/upload_signin.h"
@@ -37,7 +38,7 @@ static Eina_Bool __idler_uploading_cb(void *data)
     return ECORE_CALLBACK_CANCEL;
 }
 
-// A run of files that have rows.
+// A run of files that are in the list.
 static void __retry_begin(UploadViewData *vd, std::vector<UploadItemHold> items)
 {
     vd->ad->exit_on_pause = 0; // a result that is only looked at may go, not one that is tried again
@@ -45,7 +46,8 @@ static void __retry_begin(UploadViewData *vd, std::vector<UploadItemHold> items)
     const std::string folder = __folder_of(path ? path : "/");
     std::vector<Elm_Object_Item *> rows;
     for (const UploadItemHold &item : items)
-        rows.push_back(item->gen_it);
+        if (item->gen_it)
+            rows.push_back(item->gen_it);
     __run_create(vd, std::move(items), folder);
     vd->phase = PHASE_UPLOADING;
     for (Elm_Object_Item *row : rows) {
@@ -77,10 +79,9 @@ bool __retry_signed_out(UploadViewData *vd)
     if (vd->run || (vd->phase != PHASE_ENDED && vd->phase != PHASE_RESULT))
         return false;
     std::vector<UploadItemHold> items;
-    for (Elm_Object_Item *row = elm_genlist_first_item_get(vd->genlist); row; row = elm_genlist_item_next_get(row))
-        if (const ItemData *record = __row_record(row);
-            record->type == ITEM_TYPE_FAILED && record->item && __is_signed_out(record->item->error))
-            items.emplace_back(_velora_upload_item_ref(record->item.get()));
+    for (UploadItem *item : __listed(vd, ITEM_TYPE_FAILED))
+        if (__is_signed_out(item->error))
+            items.emplace_back(_velora_upload_item_ref(item));
     if (items.empty())
         return false;
     __retry_popup_end(vd);

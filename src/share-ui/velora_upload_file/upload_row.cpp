@@ -4,6 +4,12 @@
 #include <cstring>
 
 static void (*s_forget)(ItemData *record);
+static void (*s_gone)(const ItemData *record);
+
+void __row_gone_cb_set(void (*gone)(const ItemData *record))
+{
+    s_gone = gone;
+}
 
 void __row_forget_cb_set(void (*forget)(ItemData *record))
 {
@@ -25,6 +31,8 @@ static void __gl_del(void *data, Evas_Object *)
     // No message of a run may reach a row that is gone.
     if (record->item && record->item->gen_it == record->gen_it)
         record->item->gen_it = nullptr;
+    if (record->item && s_gone)
+        s_gone(record);
     if (record->handle && s_forget)
         s_forget(record);
     if (record->folder)
@@ -87,6 +95,11 @@ Evas_Object *__row_sign_create(Evas_Object *parent, const char *style, const cha
     evas_object_size_hint_align_set(image, EVAS_HINT_FILL, EVAS_HINT_FILL);
     evas_object_size_hint_weight_set(image, EVAS_HINT_EXPAND, EVAS_HINT_EXPAND);
     return layout;
+}
+
+bool __is_tappable(const UploadViewData *vd, int type)
+{
+    return type == ITEM_TYPE_FAILED || (vd->is_select_mode && type == ITEM_TYPE_UPLOADING);
 }
 
 void __row_tappable_set(Elm_Object_Item *row, bool is_tappable)

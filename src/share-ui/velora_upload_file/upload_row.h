@@ -22,8 +22,10 @@ struct ItemData {
     std::string stream_url;                         // of a video or sound file row
     std::string file_name;                          // of a file row
     int type = ITEM_TYPE_CONTENT;
-    UploadItemHold item; // of an upload's row
-    unsigned handle = 0; // by which a result finds the row; 0 before the first request
+    UploadItemHold item;      // of an upload's row
+    int place = 0;            // of an upload's row: how many were appended before it
+    bool is_realized = false; // of an upload's row: the list holds widgets for it
+    unsigned handle = 0;      // by which a result finds the row; 0 before the first request
 };
 
 // The record of a row, or null.
@@ -39,6 +41,11 @@ Elm_Genlist_Item_Class *__item_class_create(const char *style, Elm_Gen_Item_Text
 // Sets whether a row can be tapped. A row that cannot loses the keys' focus first: the list would keep it for a row
 // that takes no keys, and they would reach nothing.
 void __row_tappable_set(Elm_Object_Item *row, bool is_tappable);
+
+// What the list of uploads has to do before the record of one of its rows goes.
+void __row_gone_cb_set(void (*gone)(const ItemData *record));
+// Whether a row of an upload of this type can be tapped, as the view is.
+bool __is_tappable(const UploadViewData *vd, int type);
 
 // What a file-row topic has to do before a record goes: it is called with each record of a file row whose client was
 // asked for something.

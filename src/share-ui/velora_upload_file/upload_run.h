@@ -30,6 +30,7 @@ struct RunReport {
     int seen = 0, seen_ended = 0;                  // files that the line above the list has added up; main loop
     gint64 seen_bytes = 0;                         // of the latter; main loop
     std::unique_ptr<std::atomic<bool>[]> selected; // one flag a file; main loop, and the worker when a file has ended
+    std::atomic<int> selected_count = 0;           // of those flags that are set; the same
     std::atomic<int> callbacks = 0;                // of transfers that are running; client thread
     bool waits = false;                            // the notification says what for; client thread
     std::atomic<bool> is_stopping = false;         // the worker has to leave; main loop
@@ -62,14 +63,18 @@ struct UploadRun {
     {
         return remaining() - report.success - report.fail;
     }
+    int selected() const
+    {
+        return report.selected_count;
+    }
     bool is_selected(int index) const
     {
         return index >= 0 && index < total() && report.selected[static_cast<size_t>(index)];
     }
     void select(int index, bool is_on) const
     {
-        if (index >= 0 && index < total())
-            report.selected[static_cast<size_t>(index)] = is_on;
+        if (index >= 0 && index < total() && report.selected[static_cast<size_t>(index)].exchange(is_on) != is_on)
+            report.selected_count += is_on ? 1 : -1;
     }
 };
 using RunHold = std::shared_ptr<UploadRun>;

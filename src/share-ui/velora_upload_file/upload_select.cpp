@@ -24,14 +24,6 @@ static void __select_all_set(bool is_on)
         elm_check_state_set(s_select_all_check, is_on);
 }
 
-static int __selected_count(const UploadRun &run)
-{
-    int count = 0;
-    for (int i = 0; i < run.total(); i++)
-        count += run.is_selected(i);
-    return count;
-}
-
 // The title says how many are selected; with none there is nothing to be done.
 static void __show_count(UploadViewData *vd, int count)
 {
@@ -45,7 +37,7 @@ static void __show_count(UploadViewData *vd, int count)
 void __selection_title_refresh(UploadViewData *vd)
 {
     if (vd->is_select_mode && vd->run)
-        __show_count(vd, __selected_count(*vd->run));
+        __show_count(vd, vd->run->selected());
 }
 
 static void __selection_clear(UploadViewData *vd)
@@ -95,7 +87,7 @@ static void __select_all_toggle_cb(void *, Evas_Object *, void *event_info)
     __select_all_set(!s_is_select_all);
     for (const RunFile &file : vd->run->files) {
         const int state = file.item->state;
-        if (state != UPLOAD_STATE_DONE && state != UPLOAD_STATE_FAILED && file.item->gen_it)
+        if (state != UPLOAD_STATE_DONE && state != UPLOAD_STATE_FAILED && state != UPLOAD_STATE_CANCELED)
             vd->run->select(file.index, s_is_select_all);
     }
     elm_genlist_realized_items_update(vd->genlist);
@@ -143,12 +135,9 @@ Elm_Object_Item *__select_all_row()
 
 static void __rows_refresh(UploadViewData *vd)
 {
-    for (Elm_Object_Item *row = elm_genlist_first_item_get(vd->genlist); row; row = elm_genlist_item_next_get(row)) {
-        const ItemData *record = __row_record(row);
-        __row_tappable_set(row, record->type == ITEM_TYPE_FAILED ||
-                                    (vd->is_select_mode && record->type == ITEM_TYPE_UPLOADING));
-        elm_genlist_item_update(row);
-    }
+    for (Elm_Object_Item *row = elm_genlist_first_item_get(vd->genlist); row; row = elm_genlist_item_next_get(row))
+        __row_tappable_set(row, __is_tappable(vd, __row_record(row)->type));
+    elm_genlist_realized_items_update(vd->genlist);
 }
 
 void __remove_all_selete_item(UploadViewData *vd)
@@ -193,7 +182,7 @@ static void __stop_selected(UploadViewData *vd)
         if (!vd->run->is_selected(file.index))
             continue;
         vd->run->select(file.index, false);
-        if (file.item->gen_it)
+        if (file.item->state != UPLOAD_STATE_CANCELED)
             selected.push_back(file.item.get());
     }
     __uploads_cancel(vd, selected);
@@ -236,7 +225,7 @@ static void __btn_delete_cb(void *data, Evas_Object *, void *)
     }
     if (!vd->run)
         return;
-    const int count = __selected_count(*vd->run);
+    const int count = vd->run->selected();
     const bool must_ask = vd->run->is_selected(vd->run->report.current);
     if (!must_ask)
         __stop_selected(vd);
@@ -291,7 +280,7 @@ void __selection_row_tapped(UploadViewData *vd, ItemData *record, Elm_Object_Ite
     run->select(record->item->index, !run->is_selected(record->item->index));
     if (row)
         elm_genlist_item_update(row);
-    const int count = __selected_count(*run);
+    const int count = run->selected();
     const bool is_all = count > 0 && count == run->queued();
     if (is_all != s_is_select_all)
         __select_all_set(is_all);

@@ -1,12 +1,12 @@
 #include "velora_upload_file/upload_share.h"
 #include "notification/notification.h"
 #include "velora_common/velora_current_popup.h"
-#include "velora_common/velora_genlist.h"
 #include "velora_common/velora_log.h"
 #include "velora_common/velora_pages.h"
 #include "velora_common/velora_popup.h"
 #include "velora_upload_file/upload_browser.h"
 #include "velora_upload_file/upload_left.h"
+#include "velora_upload_file/upload_listed.h"
 #include "velora_upload_file/upload_meta.h"
 #include "velora_upload_file/upload_page.h"
 #include "velora_upload_file/upload_path_bar.h"
@@ -101,7 +101,7 @@ bool __next_share_begin(UploadViewData *vd)
         return false;
     VELORA_LOGI("the files of another share are next");
     __retry_popup_end(vd);
-    remove_genlist_item(vd->genlist);
+    __listed_clear(vd);
     vd->ad->exit_on_pause = 0;
     __browse_begin(vd);
     return true;

@@ -5,6 +5,7 @@
 #include "velora_upload_file/upload_page.h"
 #include "velora_upload_file/upload_worker.h"
 #include <Ecore_File.h>
+#include <cmath>
 #include <cstdio>
 #include <optional>
 
@@ -28,29 +29,43 @@ void __run_create(UploadViewData *vd, std::vector<UploadItemHold> items, const s
     }
 }
 
-// Sizes and destinations, read as late as can be.
-static void __run_prepare(UploadViewData *vd)
+// How far the latest run is.
+struct Preparation {
+    int run = 0; // its number
+    size_t next = 0;
+    std::optional<TakenNames> taken;
+};
+static Preparation s_preparation;
+
+bool __run_prepare(UploadViewData *vd, double budget)
 {
     UploadRun &run = *vd->run;
-    std::optional<TakenNames> taken;
-    for (RunFile &file : run.files) {
+    if (s_preparation.run != run.number)
+        s_preparation = {.run = run.number};
+    const double start = ecore_time_get();
+    for (; s_preparation.next < run.files.size(); s_preparation.next++) {
+        if (ecore_time_get() - start > budget)
+            return false;
+        RunFile &file = run.files[s_preparation.next];
         UploadItem *item = file.item.get();
         item->size = file.size = ecore_file_size(item->path);
         run.bytes += file.size;
         if (!item->server_path) {
-            if (!taken)
-                taken.emplace(vd->folder);
-            item->server_path = __get_server_path(*taken, run.folder.c_str(), item->path);
+            if (!s_preparation.taken)
+                s_preparation.taken.emplace(vd->folder);
+            item->server_path = __get_server_path(*s_preparation.taken, run.folder.c_str(), item->path);
         }
         file.destination = item->server_path;
     }
+    s_preparation.taken.reset();
+    return true;
 }
 
 void __run_begin(UploadViewData *vd)
 {
     UploadRun &run = *vd->run;
     __delete_all_callback_ctxpopup();
-    __run_prepare(vd);
+    __run_prepare(vd, HUGE_VAL);
     char text[32];
     std::snprintf(text, sizeof text, "%d / %d", 0, run.remaining());
     __progress_noti_new(text, &run.noti_id);

@@ -2,7 +2,6 @@
 #include "notification/notification.h"
 #include "velora_common/velora_client.h"
 #include "velora_common/velora_current_popup.h"
-#include "velora_common/velora_genlist.h"
 #include "velora_common/velora_local_data.h"
 #include "velora_common/velora_log.h"
 #include "velora_common/velora_network.h"
@@ -14,6 +13,7 @@
 #include "velora_upload_file/upload_icon.h"
 #include "velora_upload_file/upload_left.h"
 #include "velora_upload_file/upload_list.h"
+#include "velora_upload_file/upload_listed.h"
 #include "velora_upload_file/upload_menu.h"
 #include "velora_upload_file/upload_messages.h"
 #include "velora_upload_file/upload_notification.h"
@@ -57,7 +57,7 @@ static void __destroy_view(void *data)
     _velora_popup_take_away(vd->ad, {vd, ""});
     __path_bar_delete();
     __cloud_thumbnails_watch(vd, false);
-    remove_genlist_item(vd->genlist); // with the requests of its rows
+    __listed_clear(vd); // with the requests of its rows
     _velora_upload_list_free(&vd->ad->upload_list);
     __waiting_give().clear();
     if (vd->folder)
@@ -82,6 +82,7 @@ static void __abandon_view(void *data)
             vd->ad->noti_priv_id = -1; // it stays, and says from now on that the rest can be uploaded
     }
     s_view_pipe = nullptr;
+    __listed_forget();
     vd->client = nullptr;
     vd->run = nullptr;
 }

@@ -4,9 +4,12 @@
 #include "temp_home.h"
 #include "velora_upload_file/upload_names.h"
 #include "velora_upload_file/upload_notification.h"
+#include "velora_upload_file/upload_pace.h"
 #include "velora_upload_file/upload_text.h"
 #include "velora_upload_file/upload_types.h"
 #include <gtest/gtest.h>
+#include <map>
+#include <sstream>
 
 namespace {
 std::vector<std::string> folder_files; // of the open folder, in the database's order
@@ -165,6 +168,68 @@ TEST_F(Notifications, TheOngoingOneFollowsTheQueue)
     EXPECT_TRUE(all().empty());
     for (const int gone : {id, 0, -1})
         EXPECT_EQ(__progress_noti_set_content(gone, "x") + __progress_noti_set_progress(gone, 0.5), -2);
+}
+
+TEST_F(Notifications, ChangeTenTimesASecondAndTheLastOneAlways)
+{
+    // Offers as "MILLISECOND TEXT", a bar's as "MILLISECOND =PERCENT", writes the same; "x" takes the notification
+    // away.
+    const struct {
+        const char *offers, *writes;
+    } cases[] = {
+        {"0 a, 0 =1, 5 b, 6 c, 150 =2, 160 d, 900 e", "0 a, 0 =1, 200 d, 200 =2, 900 e"},
+        {"0 a, 50 b, 60 c, 61 =1, 62 d", "0 a, 50 b, 200 d, 250 =1"},
+        {"0 a, 1 b, 2 c, 3 x, 4 d", "0 a, 1 b, 4 d"},
+        {"0 a, 300 b, 350 c, 360 d", "0 a, 300 b, 350 c, 500 d"},
+    };
+    for (const auto &c : cases) {
+        std::map<int, std::vector<std::string>> offers;
+        for (std::istringstream all(c.offers); !all.eof();) {
+            int time = 0;
+            std::string word;
+            all >> time >> word;
+            offers[time].push_back(word.substr(0, word.find(',')));
+        }
+        NotiPace pace;
+        std::string writes;
+        for (int ms = 0; ms < 2000; ms++) {
+            const NotiPace::Time now{std::chrono::milliseconds(ms + 5000)};
+            for (const std::string &word : offers[ms]) {
+                if (word == "x")
+                    pace.forget(7);
+                else if (word[0] == '=')
+                    pace.offer({.noti_id = 7, .progress = std::stod(word.substr(1))});
+                else
+                    pace.offer({.noti_id = 7, .content = word});
+            }
+            while (const auto change = pace.take(now)) {
+                pace.wrote(now);
+                const std::string bar = "=" + std::to_string(static_cast<int>(change->progress));
+                writes += (writes.empty() ? "" : ", ") + std::to_string(ms) + " " + change->content.value_or(bar);
+            }
+        }
+        EXPECT_EQ(writes, c.writes) << c.offers;
+    }
+    // From several threads at once, and nothing comes after the end.
+    int id = -1, other = -1;
+    ASSERT_EQ(__progress_noti_new("0 / 1000", &id), 0);
+    std::thread client([id] {
+        for (int i = 1; i <= 1000; i++)
+            __progress_noti_set_progress(id, i / 1000.0);
+    });
+    for (int i = 1; i <= 1000; i++)
+        __progress_noti_set_count(id, i, 1000);
+    client.join();
+    EXPECT_TRUE(comes_true(
+        [] { return all()[0].text == "Velora: 1000 / 1000" && all()[0].looks.starts_with("1 260 9 5 100"); }));
+    __progress_noti_set_content(id, "late");
+    __progress_noti_set_content(id, "later");
+    __progress_noti_set_content(id, "latest");
+    EXPECT_EQ(__progress_noti_delete(id), 0);
+    ASSERT_EQ(__progress_noti_new("0 / 2", &other), 0);
+    std::this_thread::sleep_for(std::chrono::milliseconds(300));
+    ASSERT_EQ(all().size(), 1u);
+    EXPECT_EQ(all()[0].text, "Velora: 0 / 2");
 }
 
 TEST_F(Notifications, AResultCarriesItsFilesAndTakesTheLastOnesPlace)
