@@ -56,9 +56,11 @@ static size_t header_cb(char *bytes, size_t size, size_t count, void *data)
     if (line.substr(0, 5) == "HTTP/") {
         transfer->etag.clear();
         transfer->repr_digest.clear();
+        transfer->content_length.clear();
     }
     take_header(line, "ETag", transfer->etag);
     take_header(line, "Repr-Digest", transfer->repr_digest);
+    take_header(line, "Content-Length", transfer->content_length);
     return size * count;
 }
 
@@ -107,6 +109,8 @@ static void set_body(CURL *easy, Transfer &transfer)
         curl_easy_setopt(easy, CURLOPT_POSTFIELDSIZE, static_cast<long>(transfer.body.size()));
         curl_easy_setopt(easy, CURLOPT_POSTFIELDS, transfer.body.c_str());
     }
+    if (transfer.method == "HEAD")
+        curl_easy_setopt(easy, CURLOPT_NOBODY, 1L);
     curl_easy_setopt(easy, CURLOPT_CUSTOMREQUEST, transfer.method.c_str());
 }
 

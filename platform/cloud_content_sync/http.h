@@ -2,6 +2,7 @@
 // HTTP requests of one thread: a libcurl multi handle whose connections are kept alive between requests. Redirects are
 // never followed, so the credentials never leave the host of the service's description.
 #include "cloud_content_sync/credentials.h"
+#include "cloud_content_sync/known.h"
 #include <chrono>
 #include <curl/curl.h>
 #include <functional>
@@ -24,6 +25,9 @@ struct Transfer {
     std::string body;
     std::function<size_t(char *, size_t)> read; // instead of body: source of exactly body_size bytes, or READ_FAILED
     long long body_size = 0;
+    // Begins the source again, which has to do with a refusal of the whole request alone; without it, or when it
+    // answers false, a body is sent once.
+    std::function<bool()> rewind;
     // Of the whole request, beside the limit for stalls; 0: none. With one the request is sent once alone.
     std::chrono::seconds time_limit{0};
     std::function<bool(const char *, size_t)> write; // takes the answer's body when its status is 2xx; false ends it
@@ -34,7 +38,8 @@ struct Transfer {
     long status = 0;
     std::string etag;
     std::string repr_digest;
-    bool was_resent = false; // libcurl found the connection dead and wanted to send the body a second time
+    std::string content_length; // as the answer's header has it
+    bool was_resent = false;    // libcurl found the connection dead and wanted to send the body a second time
 
     // Kept by Http.
     std::chrono::seconds stall_limit{60};
@@ -75,6 +80,11 @@ class Http {
     }
     // Ends the wait of run(), or of the next one. Any thread.
     void wake();
+    // The root URL of the WebDAV tree, without a final "/".
+    const std::string &storage() const
+    {
+        return service.storage;
+    }
 
   private:
     void dispatch();
@@ -82,6 +92,11 @@ class Http {
     void finish(CURL *easy, CURLcode result);
 
     const Service service;
+
+  public:
+    Known known{service};
+
+  private:
     std::unique_ptr<CURLM, decltype(&curl_multi_cleanup)> multi;
     std::map<CURL *, std::unique_ptr<Transfer>> transfers;
 };

@@ -86,6 +86,8 @@ bool Refresh::take(const std::string &folder, MultistatusReader &reader)
         if (parent_of(entry.path) != folder || !seen.insert(entry.path).second)
             continue;
         const std::string name = name_of(entry.path);
+        if (is_temporary_name(name))
+            continue;
         if (!entry.is_folder) {
             contents.push_back({folder, name, std::max(entry.size, 0LL), entry.mtime, std::move(entry.etag)});
             continue;

@@ -21,6 +21,8 @@ Upload::Upload(Client &owner, UploadRequest request) : client(owner), wanted(std
 Upload::~Upload()
 {
     client.http.abort(transfer_now);
+    if (!temporary.empty())
+        client.http.known.leave_temporary(temporary);
     if (fd >= 0)
         close(fd);
 }
@@ -83,7 +85,9 @@ void Upload::step()
     if (ended || is_removing)
         return;
     if (!client.is_wanted(wanted.id)) {
-        if (is_putting && transfer_now && whole_file_read()) {
+        if (probe)
+            return probe->cancel();
+        if (transfer_now && (is_moving || (is_putting && whole_file_read()))) {
             // The service may have stored it already; its answer tells.
             transfer_now->stall_limit = std::min<std::chrono::seconds>(transfer_now->stall_limit, CANCELLED_LIMIT);
             return;
@@ -103,6 +107,10 @@ void Upload::end(int error)
 {
     client.http.abort(transfer_now);
     transfer_now = nullptr;
+    probe.reset();
+    if (!temporary.empty())
+        client.http.known.leave_temporary(temporary); // there is no time to delete it
+    temporary.clear();
     if (!ended)
         finish(error);
 }
@@ -136,13 +144,15 @@ void Upload::request(std::unique_ptr<Transfer> transfer, void (Upload::*then)(co
 
 void Upload::put()
 {
+    if (!place())
+        return;
     if (++puts > PUTS_MAX)
         return finish(CLOUD_CONTENT_SYNC_ERROR_SERVER);
     checksum.emplace();
     sent = 0;
     auto transfer = std::make_unique<Transfer>();
     transfer->method = "PUT";
-    transfer->path = target;
+    transfer->path = where();
     // RFC 9110, 13.1.2: nothing of that name may exist. RFC 9530, 4: the digest of what is stored is welcome.
     transfer->headers = {"If-None-Match: *", "Content-Type: application/octet-stream", "Want-Repr-Digest: sha-256=10"};
     transfer->body_size = local.st_size;
@@ -164,11 +174,14 @@ void Upload::put_ended(const Transfer &transfer)
         return put_unanswered(transfer);
     if (transfer.status == 412 && lost_reply)
         return look(true, &Upload::settled);
+    if (transfer.status == 412 && renew_temporary())
+        return;
     if (transfer.status == 412)
         return try_next_name();
     if (transfer.status == 405 || transfer.status == 409)
         return look(false, &Upload::occupied);
-    finish(transfer.error());
+    if (!is_folder_in_doubt(transfer))
+        finish(transfer.error());
 }
 
 void Upload::put_unanswered(const Transfer &transfer)
@@ -191,7 +204,8 @@ void Upload::settled(const Look &result)
         return verified(result);
     if (result.found == Found::ABSENT)
         return put();
-    try_next_name();
+    if (!renew_temporary())
+        try_next_name();
 }
 
 // After a refusal that a folder of that name explains.
@@ -210,7 +224,7 @@ void Upload::try_next_name()
     target = join(parent_of(target), next_free_name(name_of(target)));
     lost_reply = false;
     // Looking costs less than sending a body in vain.
-    look(false, &Upload::next_name_looked_at);
+    look(false, &Upload::next_name_looked_at, target);
 }
 
 void Upload::next_name_looked_at(const Look &result)
@@ -226,6 +240,8 @@ void Upload::stored(const Transfer &transfer)
 {
     // 201: made by this request; 200 and 204 would mean that something was there and the condition was ignored.
     created = transfer.status == 201;
+    if (!created && temporary.empty())
+        client.http.known.forget("way");
     stored_etag = transfer.etag;
     if (!client.is_wanted(wanted.id))
         return created ? remove_stored(0) : finish(0);
@@ -235,7 +251,7 @@ void Upload::stored(const Transfer &transfer)
         return remove_stored(CLOUD_CONTENT_SYNC_ERROR_CORRUPTED);
     const std::string answered = sha256_of(transfer.repr_digest);
     if (answered.empty())
-        return look(true, &Upload::verified);
+        return check_stored();
     verified({answered == digest ? Found::SAME : Found::DIFFERENT, 0});
 }
 
@@ -248,21 +264,24 @@ void Upload::verified(const Look &result)
         return finish(CLOUD_CONTENT_SYNC_ERROR_CORRUPTED);
     if (local_changed())
         return remove_stored(CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED);
+    if (!temporary.empty())
+        return move();
     const ContentRow row{parent_of(target), name_of(target), local.st_size, time(nullptr), stored_etag};
     if (!client.report_done(wanted, row, account_identity(client.service, credentials)))
         return remove_stored(0); // cancelled in the last moment
     ended = true;
 }
 
-void Upload::look(bool by_digest, LookDone then)
+void Upload::look(bool by_digest, LookDone then, const std::string &path)
 {
+    look_path = path.empty() ? where() : path;
     look_by_digest = by_digest;
     look_done = then;
     look_attempts++;
     auto reader = std::make_shared<MultistatusReader>(client.service.root_path);
     auto transfer = std::make_unique<Transfer>();
     transfer->method = "PROPFIND";
-    transfer->path = target;
+    transfer->path = look_path;
     transfer->headers = {"Depth: 0", "Content-Type: application/xml; charset=utf-8"};
     transfer->body = propfind_body(by_digest);
     transfer->write = [reader](const char *data, size_t size) { return reader->feed(data, size); };
@@ -282,7 +301,7 @@ void Upload::finish_look(const Look &result)
 void Upload::looked(const Transfer &transfer, MultistatusReader &reader)
 {
     if (transfer.result != CURLE_OK && look_attempts < LOOKS_MAX)
-        return look(look_by_digest, look_done);
+        return look(look_by_digest, look_done, std::string(look_path));
     if (transfer.result == CURLE_OK && transfer.status == 404)
         return finish_look({Found::ABSENT, 0});
     // Services redirect the path of a folder that lacks its final "/".
@@ -296,8 +315,10 @@ void Upload::looked(const Transfer &transfer, MultistatusReader &reader)
     const bool may_be_same = !entry.is_folder && whole_file_read() && (entry.size < 0 || entry.size == local.st_size);
     if (!look_by_digest || !may_be_same)
         return finish_look({Found::DIFFERENT, 0});
-    if (entry.sha256.empty())
+    if (entry.sha256.empty()) {
+        client.http.known.remember("digest", 0);
         return read_back();
+    }
     finish_look({entry.sha256 == digest ? Found::SAME : Found::DIFFERENT, 0});
 }
 
@@ -311,7 +332,7 @@ void Upload::read_back()
     auto sum = std::make_shared<Sum>();
     auto transfer = std::make_unique<Transfer>();
     transfer->method = "GET";
-    transfer->path = target;
+    transfer->path = look_path;
     transfer->write = [this, sum](const char *data, size_t size) {
         sum->size += static_cast<long long>(size);
         sum->checksum.add(data, size);
@@ -334,7 +355,7 @@ void Upload::read_back()
 // Takes back what this request has stored, then ends with `error` (0: cancelled, nobody is told).
 void Upload::remove_stored(int error)
 {
-    if (!created)
+    if (!created || !temporary.empty())
         return finish(error);
     is_removing = true;
     auto transfer = std::make_unique<Transfer>();
@@ -352,6 +373,8 @@ void Upload::remove_stored(int error)
 
 void Upload::finish(int error)
 {
+    if (!temporary.empty())
+        return delete_temporary([this, error] { finish(error); });
     ended = true;
     // After a cancel nobody is there to be told.
     client.report_failed(wanted, error);

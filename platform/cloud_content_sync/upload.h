@@ -3,6 +3,7 @@
 #include "cloud_content_sync/client.h"
 #include "cloud_content_sync/dav.h"
 #include "cloud_content_sync/digest.h"
+#include "cloud_content_sync/probe.h"
 #include <optional>
 #include <sys/stat.h>
 
@@ -48,9 +49,32 @@ class Upload {
     void settled(const Look &look);
     void occupied(const Look &look);
     void try_next_name();
+    // upload_place.cpp: where and how the file is stored without replacing another.
+    void prepare();
+    void delete_left_behind();
+    void left_behind_deleted(const Transfer &transfer);
+    void choose_way();
+    bool place();
+    const std::string &where() const
+    {
+        return temporary.empty() ? target : temporary;
+    }
+    void delete_temporary(std::function<void()> then);
+    bool renew_temporary();
+    void move();
+    void moved(const Transfer &transfer);
+    void arrived(const std::string &etag);
+    void temporary_looked_at(const Look &look);
+    void target_looked_at(const Look &look);
+    bool is_folder_in_doubt(const Transfer &transfer);
+    void folder_looked_at(const Look &look);
+    // Compares what is stored with what was sent, as thoroughly as the service and its description ask for.
+    void check_stored();
+    void head_ended(const Transfer &transfer);
     void next_name_looked_at(const Look &look);
-    // Compares what is stored under `target` with what was sent; by_digest false: only whether something is there.
-    void look(bool by_digest, LookDone then);
+    // Compares what is stored under `path` (empty: where()) with what was sent; by_digest false: only whether something
+    // is there.
+    void look(bool by_digest, LookDone then, const std::string &path = "");
     void looked(const Transfer &transfer, MultistatusReader &reader);
     void read_back();
     void finish_look(const Look &result);
@@ -79,10 +103,20 @@ class Upload {
     std::string stored_etag;
     int names_tried = 0;
     int look_attempts = 0;
+    std::string look_path;
     bool look_by_digest = false;
     LookDone look_done = nullptr;
     Transfer *transfer_now = nullptr;
+    std::unique_ptr<Probe> probe;
+    std::vector<std::string> left_behind; // of earlier uploads, to be deleted
+    std::string who;                      // the account
+    std::string temporary;                // server path, while the file is not under its own name
+    bool is_prepared = false;
+    bool is_temporary_whole = false; // and verified
+    int moves = 0;
+    int folder_error = 0;
     bool is_putting = false;
+    bool is_moving = false;
     bool is_removing = false;
     bool ended = false;
 };

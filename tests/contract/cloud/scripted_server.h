@@ -1,5 +1,6 @@
 #pragma once
 // An HTTP server that says what a test tells it to, whole or broken, and a client of it.
+#include "cloud_content_sync/known.h"
 #include "transfers.h"
 #include <netinet/in.h>
 #include <sys/socket.h>
@@ -155,6 +156,7 @@ class Scripted : public testing::Test {
                                    "\nAuthTimeout=1\nStallTimeout=" + std::to_string(stall_seconds) + "\n");
         setenv("CLOUD_SERVICES_DIR", home.path.c_str(), 1);
         ASSERT_EQ(cloud_content_sync_credentials_set("Test", nullptr, nullptr, "token"), 0);
+        cloud::Known(*cloud::service_find("Test")).remember("way", static_cast<int>(way));
         ASSERT_EQ(cloud_content_sync_create("Test", &handle), 0);
     }
     void TearDown() override
@@ -165,6 +167,7 @@ class Scripted : public testing::Test {
         server.reset();
     }
 
+    cloud::Way way = cloud::Way::CONDITION; // what the client has found out of the server before
     TempHome home;
     TempFolder scratch; // for local files
     std::unique_ptr<ScriptedServer> server;
