@@ -2,6 +2,7 @@
 // HTTP requests of one thread: a libcurl multi handle whose connections are kept alive between requests. Redirects are
 // never followed, so the credentials never leave the host of the service's description.
 #include "cloud_content_sync/credentials.h"
+#include "cloud_content_sync/http_digest.h"
 #include "cloud_content_sync/known.h"
 #include <chrono>
 #include <curl/curl.h>
@@ -42,6 +43,10 @@ struct Transfer {
     bool was_resent = false;    // libcurl found the connection dead and wanted to send the body a second time
 
     // Kept by Http.
+    Credentials account;
+    std::vector<std::string> challenges; // of a 401
+    std::string answered_nonce;          // the nonce that it was sent with
+    int attempts = 0;
     std::chrono::seconds stall_limit{60};
     std::chrono::steady_clock::time_point last_activity;
     std::unique_ptr<CURL, decltype(&curl_easy_cleanup)> easy{nullptr, curl_easy_cleanup};
@@ -80,6 +85,11 @@ class Http {
     }
     // Ends the wait of run(), or of the next one. Any thread.
     void wake();
+    // Lets run() return at that time at the latest, once.
+    void wake_at(std::chrono::steady_clock::time_point time)
+    {
+        alarm = time;
+    }
     // The root URL of the WebDAV tree, without a final "/".
     const std::string &storage() const
     {
@@ -87,11 +97,21 @@ class Http {
     }
 
   private:
+    void launch(Transfer &transfer);
+    void authorize(Transfer &transfer, const std::string &url);
+    bool must_knock(const Transfer &transfer);
+    void knock();
+    void knocked();
+    bool answer_challenge(Transfer &transfer);
     void dispatch();
     void end_stalled();
     void finish(CURL *easy, CURLcode result);
 
     const Service service;
+    std::optional<DigestChallenge> challenge; // of the tree, when it asks for Digest
+    std::vector<Transfer *> behind_knock;     // they are sent when the one that is under way has its answer
+    Transfer *knock_now = nullptr;
+    std::chrono::steady_clock::time_point alarm = std::chrono::steady_clock::time_point::max();
 
   public:
     Known known{service};

@@ -61,8 +61,10 @@ void Refresh::list(const std::string &folder)
 void Refresh::listed(const std::string &folder, const Transfer &transfer, MultistatusReader &reader)
 {
     const bool answered = transfer.result == CURLE_OK;
-    // A folder below the root may have been removed since it was seen, or be closed to this account.
-    const bool is_skipped = folder != "/" && answered && (transfer.status == 404 || transfer.status == 403);
+    // A folder below the root may have been removed since it was seen, or be closed to this account, or have a name
+    // that the service lists and then refuses.
+    const bool is_refused = transfer.status == 404 || transfer.status == 403 || transfer.status == 400;
+    const bool is_skipped = folder != "/" && answered && is_refused;
     if (is_skipped)
         return list_next();
     if (transfer.result != CURLE_OK || transfer.status != 207) {

@@ -83,7 +83,7 @@ bool Upload::local_changed() const
 void Upload::step()
 {
     if (ended || is_removing)
-        return;
+        return delete_again();
     if (!client.is_wanted(wanted.id)) {
         if (probe)
             return probe->cancel();
@@ -92,6 +92,7 @@ void Upload::step()
             transfer_now->stall_limit = std::min<std::chrono::seconds>(transfer_now->stall_limit, CANCELLED_LIMIT);
             return;
         }
+        is_broken_off |= is_putting && transfer_now;
         client.http.abort(transfer_now);
         transfer_now = nullptr;
         return created ? remove_stored(0) : finish(0);
@@ -142,14 +143,20 @@ void Upload::request(std::unique_ptr<Transfer> transfer, void (Upload::*then)(co
     transfer_now = client.http.start(std::move(transfer), credentials);
 }
 
+bool Upload::begin_body()
+{
+    checksum.emplace();
+    sent = 0;
+    return true;
+}
+
 void Upload::put()
 {
     if (!place())
         return;
     if (++puts > PUTS_MAX)
         return finish(CLOUD_CONTENT_SYNC_ERROR_SERVER);
-    checksum.emplace();
-    sent = 0;
+    begin_body();
     auto transfer = std::make_unique<Transfer>();
     transfer->method = "PUT";
     transfer->path = where();
@@ -157,6 +164,7 @@ void Upload::put()
     transfer->headers = {"If-None-Match: *", "Content-Type: application/octet-stream", "Want-Repr-Digest: sha-256=10"};
     transfer->body_size = local.st_size;
     transfer->read = [this](char *buffer, size_t size) { return read(buffer, size); };
+    transfer->rewind = [this] { return begin_body(); };
     is_putting = true;
     request(std::move(transfer), &Upload::put_ended);
 }
@@ -164,6 +172,7 @@ void Upload::put()
 void Upload::put_ended(const Transfer &transfer)
 {
     is_putting = false;
+    is_broken_off |= transfer.result != CURLE_OK && !transfer.never_sent();
     if (whole_file_read())
         digest = checksum->hex();
     if (transfer.is_success())

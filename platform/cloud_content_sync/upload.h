@@ -41,6 +41,7 @@ class Upload {
     bool local_changed() const;
     bool local_is_what_was_sent() const;
     size_t read(char *buffer, size_t size);
+    bool begin_body();
     void put();
     void put_ended(const Transfer &transfer);
     void put_unanswered(const Transfer &transfer);
@@ -60,6 +61,9 @@ class Upload {
         return temporary.empty() ? target : temporary;
     }
     void delete_temporary(std::function<void()> then);
+    void send_deletion();
+    void temporary_deleted(const Transfer &transfer);
+    void delete_again();
     bool renew_temporary();
     void move();
     void moved(const Transfer &transfer);
@@ -113,6 +117,9 @@ class Upload {
     std::string temporary;                // server path, while the file is not under its own name
     bool is_prepared = false;
     bool is_temporary_whole = false; // and verified
+    bool is_broken_off = false;      // a PUT to it was; the service may still be at work on it
+    std::function<void()> after_deletion;
+    std::optional<std::chrono::steady_clock::time_point> delete_again_at;
     int moves = 0;
     int folder_error = 0;
     bool is_putting = false;

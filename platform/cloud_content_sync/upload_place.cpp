@@ -3,11 +3,13 @@
 #include "cloud_content_sync/names.h"
 #include "cloud_content_sync/upload.h"
 #include <algorithm>
+#include <utility>
 
 namespace cloud {
 
 static constexpr int MOVES_MAX = 3; // for one name
 static constexpr auto DELETE_LIMIT = std::chrono::seconds(15);
+static constexpr auto DELETE_AGAIN = std::chrono::milliseconds(300);
 
 // Whether the file may be sent now, to where(). Otherwise put() is called when it may, or the upload ends.
 bool Upload::place()
@@ -79,21 +81,39 @@ void Upload::choose_way()
 void Upload::delete_temporary(std::function<void()> then)
 {
     is_removing = true;
+    after_deletion = std::move(then);
+    send_deletion();
+}
+
+void Upload::send_deletion()
+{
     auto transfer = std::make_unique<Transfer>();
     transfer->method = "DELETE";
     transfer->path = temporary;
-    transfer->done = [this, then](Transfer &done) {
-        transfer_now = nullptr;
-        is_removing = false;
-        Known &known = client.http.known;
-        const bool is_gone = done.is_success() || (done.result == CURLE_OK && done.status == 404);
-        is_gone ? known.drop_temporary(temporary) : known.leave_temporary(temporary);
-        temporary.clear();
-        is_temporary_whole = false;
-        then();
-    };
-    transfer_now = client.http.start(std::move(transfer), credentials);
+    request(std::move(transfer), &Upload::temporary_deleted);
     transfer_now->stall_limit = std::min<std::chrono::seconds>(transfer_now->stall_limit, DELETE_LIMIT);
+}
+
+void Upload::temporary_deleted(const Transfer &transfer)
+{
+    if (is_broken_off && transfer.result == CURLE_OK) { // some services store then what had come until then
+        is_broken_off = false;
+        delete_again_at = std::chrono::steady_clock::now() + DELETE_AGAIN;
+        return client.http.wake_at(*delete_again_at);
+    }
+    const bool is_gone = transfer.is_success() || (transfer.result == CURLE_OK && transfer.status == 404);
+    is_gone ? client.http.known.drop_temporary(temporary) : client.http.known.leave_temporary(temporary);
+    temporary.clear();
+    is_temporary_whole = is_broken_off = is_removing = false;
+    std::exchange(after_deletion, nullptr)();
+}
+
+void Upload::delete_again()
+{
+    if (!delete_again_at || std::chrono::steady_clock::now() < *delete_again_at)
+        return;
+    delete_again_at.reset();
+    send_deletion();
 }
 
 // Another temporary name when what has this one is not what was sent; false when none is in use.

@@ -148,6 +148,7 @@ static std::optional<Backend> start_other(const std::string &name)
     if (!server->has_own_user)
         use_folder(backend, server->folder);
     backend.owned.push_back(server->process);
+    backend.taboo = server->taboo;
     backend.go_down = [pid = server->pid] { kill(pid, SIGKILL); };
     return backend;
 }

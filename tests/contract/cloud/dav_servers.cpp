@@ -37,6 +37,7 @@ struct Kind {
     const char *program;
     const char *root; // path of the tree
     std::function<Headers(const Setting &)> words;
+    Headers taboo = {};
     bool needs_no_root = false; // it refuses to serve as root
 };
 
@@ -143,12 +144,12 @@ static Headers rclone(const Setting &setting)
 static const std::map<std::string, Kind> &kinds()
 {
     static const std::map<std::string, Kind> all = {
-        {"Apache", {"/usr/sbin/apache2", "/dav", apache, true}},
-        {"Lighttpd", {"/usr/sbin/lighttpd", "/dav", lighttpd}},
+        {"Apache", {"/usr/sbin/apache2", "/dav", apache, {}, true}},
+        {"Lighttpd", {"/usr/sbin/lighttpd", "/dav", lighttpd, {"new\nline.txt"}}},
         {"Nginx", {"/usr/sbin/nginx", "/dav", nginx}},
         {"Chezdav", {"/usr/bin/chezdav", "", chezdav}},
-        {"Sabre", {"/usr/bin/php", "/dav", sabre}},
-        {"Rclone", {"/usr/bin/rclone", "/dav", rclone}},
+        {"Sabre", {"/usr/bin/php", "/dav", sabre, {"new\nline.txt", "\xff\xfe.bin"}}},
+        {"Rclone", {"/usr/bin/rclone", "/dav", rclone, {"new\nline.txt"}}},
     };
     return all;
 }
@@ -189,7 +190,11 @@ std::optional<DavServer> start_dav_server(const std::string &name, const std::st
             kill(pid, SIGKILL); // nothing of it is kept
             end_of(pid);
         });
-        return DavServer{"http://127.0.0.1:" + std::to_string(port) + kind.root, *place / "dav", pid, process,
+        return DavServer{"http://127.0.0.1:" + std::to_string(port) + kind.root,
+                         kind.taboo,
+                         *place / "dav",
+                         pid,
+                         process,
                          other_user != 0};
     }
     ADD_FAILURE() << name << " does not start";

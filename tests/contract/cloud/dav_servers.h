@@ -6,6 +6,7 @@
 
 struct DavServer {
     std::string url;    // of the root of the tree, without the final slash
+    Headers taboo;      // names that it cannot list
     std::string folder; // what it serves
     pid_t pid = 0;
     std::shared_ptr<void> process; // ends the server
