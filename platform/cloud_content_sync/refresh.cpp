@@ -72,7 +72,11 @@ void Refresh::listed(const std::string &folder, const Transfer &transfer, Multis
         // A folder's name was the service's own, so a refusal of it is the service's failure.
         return finish(error == CLOUD_CONTENT_SYNC_ERROR_BAD_NAME ? CLOUD_CONTENT_SYNC_ERROR_SERVER : error);
     }
-    if (!reader.finish() || !take(folder, reader))
+    const bool is_whole = reader.finish();
+    // There is a service that cannot write the paths of some folders; the rest of the tree is there nevertheless.
+    if (folder != "/" && is_whole && reader.entries.empty())
+        return list_next();
+    if (!is_whole || !take(folder, reader))
         return finish(CLOUD_CONTENT_SYNC_ERROR_SERVER);
     list_next();
 }

@@ -157,6 +157,8 @@ void Upload::moved(const Transfer &transfer)
     if (is_refusal && (transfer.status == 412 || transfer.status == 405 || transfer.status == 409)) {
         moves = 0;
         is_moving = false;
+        if (transfer.status == 412)
+            return try_next_name();
         return look(false, &Upload::occupied, target);
     }
     const bool may_have_moved = transfer.status == 403 || transfer.status == 404 || transfer.status == 408;
@@ -209,9 +211,8 @@ void Upload::folder_looked_at(const Look &result)
 void Upload::check_stored()
 {
     Known &known = client.http.known;
-    const bool has_digests = known.find("digest") != 0;
-    // The sample is counted whenever there is no digest, so that the first file of a client is in it.
-    if (has_digests || lost_reply || client.service.reads_back || known.is_sample())
+    const bool has_digests = known.find("digest") != 0, is_sample = known.is_sample();
+    if (has_digests || lost_reply || client.service.reads_back || is_sample)
         return look(true, &Upload::verified);
     auto transfer = std::make_unique<Transfer>();
     transfer->method = "HEAD";

@@ -4,6 +4,7 @@
 #include "cloud_content_sync/dav.h"
 #include "cloud_content_sync/names.h"
 #include "dav_servers.h"
+#include "relay.h"
 #include <csignal>
 #include <cstring>
 #include <glib.h>
@@ -15,7 +16,10 @@
 static Backend introduce(const std::string &tree, const std::string &url)
 {
     const auto descriptions = std::make_shared<TempFolder>();
-    descriptions->file("Test.conf", "[Service]\nStorage=" + tree + "/\nApi=" + url + "\nWeb=" + url + "\n");
+    const auto describe = [descriptions, url](const std::string &at) {
+        descriptions->file("Test.conf", "[Service]\nStorage=" + at + "/\nApi=" + url + "\nWeb=" + url + "\n");
+    };
+    describe(tree);
     setenv("CLOUD_SERVICES_DIR", descriptions->path.c_str(), 1);
     EXPECT_EQ(cloud_content_sync_credentials_set("Test", USER, USER, PASSWORD), 0);
     const auto ask = [tree](const char *method, const std::string &path, const std::string &body = "") {
@@ -26,6 +30,12 @@ static Backend introduce(const std::string &tree, const std::string &url)
     };
     Backend backend;
     backend.owned.push_back(descriptions);
+    backend.put_relay_between = [describe, tree] {
+        const size_t colon = tree.rfind(':'), path = std::min(tree.find('/', colon), tree.size());
+        const auto relay = std::make_shared<Relay>(std::stoi(tree.substr(colon + 1)));
+        describe(tree.substr(0, colon + 1) + std::to_string(relay->port) + tree.substr(path));
+        return relay;
+    };
     backend.make_folder = [ask](const std::string &path) { EXPECT_EQ(ask("MKCOL", path).status, 201) << path; };
     backend.remove = [ask](const std::string &path) { EXPECT_EQ(ask("DELETE", path).status, 204) << path; };
     backend.store = [ask](const std::string &path, const std::string &bytes) {

@@ -145,9 +145,10 @@ static const std::map<std::string, Kind> &kinds()
 {
     static const std::map<std::string, Kind> all = {
         {"Apache", {"/usr/sbin/apache2", "/dav", apache, {}, true}},
-        {"Lighttpd", {"/usr/sbin/lighttpd", "/dav", lighttpd, {"new\nline.txt"}}},
+        {"Lighttpd",
+         {"/usr/sbin/lighttpd", "/dav", lighttpd, {"new\nline.txt", "\xff\xfe.bin", std::string(250, 'x') + ".txt"}}},
         {"Nginx", {"/usr/sbin/nginx", "/dav", nginx}},
-        {"Chezdav", {"/usr/bin/chezdav", "", chezdav}},
+        {"Chezdav", {"/usr/bin/chezdav", "", chezdav, {"a&b;c=d+e.txt", "<b>bold&lt;.txt"}}},
         {"Sabre", {"/usr/bin/php", "/dav", sabre, {"new\nline.txt", "\xff\xfe.bin"}}},
         {"Rclone", {"/usr/bin/rclone", "/dav", rclone, {"new\nline.txt"}}},
     };
