@@ -12,6 +12,7 @@
 namespace cloud {
 
 static constexpr long long BELIEVED_SECONDS = 30LL * 24 * 3600;
+static constexpr long long AT_WORK_SECONDS = 60;
 static constexpr unsigned SAMPLE_OF = 16;
 static constexpr size_t DIGITS = 32;
 static constexpr std::string_view PREFIX = "velora-", SUFFIX = ".part";
@@ -19,7 +20,7 @@ static constexpr char SCHEMA[] = R"(
 CREATE TABLE IF NOT EXISTS known(storage TEXT NOT NULL, key TEXT NOT NULL, value INTEGER NOT NULL,
     found INTEGER NOT NULL, PRIMARY KEY(storage, key)) WITHOUT ROWID;
 CREATE TABLE IF NOT EXISTS temporary(storage TEXT NOT NULL, path TEXT NOT NULL, account TEXT NOT NULL,
-    pid INTEGER NOT NULL, boot TEXT NOT NULL, PRIMARY KEY(storage, path)) WITHOUT ROWID;
+    pid INTEGER NOT NULL, boot TEXT NOT NULL, made INTEGER NOT NULL, PRIMARY KEY(storage, path)) WITHOUT ROWID;
 )";
 
 // The temporary names that this process is at work on, whichever client of it is.
@@ -78,8 +79,8 @@ void Known::remember(const std::string &key, int value)
     found[key] = value;
     if (const Db *to = database()) {
         Stmt stmt(*to, "INSERT OR REPLACE INTO known(storage, key, value, found) VALUES(?, ?, ?, ?)");
-        stmt.bind(1, storage).bind(2, key).bind(3, static_cast<long long>(value)).bind(4, (long long)time(nullptr));
-        stmt.done();
+        const long long now = time(nullptr);
+        stmt.bind(1, storage).bind(2, key).bind(3, static_cast<long long>(value)).bind(4, now).done();
     }
 }
 
@@ -96,10 +97,17 @@ void Known::add_temporary(const std::string &who, const std::string &path)
         std::scoped_lock lock(s_mutex);
         s_at_work.insert(storage + path);
     }
-    left[path] = who;
+    const long long now = time(nullptr);
+    left[path] = {who, now};
     if (const Db *to = database()) {
-        Stmt stmt(*to, "INSERT OR REPLACE INTO temporary(storage, path, account, pid, boot) VALUES(?, ?, ?, ?, ?)");
-        stmt.bind(1, storage).bind(2, path).bind(3, who).bind(4, (long long)getpid()).bind(5, platform_boot_id());
+        Stmt stmt(*to,
+                  "INSERT OR REPLACE INTO temporary(storage, path, account, pid, boot, made) VALUES(?, ?, ?, ?, ?, ?)");
+        stmt.bind(1, storage)
+            .bind(2, path)
+            .bind(3, who)
+            .bind(4, static_cast<long long>(getpid()))
+            .bind(5, platform_boot_id())
+            .bind(6, now);
         stmt.done();
     }
 }
@@ -112,6 +120,18 @@ void Known::drop_temporary(const std::string &path)
         Stmt(*to, "DELETE FROM temporary WHERE storage = ? AND path = ?").bind(1, storage).bind(2, path).done();
 }
 
+void Known::drop_temporary_if_old(const std::string &path)
+{
+    leave_temporary(path);
+    const long long old = time(nullptr) - AT_WORK_SECONDS;
+    if (const auto found_left = left.find(path); found_left != left.end() && found_left->second.made < old)
+        left.erase(found_left);
+    if (const Db *to = database()) {
+        Stmt stmt(*to, "DELETE FROM temporary WHERE storage = ? AND path = ? AND made NOT BETWEEN ? AND ? + ?");
+        stmt.bind(1, storage).bind(2, path).bind(3, old).bind(4, old).bind(5, 2 * AT_WORK_SECONDS).done();
+    }
+}
+
 void Known::leave_temporary(const std::string &path)
 {
     std::scoped_lock lock(s_mutex);
@@ -121,8 +141,8 @@ void Known::leave_temporary(const std::string &path)
 std::vector<std::string> Known::left_behind(const std::string &who)
 {
     std::set<std::string> paths;
-    for (const auto &[path, owner] : left)
-        if (owner == who)
+    for (const auto &[path, one] : left)
+        if (one.account == who)
             paths.insert(path);
     if (const Db *from = database()) {
         Stmt stmt(*from, "SELECT path, account, pid, boot FROM temporary WHERE storage = ?");

@@ -38,6 +38,9 @@ class Known {
     // Notes the server path before something is stored there, and that nothing is there any more. `who` is the account.
     void add_temporary(const std::string &who, const std::string &path);
     void drop_temporary(const std::string &path);
+    // Nothing was there when it was to be deleted. It is asked for again while a service may still be at work on what
+    // was sent to it, which is a minute.
+    void drop_temporary_if_old(const std::string &path);
     // Paths that nobody is at work on: of processes that have ended, and of uploads that were broken off. They are to
     // be deleted by whoever asks.
     std::vector<std::string> left_behind(const std::string &who);
@@ -55,7 +58,11 @@ class Known {
     Db db;
     bool was_opened = false;
     std::map<std::string, std::optional<int>> found;
-    std::map<std::string, std::string> left; // path -> account; of this process, where the database fails
+    struct Temporary {
+        std::string account;
+        long long made = 0; // seconds since 1970
+    };
+    std::map<std::string, Temporary> left; // by path; of this process, where the database fails
     unsigned samples = 0;
 };
 

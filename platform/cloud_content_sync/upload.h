@@ -118,6 +118,7 @@ class Upload {
     bool is_prepared = false;
     bool is_temporary_whole = false; // and verified
     bool is_broken_off = false;      // a PUT to it was; the service may still be at work on it
+    bool was_broken_off = false;     // and it was deleted once
     std::function<void()> after_deletion;
     std::optional<std::chrono::steady_clock::time_point> delete_again_at;
     int moves = 0;

@@ -50,8 +50,10 @@ void Upload::left_behind_deleted(const Transfer &transfer)
 {
     if (transfer.result != CURLE_OK || transfer.status == 401)
         left_behind.clear(); // the upload will tell
-    else if (transfer.is_success() || transfer.status == 404)
+    else if (transfer.is_success())
         client.http.known.drop_temporary(left_behind.back());
+    else if (transfer.status == 404)
+        client.http.known.drop_temporary_if_old(left_behind.back());
     if (!left_behind.empty())
         left_behind.pop_back();
     delete_left_behind();
@@ -98,13 +100,20 @@ void Upload::temporary_deleted(const Transfer &transfer)
 {
     if (is_broken_off && transfer.result == CURLE_OK) { // some services store then what had come until then
         is_broken_off = false;
+        was_broken_off = true;
         delete_again_at = std::chrono::steady_clock::now() + DELETE_AGAIN;
         return client.http.wake_at(*delete_again_at);
     }
-    const bool is_gone = transfer.is_success() || (transfer.result == CURLE_OK && transfer.status == 404);
-    is_gone ? client.http.known.drop_temporary(temporary) : client.http.known.leave_temporary(temporary);
+    Known &known = client.http.known;
+    const bool is_absent = transfer.result == CURLE_OK && transfer.status == 404;
+    if (transfer.is_success() || (is_absent && !was_broken_off))
+        known.drop_temporary(temporary);
+    else if (is_absent)
+        known.drop_temporary_if_old(temporary);
+    else
+        known.leave_temporary(temporary);
     temporary.clear();
-    is_temporary_whole = is_broken_off = is_removing = false;
+    is_temporary_whole = is_broken_off = was_broken_off = is_removing = false;
     std::exchange(after_deletion, nullptr)();
 }
 

@@ -148,7 +148,8 @@ static const std::map<std::string, Kind> &kinds()
         {"Lighttpd",
          {"/usr/sbin/lighttpd", "/dav", lighttpd, {"new\nline.txt", "\xff\xfe.bin", std::string(250, 'x') + ".txt"}}},
         {"Nginx", {"/usr/sbin/nginx", "/dav", nginx}},
-        {"Chezdav", {"/usr/bin/chezdav", "", chezdav, {"a&b;c=d+e.txt", "<b>bold&lt;.txt"}}},
+        {"Chezdav",
+         {"/usr/bin/chezdav", "", chezdav, {"a&b;c=d+e.txt", "<b>bold&lt;.txt", "100%.txt", "%41.txt", "#1?.txt"}}},
         {"Sabre", {"/usr/bin/php", "/dav", sabre, {"new\nline.txt", "\xff\xfe.bin"}}},
         {"Rclone", {"/usr/bin/rclone", "/dav", rclone, {"new\nline.txt"}}},
     };
