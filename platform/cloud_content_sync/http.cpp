@@ -309,10 +309,13 @@ void Http::end_stalled()
 
 void Http::run(std::chrono::milliseconds wait)
 {
+    runner = std::this_thread::get_id();
     int running = 0;
     curl_multi_perform(multi.get(), &running);
     dispatch();
     end_stalled();
+    if (std::exchange(is_woken, false))
+        return;
     if (alarm != alarm.max()) {
         const auto left = std::chrono::ceil<std::chrono::milliseconds>(alarm - std::chrono::steady_clock::now());
         wait = std::clamp(left, std::chrono::milliseconds(0), wait);
@@ -324,6 +327,11 @@ void Http::run(std::chrono::milliseconds wait)
 
 void Http::wake()
 {
+    // A callback of this thread's own needs no system calls to be heard.
+    if (runner.load() == std::this_thread::get_id()) {
+        is_woken = true;
+        return;
+    }
     curl_multi_wakeup(multi.get());
 }
 

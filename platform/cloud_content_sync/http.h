@@ -4,12 +4,14 @@
 #include "cloud_content_sync/credentials.h"
 #include "cloud_content_sync/http_digest.h"
 #include "cloud_content_sync/known.h"
+#include <atomic>
 #include <chrono>
 #include <curl/curl.h>
 #include <functional>
 #include <map>
 #include <memory>
 #include <string>
+#include <thread>
 #include <vector>
 
 namespace cloud {
@@ -111,6 +113,8 @@ class Http {
     std::optional<DigestChallenge> challenge; // of the tree, when it asks for Digest
     std::vector<Transfer *> behind_knock;     // they are sent when the one that is under way has its answer
     Transfer *knock_now = nullptr;
+    std::atomic<std::thread::id> runner; // the thread of run()
+    bool is_woken = false;               // by that thread
     std::chrono::steady_clock::time_point alarm = std::chrono::steady_clock::time_point::max();
 
   public:
