@@ -40,6 +40,7 @@ enum cloud_content_sync_error_e {
     CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED = 28, // the local file changed while it was sent
     CLOUD_CONTENT_SYNC_ERROR_CERTIFICATE = 29,   // the service's certificate is not to be trusted; of a sign-in alone
     CLOUD_CONTENT_SYNC_ERROR_LOCAL_PRIVATE = 32, // the local file is not one that somebody can have meant to upload
+    CLOUD_CONTENT_SYNC_ERROR_UNSAFE = 31,        // the service would replace other files, nothing is uploaded to it
 };
 // States of a transfer and of a refresh. Callbacks bring RUNNING, DONE and FAILED; what is queued is silent.
 enum cloud_content_sync_state_e {

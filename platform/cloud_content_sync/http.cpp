@@ -5,11 +5,23 @@
 #include <cstring>
 #include <glib.h>
 #include <string_view>
+#include <utility>
 
 namespace cloud {
 
 static constexpr long CONNECT_SECONDS = 15;
 static constexpr long BUFFER_BYTES = 256 * 1024;
+
+static constexpr char AUTH[] = "auth";
+static constexpr int ATTEMPTS_MAX = 3;
+// A large body is not sent with a nonce of which the service may have had enough.
+static constexpr auto NONCE_FRESH = std::chrono::seconds(60);
+static constexpr long long LARGE_BYTES = 1 << 20;
+
+static bool may_be_digest(const Transfer &transfer)
+{
+    return transfer.url.empty() && !transfer.account.user.empty() && !transfer.account.secret.empty();
+}
 
 static size_t read_cb(char *buffer, size_t size, size_t count, void *data)
 {
@@ -55,10 +67,17 @@ static size_t header_cb(char *bytes, size_t size, size_t count, void *data)
     const std::string_view line(bytes, size * count);
     if (line.substr(0, 5) == "HTTP/") {
         transfer->etag.clear();
+        transfer->challenges.clear();
         transfer->repr_digest.clear();
+        transfer->content_length.clear();
     }
     take_header(line, "ETag", transfer->etag);
     take_header(line, "Repr-Digest", transfer->repr_digest);
+    take_header(line, "Content-Length", transfer->content_length);
+    std::string challenge;
+    take_header(line, "WWW-Authenticate", challenge);
+    if (!challenge.empty())
+        transfer->challenges.push_back(std::move(challenge));
     return size * count;
 }
 
@@ -90,6 +109,20 @@ static void set_credentials(CURL *easy, const Credentials &credentials)
     }
 }
 
+// A service that asked for Digest is not sent the password again, for as long as that is remembered.
+void Http::authorize(Transfer &transfer, const std::string &url)
+{
+    const bool is_digest = may_be_digest(transfer) && known.find(AUTH) == 1;
+    if (!is_digest)
+        return set_credentials(transfer.easy.get(), transfer.account);
+    if (!challenge)
+        return;
+    const size_t path = url.find('/', url.find("://") + 3);
+    const std::string header = digest_authorization(*challenge, transfer.account, transfer.method, url.substr(path));
+    transfer.answered_nonce = challenge->nonce;
+    transfer.header_list.reset(curl_slist_append(transfer.header_list.release(), header.c_str()));
+}
+
 static void set_body(CURL *easy, Transfer &transfer)
 {
     if (transfer.read) {
@@ -107,19 +140,86 @@ static void set_body(CURL *easy, Transfer &transfer)
         curl_easy_setopt(easy, CURLOPT_POSTFIELDSIZE, static_cast<long>(transfer.body.size()));
         curl_easy_setopt(easy, CURLOPT_POSTFIELDS, transfer.body.c_str());
     }
+    if (transfer.method == "HEAD")
+        curl_easy_setopt(easy, CURLOPT_NOBODY, 1L);
     curl_easy_setopt(easy, CURLOPT_CUSTOMREQUEST, transfer.method.c_str());
 }
 
 Transfer *Http::start(std::unique_ptr<Transfer> owned, const Credentials &credentials)
 {
     Transfer &transfer = *owned;
-    CURL *easy = curl_easy_init();
-    if (!easy)
+    transfer.account = credentials;
+    transfer.headers.emplace_back("Expect:");
+    transfer.easy.reset(curl_easy_init());
+    if (!transfer.easy)
         std::abort();
-    transfer.easy.reset(easy);
     transfer.stall_limit = std::chrono::seconds(service.stall_seconds);
     transfer.last_activity = std::chrono::steady_clock::now();
+    transfers[transfer.easy.get()] = std::move(owned);
+    if (must_knock(transfer)) {
+        behind_knock.push_back(&transfer);
+        knock();
+    } else {
+        launch(transfer);
+    }
+    return &transfer;
+}
 
+// A body that is not in memory is sent when it is known how to authenticate: a refusal would come after it.
+bool Http::must_knock(const Transfer &transfer)
+{
+    if (!transfer.read || !may_be_digest(transfer) || known.find(AUTH) == 0)
+        return false;
+    const bool is_old = challenge && std::chrono::steady_clock::now() - challenge->came > NONCE_FRESH;
+    return !challenge || (is_old && transfer.body_size >= LARGE_BYTES);
+}
+
+void Http::knock()
+{
+    if (knock_now)
+        return;
+    auto transfer = std::make_unique<Transfer>();
+    transfer->method = "PROPFIND";
+    transfer->path = "/";
+    transfer->headers = {"Depth: 0"};
+    transfer->done = [this](Transfer &done) {
+        knock_now = nullptr;
+        if (done.is_success() && !known.find(AUTH))
+            known.remember(AUTH, 0);
+        if (done.result == CURLE_OK && challenge)
+            challenge->came = std::chrono::steady_clock::now();
+        knocked();
+    };
+    knock_now = start(std::move(transfer), behind_knock.front()->account);
+}
+
+// Whatever came of it, those that waited find out for themselves.
+void Http::knocked()
+{
+    const std::vector<Transfer *> all = std::exchange(behind_knock, {});
+    for (Transfer *transfer : all) {
+        transfer->last_activity = std::chrono::steady_clock::now();
+        launch(*transfer);
+    }
+}
+
+// Whether a refused request was sent again, with an answer to the service's challenge.
+bool Http::answer_challenge(Transfer &transfer)
+{
+    if (transfer.result != CURLE_OK || transfer.status != 401 || !may_be_digest(transfer) ||
+        ++transfer.attempts >= ATTEMPTS_MAX)
+        return false;
+    auto next = digest_challenge(transfer.challenges);
+    if (!next || next->nonce == transfer.answered_nonce)
+        return false;
+    challenge = std::move(next);
+    known.remember(AUTH, 1);
+    return !transfer.read || (transfer.rewind && transfer.rewind());
+}
+
+void Http::launch(Transfer &transfer)
+{
+    CURL *easy = transfer.easy.get();
     const std::string url = transfer.url.empty() ? service.storage + percent_encode(transfer.path) : transfer.url;
     curl_easy_setopt(easy, CURLOPT_URL, url.c_str());
     curl_easy_setopt(easy, CURLOPT_PATH_AS_IS, 1L);
@@ -144,18 +244,13 @@ Transfer *Http::start(std::unique_ptr<Transfer> owned, const Credentials &creden
         curl_easy_setopt(easy, CURLOPT_FRESH_CONNECT, 1L);
         curl_easy_setopt(easy, CURLOPT_FORBID_REUSE, 1L); // or each would leave a connection behind
     }
-    set_credentials(easy, credentials);
     set_body(easy, transfer);
-
-    transfer.headers.emplace_back("Expect:");
     for (const std::string &header : transfer.headers)
         transfer.header_list.reset(curl_slist_append(transfer.header_list.release(), header.c_str()));
+    authorize(transfer, url);
     curl_easy_setopt(easy, CURLOPT_HTTPHEADER, transfer.header_list.get());
-
-    transfers[easy] = std::move(owned);
     if (curl_multi_add_handle(multi.get(), easy) != CURLM_OK)
         std::abort();
-    return &transfer;
 }
 
 void Http::abort(Transfer *transfer)
@@ -163,6 +258,7 @@ void Http::abort(Transfer *transfer)
     const auto found = transfer ? transfers.find(transfer->easy.get()) : transfers.end();
     if (found == transfers.end())
         return;
+    std::erase(behind_knock, transfer);
     curl_multi_remove_handle(multi.get(), found->first);
     transfers.erase(found);
 }
@@ -172,14 +268,25 @@ void Http::finish(CURL *easy, CURLcode result)
     const auto found = transfers.find(easy);
     if (found == transfers.end())
         return;
-    const std::unique_ptr<Transfer> transfer = std::move(found->second);
+    std::unique_ptr<Transfer> transfer = std::move(found->second);
     transfers.erase(found);
+    std::erase(behind_knock, transfer.get());
     curl_multi_remove_handle(multi.get(), easy);
     transfer->result = result;
     curl_easy_getinfo(easy, CURLINFO_RESPONSE_CODE, &transfer->status);
     curl_off_t seconds = 0;
     if (curl_easy_getinfo(easy, CURLINFO_RETRY_AFTER, &seconds) == CURLE_OK)
         transfer->retry_after = seconds;
+    if (answer_challenge(*transfer)) {
+        transfer->easy.reset(curl_easy_init());
+        if (!transfer->easy)
+            std::abort();
+        transfer->header_list.reset();
+        transfer->last_activity = std::chrono::steady_clock::now();
+        Transfer &again = *transfer;
+        transfers[again.easy.get()] = std::move(transfer);
+        return launch(again);
+    }
     transfer->done(*transfer);
 }
 
@@ -196,7 +303,8 @@ void Http::end_stalled()
     const auto now = std::chrono::steady_clock::now();
     std::vector<CURL *> stalled;
     for (const auto &[easy, transfer] : transfers)
-        if (now - transfer->last_activity > std::max(transfer->stall_limit, std::chrono::seconds(1)))
+        if (!std::ranges::count(behind_knock, transfer.get()) &&
+            now - transfer->last_activity > std::max(transfer->stall_limit, std::chrono::seconds(1)))
             stalled.push_back(easy);
     for (CURL *easy : stalled)
         finish(easy, CURLE_OPERATION_TIMEDOUT);
@@ -204,10 +312,19 @@ void Http::end_stalled()
 
 bool Http::run(std::chrono::milliseconds wait, int fd)
 {
+    runner = std::this_thread::get_id();
     int running = 0;
     curl_multi_perform(multi.get(), &running);
     dispatch();
     end_stalled();
+    if (std::exchange(is_woken, false))
+        return false;
+    if (alarm != alarm.max()) {
+        const auto left = std::chrono::ceil<std::chrono::milliseconds>(alarm - std::chrono::steady_clock::now());
+        wait = std::clamp(left, std::chrono::milliseconds(0), wait);
+        if (left <= wait)
+            alarm = alarm.max();
+    }
     curl_waitfd other = {.fd = fd, .events = CURL_WAIT_POLLIN, .revents = 0};
     curl_multi_poll(multi.get(), &other, fd >= 0 ? 1 : 0, static_cast<int>(wait.count()), nullptr);
     return other.revents != 0;
@@ -215,6 +332,11 @@ bool Http::run(std::chrono::milliseconds wait, int fd)
 
 void Http::wake()
 {
+    // A callback of this thread's own needs no system calls to be heard.
+    if (runner.load() == std::this_thread::get_id()) {
+        is_woken = true;
+        return;
+    }
     curl_multi_wakeup(multi.get());
 }
 

@@ -2,12 +2,16 @@
 // HTTP requests of one thread: a libcurl multi handle whose connections are kept alive between requests. Redirects are
 // never followed, so the credentials never leave the host of the service's description.
 #include "cloud_content_sync/credentials.h"
+#include "cloud_content_sync/http_digest.h"
+#include "cloud_content_sync/known.h"
+#include <atomic>
 #include <chrono>
 #include <curl/curl.h>
 #include <functional>
 #include <map>
 #include <memory>
 #include <string>
+#include <thread>
 #include <vector>
 
 namespace cloud {
@@ -24,6 +28,9 @@ struct Transfer {
     std::string body;
     std::function<size_t(char *, size_t)> read; // instead of body: source of exactly body_size bytes, or READ_FAILED
     long long body_size = 0;
+    // Begins the source again, which has to do with a refusal of the whole request alone; without it, or when it
+    // answers false, a body is sent once.
+    std::function<bool()> rewind;
     // Of the whole request, beside the limit for stalls; 0: none. With one the request is sent once alone.
     std::chrono::seconds time_limit{0};
     std::function<bool(const char *, size_t)> write; // takes the answer's body when its status is 2xx; false ends it
@@ -34,10 +41,15 @@ struct Transfer {
     long status = 0;
     std::string etag;
     std::string repr_digest;
-    long long retry_after = 0; // seconds, by the service's Retry-After; 0: it gave none
-    bool was_resent = false;   // libcurl found the connection dead and wanted to send the body a second time
+    long long retry_after = 0;  // seconds, by the service's Retry-After; 0: it gave none
+    std::string content_length; // as the answer's header has it
+    bool was_resent = false;    // libcurl found the connection dead and wanted to send the body a second time
 
     // Kept by Http.
+    Credentials account;
+    std::vector<std::string> challenges; // of a 401
+    std::string answered_nonce;          // the nonce that it was sent with
+    int attempts = 0;
     std::chrono::seconds stall_limit{60};
     std::chrono::steady_clock::time_point last_activity;
     std::unique_ptr<CURL, decltype(&curl_easy_cleanup)> easy{nullptr, curl_easy_cleanup};
@@ -81,13 +93,40 @@ class Http {
     }
     // Ends the wait of run(), or of the next one. Any thread.
     void wake();
+    // Lets run() return at that time at the latest, once.
+    void wake_at(std::chrono::steady_clock::time_point time)
+    {
+        alarm = time;
+    }
+    // The root URL of the WebDAV tree, without a final "/".
+    const std::string &storage() const
+    {
+        return service.storage;
+    }
 
   private:
+    void launch(Transfer &transfer);
+    void authorize(Transfer &transfer, const std::string &url);
+    bool must_knock(const Transfer &transfer);
+    void knock();
+    void knocked();
+    bool answer_challenge(Transfer &transfer);
     void dispatch();
     void end_stalled();
     void finish(CURL *easy, CURLcode result);
 
     const Service service;
+    std::optional<DigestChallenge> challenge; // of the tree, when it asks for Digest
+    std::vector<Transfer *> behind_knock;     // they are sent when the one that is under way has its answer
+    Transfer *knock_now = nullptr;
+    std::atomic<std::thread::id> runner; // the thread of run()
+    bool is_woken = false;               // by that thread
+    std::chrono::steady_clock::time_point alarm = std::chrono::steady_clock::time_point::max();
+
+  public:
+    Known known{service};
+
+  private:
     std::unique_ptr<CURLM, decltype(&curl_multi_cleanup)> multi;
     std::map<CURL *, std::unique_ptr<Transfer>> transfers;
 };

@@ -61,8 +61,10 @@ void Refresh::list(const std::string &folder)
 void Refresh::listed(const std::string &folder, const Transfer &transfer, MultistatusReader &reader)
 {
     const bool answered = transfer.result == CURLE_OK;
-    // A folder below the root may have been removed since it was seen, or be closed to this account.
-    const bool is_skipped = folder != "/" && answered && (transfer.status == 404 || transfer.status == 403);
+    // A folder below the root may have been removed since it was seen, or be closed to this account, or have a name
+    // that the service lists and then refuses.
+    const bool is_refused = transfer.status == 404 || transfer.status == 403 || transfer.status == 400;
+    const bool is_skipped = folder != "/" && answered && is_refused;
     if (is_skipped)
         return list_next();
     if (transfer.result != CURLE_OK || transfer.status != 207) {
@@ -70,7 +72,11 @@ void Refresh::listed(const std::string &folder, const Transfer &transfer, Multis
         // A folder's name was the service's own, so a refusal of it is the service's failure.
         return finish(error == CLOUD_CONTENT_SYNC_ERROR_BAD_NAME ? CLOUD_CONTENT_SYNC_ERROR_SERVER : error);
     }
-    if (!reader.finish() || !take(folder, reader))
+    const bool is_whole = reader.finish();
+    // There is a service that cannot write the paths of some folders; the rest of the tree is there nevertheless.
+    if (folder != "/" && is_whole && reader.entries.empty())
+        return list_next();
+    if (!is_whole || !take(folder, reader))
         return finish(CLOUD_CONTENT_SYNC_ERROR_SERVER);
     list_next();
 }
@@ -86,6 +92,8 @@ bool Refresh::take(const std::string &folder, MultistatusReader &reader)
         if (parent_of(entry.path) != folder || !seen.insert(entry.path).second)
             continue;
         const std::string name = name_of(entry.path);
+        if (is_temporary_name(name))
+            continue;
         if (!entry.is_folder) {
             contents.push_back({folder, name, std::max(entry.size, 0LL), entry.mtime, std::move(entry.etag)});
             continue;

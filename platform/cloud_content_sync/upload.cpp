@@ -22,6 +22,8 @@ Upload::Upload(Client &owner, UploadRequest request) : client(owner), wanted(std
 Upload::~Upload()
 {
     client.http.abort(transfer_now);
+    if (!temporary.empty())
+        client.http.known.leave_temporary(temporary);
     if (fd >= 0)
         close(fd);
 }
@@ -112,6 +114,10 @@ void Upload::wait_step()
     if (const int error = open_local())
         return finish(error);
     read_error = 0;
+    if (is_temporary_whole) { // what is open is the move
+        is_moving = true;
+        return look(false, &Upload::temporary_looked_at);
+    }
     return is_unknown ? resume() : put();
 }
 
@@ -164,13 +170,16 @@ bool Upload::local_changed() const
 void Upload::step()
 {
     if (ended || is_removing)
-        return;
+        return delete_again();
     if (!client.is_wanted(wanted.id)) {
-        if (is_putting && transfer_now && whole_file_read()) {
+        if (probe)
+            return probe->cancel();
+        if (transfer_now && (is_moving || (is_putting && whole_file_read()))) {
             // The service may have stored it already; its answer tells.
             transfer_now->stall_limit = std::min<std::chrono::seconds>(transfer_now->stall_limit, CANCELLED_LIMIT);
             return;
         }
+        is_broken_off |= is_putting && transfer_now;
         client.http.abort(transfer_now);
         transfer_now = nullptr;
         return created ? remove_stored(0) : finish(0);
@@ -190,6 +199,10 @@ void Upload::end(int error)
 {
     client.http.abort(transfer_now);
     transfer_now = nullptr;
+    probe.reset();
+    if (!temporary.empty())
+        client.http.known.leave_temporary(temporary); // there is no time to delete it
+    temporary.clear();
     if (!ended)
         finish(error);
 }
@@ -221,21 +234,30 @@ void Upload::request(std::unique_ptr<Transfer> transfer, void (Upload::*then)(co
     transfer_now = client.http.start(std::move(transfer), credentials);
 }
 
-void Upload::put()
+bool Upload::begin_body()
 {
-    if (++puts > PUTS_MAX)
-        return finish(CLOUD_CONTENT_SYNC_ERROR_SERVER);
     checksum.emplace();
     sent = 0;
+    return true;
+}
+
+void Upload::put()
+{
+    if (!place())
+        return;
+    if (++puts > PUTS_MAX)
+        return finish(CLOUD_CONTENT_SYNC_ERROR_SERVER);
+    begin_body();
     // A database that cannot be written costs this knowledge, not the upload.
     static_cast<void>(client.ledger.sent(who, record, target));
     auto transfer = std::make_unique<Transfer>();
     transfer->method = "PUT";
-    transfer->path = target;
+    transfer->path = where();
     // RFC 9110, 13.1.2: nothing of that name may exist. RFC 9530, 4: the digest of what is stored is welcome.
     transfer->headers = {"If-None-Match: *", "Content-Type: application/octet-stream", "Want-Repr-Digest: sha-256=10"};
     transfer->body_size = local.st_size;
     transfer->read = [this](char *buffer, size_t size) { return read(buffer, size); };
+    transfer->rewind = [this] { return begin_body(); };
     is_putting = true;
     request(std::move(transfer), &Upload::put_ended);
 }
@@ -243,6 +265,8 @@ void Upload::put()
 void Upload::put_ended(const Transfer &transfer)
 {
     is_putting = false;
+    put_status = transfer.status;
+    is_broken_off |= transfer.result != CURLE_OK && !transfer.never_sent();
     if (whole_file_read())
         digest = checksum->hex();
     if (transfer.is_success())
@@ -260,11 +284,14 @@ void Upload::put_ended(const Transfer &transfer)
     }
     if (transfer.status == 412 && (lost_reply || is_unknown))
         return look(true, &Upload::settled);
+    if (transfer.status == 412 && renew_temporary())
+        return;
     if (transfer.status == 412)
         return try_next_name();
     if (transfer.status == 405 || transfer.status == 409)
         return look(false, &Upload::occupied);
-    finish(transfer.error());
+    if (!is_folder_in_doubt(transfer.status, transfer.error()))
+        finish(transfer.error());
 }
 
 void Upload::put_unanswered(const Transfer &transfer)
@@ -294,7 +321,8 @@ void Upload::settled(const Look &result)
     if (result.found == Found::ABSENT)
         return put();
     is_unknown = false;
-    try_next_name();
+    if (!renew_temporary())
+        try_next_name();
 }
 
 // After an attempt that is not worth another one at once: is it there all the same?
@@ -305,7 +333,8 @@ void Upload::refused(const Look &result)
     if (result.found == Found::SAME)
         return verified(result);
     is_unknown = result.found == Found::ABSENT;
-    trouble(put_error);
+    if (!is_unknown || !is_folder_in_doubt(put_status, put_error))
+        trouble(put_error);
 }
 
 // After a refusal that a folder of that name explains.
@@ -324,7 +353,7 @@ void Upload::try_next_name()
     target = join(parent_of(target), next_free_name(name_of(target)));
     lost_reply = is_unknown = false;
     // Looking costs less than sending a body in vain.
-    look(false, &Upload::next_name_looked_at);
+    look(false, &Upload::next_name_looked_at, target);
 }
 
 void Upload::next_name_looked_at(const Look &result)
@@ -340,6 +369,8 @@ void Upload::stored(const Transfer &transfer)
 {
     // 201: made by this request; 200 and 204 would mean that something was there and the condition was ignored.
     created = transfer.status == 201;
+    if (!created && temporary.empty())
+        client.http.known.forget("way");
     stored_etag = transfer.etag;
     if (!client.is_wanted(wanted.id))
         return created ? remove_stored(0) : finish(0);
@@ -349,7 +380,7 @@ void Upload::stored(const Transfer &transfer)
         return remove_stored(CLOUD_CONTENT_SYNC_ERROR_CORRUPTED);
     const std::string answered = sha256_of(transfer.repr_digest);
     if (answered.empty())
-        return look(true, &Upload::verified);
+        return check_stored();
     verified({.found = answered == digest ? Found::SAME : Found::DIFFERENT});
 }
 
@@ -366,21 +397,24 @@ void Upload::verified(const Look &result)
     client.patience.over();
     if (local_changed())
         return remove_stored(CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED);
+    if (!temporary.empty())
+        return move();
     const ContentRow row{parent_of(target), name_of(target), local.st_size, time(nullptr), stored_etag};
     if (!client.report_done(wanted, row, who, record))
         return remove_stored(0); // cancelled in the last moment
     ended = true;
 }
 
-void Upload::look(bool by_digest, LookDone then)
+void Upload::look(bool by_digest, LookDone then, const std::string &path)
 {
+    look_path = path.empty() ? where() : path;
     look_by_digest = by_digest;
     look_done = then;
     look_attempts++;
     auto reader = std::make_shared<MultistatusReader>(client.service.root_path);
     auto transfer = std::make_unique<Transfer>();
     transfer->method = "PROPFIND";
-    transfer->path = target;
+    transfer->path = look_path;
     transfer->headers = {"Depth: 0", "Content-Type: application/xml; charset=utf-8"};
     transfer->body = propfind_body(by_digest);
     transfer->write = [reader](const char *data, size_t size) { return reader->feed(data, size); };
@@ -400,7 +434,7 @@ void Upload::finish_look(const Look &result)
 void Upload::looked(const Transfer &transfer, MultistatusReader &reader)
 {
     if (transfer.result != CURLE_OK && look_attempts < LOOKS_MAX)
-        return look(look_by_digest, look_done);
+        return look(look_by_digest, look_done, std::string(look_path));
     if (transfer.result == CURLE_OK && transfer.status == 404)
         return finish_look({.found = Found::ABSENT});
     // Services redirect the path of a folder that lacks its final "/".
@@ -414,8 +448,10 @@ void Upload::looked(const Transfer &transfer, MultistatusReader &reader)
     const bool may_be_same = !entry.is_folder && whole_file_read() && (entry.size < 0 || entry.size == local.st_size);
     if (!look_by_digest || !may_be_same)
         return finish_look({.found = Found::DIFFERENT});
-    if (entry.sha256.empty())
+    if (entry.sha256.empty()) {
+        client.http.known.remember("digest", 0);
         return read_back();
+    }
     finish_look({.found = entry.sha256 == digest ? Found::SAME : Found::DIFFERENT});
 }
 
@@ -429,7 +465,7 @@ void Upload::read_back()
     auto sum = std::make_shared<Sum>();
     auto transfer = std::make_unique<Transfer>();
     transfer->method = "GET";
-    transfer->path = target;
+    transfer->path = look_path;
     transfer->write = [this, sum](const char *data, size_t size) {
         sum->size += static_cast<long long>(size);
         sum->checksum.add(data, size);
@@ -452,7 +488,7 @@ void Upload::read_back()
 // Takes back what this request has stored, then ends with `error` (0: cancelled, nobody is told).
 void Upload::remove_stored(int error)
 {
-    if (!created)
+    if (!created || !temporary.empty())
         return finish(error);
     is_removing = true;
     auto transfer = std::make_unique<Transfer>();
@@ -470,6 +506,8 @@ void Upload::remove_stored(int error)
 
 void Upload::finish(int error)
 {
+    if (!temporary.empty())
+        return delete_temporary([this, error] { finish(error); });
     ended = true;
     client.wait_end();
     if (error != 0 && is_unknown)

@@ -5,6 +5,7 @@
 #include "cloud_content_sync/digest.h"
 #include "cloud_content_sync/ledger.h"
 #include "cloud_content_sync/patience.h"
+#include "cloud_content_sync/probe.h"
 #include <optional>
 #include <sys/stat.h>
 
@@ -51,6 +52,7 @@ class Upload {
     bool local_changed() const;
     bool local_is_what_was_sent() const;
     size_t read(char *buffer, size_t size);
+    bool begin_body();
     void put();
     void put_ended(const Transfer &transfer);
     void put_unanswered(const Transfer &transfer);
@@ -59,9 +61,35 @@ class Upload {
     void settled(const Look &look);
     void occupied(const Look &look);
     void try_next_name();
+    // upload_place.cpp: where and how the file is stored without replacing another.
+    void prepare();
+    void delete_left_behind();
+    void left_behind_deleted(const Transfer &transfer);
+    void choose_way();
+    bool place();
+    const std::string &where() const
+    {
+        return temporary.empty() ? target : temporary;
+    }
+    void delete_temporary(std::function<void()> then);
+    void send_deletion();
+    void temporary_deleted(const Transfer &transfer);
+    void delete_again();
+    bool renew_temporary();
+    void move();
+    void moved(const Transfer &transfer);
+    void arrived(const std::string &etag);
+    void temporary_looked_at(const Look &look);
+    void target_looked_at(const Look &look);
+    bool is_folder_in_doubt(long status, int error);
+    void folder_looked_at(const Look &look);
+    // Compares what is stored with what was sent, as thoroughly as the service and its description ask for.
+    void check_stored();
+    void head_ended(const Transfer &transfer);
     void next_name_looked_at(const Look &look);
-    // Compares what is stored under `target` with what was sent; by_digest false: only whether something is there.
-    void look(bool by_digest, LookDone then);
+    // Compares what is stored under `path` (empty: where()) with what was sent; by_digest false: only whether something
+    // is there.
+    void look(bool by_digest, LookDone then, const std::string &path = "");
     void looked(const Transfer &transfer, MultistatusReader &reader);
     void read_back();
     void finish_look(const Look &result);
@@ -87,6 +115,7 @@ class Upload {
     int puts = 0;
     bool lost_reply = false; // an attempt for `target` ended without an answer
     bool is_unknown = false; // an attempt may have stored the file under `target`, and nobody has seen it there
+    long put_status = 0;     // HTTP's, or 0
     int put_error = 0;       // of the attempt that is being looked after
     LedgerRow record;        // in the book of uploads
     std::string who;         // whose upload it is
@@ -96,10 +125,23 @@ class Upload {
     std::string stored_etag;
     int names_tried = 0;
     int look_attempts = 0;
+    std::string look_path;
     bool look_by_digest = false;
     LookDone look_done = nullptr;
     Transfer *transfer_now = nullptr;
+    std::unique_ptr<Probe> probe;
+    std::vector<std::string> left_behind; // of earlier uploads, to be deleted
+    std::string temporary;                // server path, while the file is not under its own name
+    bool is_prepared = false;
+    bool is_temporary_whole = false; // and verified
+    bool is_broken_off = false;      // a PUT to it was; the service may still be at work on it
+    bool was_broken_off = false;     // and it was deleted once
+    std::function<void()> after_deletion;
+    std::optional<std::chrono::steady_clock::time_point> delete_again_at;
+    int moves = 0;
+    int folder_error = 0;
     bool is_putting = false;
+    bool is_moving = false;
     bool is_removing = false;
     bool ended = false;
 };

@@ -76,6 +76,8 @@ const char *__failure_text(int error)
         return __text("IDS_VELORA_BODY_BAD_NAME");
     case CLOUD_CONTENT_SYNC_ERROR_STORAGE_FULL:
         return __text("IDS_VELORA_BODY_STORAGE_FULL");
+    case CLOUD_CONTENT_SYNC_ERROR_UNSAFE:
+        return __text("IDS_VELORA_BODY_UNSAFE");
     default:
         return __text("IDS_VELORA_BODY_FAILED");
     }

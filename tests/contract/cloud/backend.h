@@ -4,6 +4,8 @@
 #include <memory>
 #include <optional>
 
+class Relay;
+
 struct Backend {
     Names taboo = {};           // names that it refuses
     std::string media_url = {}; // of the account interface that gives thumbnails, and addresses to stream from
@@ -13,6 +15,8 @@ struct Backend {
     std::function<std::optional<std::string>(const std::string &path)> content = {};
     std::function<Names(const std::string &folder)> list = {}; // unsorted
     std::function<void()> go_down = {};                        // from now on the service cannot be reached
+    // For clients that are created from now on, and destroyed before it.
+    std::function<std::shared_ptr<Relay>()> put_relay_between = {};
     // Of a service with pages: USER signs in there and allows the request token; whether an access token is alive.
     std::function<void(const std::string &token)> approve = {};
     std::function<bool(const std::string &access)> is_alive = {};

@@ -1,8 +1,10 @@
-// Apache's mod_dav and velora-cloud, each a process of its own on a port of 127.0.0.1.
+// velora-cloud and the WebDAV servers of Debian.
 #include "backend.h"
 #include "cloud.h"
 #include "cloud_content_sync/dav.h"
 #include "cloud_content_sync/names.h"
+#include "dav_servers.h"
+#include "relay.h"
 #include <csignal>
 #include <cstring>
 #include <glib.h>
@@ -10,22 +12,31 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
-// Signs in to the service at this address.
-static Backend introduce(const std::string &url)
+// Signs in to the service whose tree and whose other pages are at these addresses.
+static Backend introduce(const std::string &tree, const std::string &url)
 {
     const auto descriptions = std::make_shared<TempFolder>();
-    descriptions->file("Test.conf",
-                       "[Service]\nStorage=" + url + "/dav/\nApi=" + url + "\nWeb=" + url + "\nWaitLimit=0\n");
+    const auto describe = [descriptions, url](const std::string &at) {
+        descriptions->file("Test.conf",
+                           "[Service]\nStorage=" + at + "/\nApi=" + url + "\nWeb=" + url + "\nWaitLimit=0\n");
+    };
+    describe(tree);
     setenv("CLOUD_SERVICES_DIR", descriptions->path.c_str(), 1);
     EXPECT_EQ(cloud_content_sync_credentials_set("Test", USER, USER, PASSWORD), 0);
-    const auto ask = [url](const char *method, const std::string &path, const std::string &body = "") {
+    const auto ask = [tree](const char *method, const std::string &path, const std::string &body = "") {
         Headers headers = {basic_authorization(USER, PASSWORD)};
         if (std::string(method) == "PROPFIND")
             headers.emplace_back("Depth: 1");
-        return ask_url(method, url + "/dav" + cloud::percent_encode(path), headers, body);
+        return ask_url(method, tree + cloud::percent_encode(path), headers, body);
     };
     Backend backend;
     backend.owned.push_back(descriptions);
+    backend.put_relay_between = [describe, tree] {
+        const size_t colon = tree.rfind(':'), path = std::min(tree.find('/', colon), tree.size());
+        const auto relay = std::make_shared<Relay>(std::stoi(tree.substr(colon + 1)));
+        describe(tree.substr(0, colon + 1) + std::to_string(relay->port) + tree.substr(path));
+        return relay;
+    };
     backend.make_folder = [ask](const std::string &path) { EXPECT_EQ(ask("MKCOL", path).status, 201) << path; };
     backend.remove = [ask](const std::string &path) { EXPECT_EQ(ask("DELETE", path).status, 204) << path; };
     backend.store = [ask](const std::string &path, const std::string &bytes) {
@@ -112,7 +123,7 @@ static void sign_in_at(const std::string &url, std::string address)
 static Backend start_velora_cloud()
 {
     const auto service = std::make_shared<Cloud>(Headers{"--add-account", USER}, std::string(PASSWORD) + "\n");
-    Backend backend = introduce(service->url);
+    Backend backend = introduce(service->url + "/dav", service->url);
     backend.taboo = {"new\nline.txt", "\xff\xfe.bin"};
     backend.media_url = service->url;
     backend.go_down = [service] { service->stop(SIGTERM); };
@@ -126,77 +137,37 @@ static Backend start_velora_cloud()
     return backend;
 }
 
-static void write_config(const TempFolder &place, int port)
+// The test puts files there and looks at them behind the server's back: what it lists and what it hides.
+static void use_folder(Backend &backend, const std::string &root)
 {
-    guint8 digest[20];
-    gsize size = sizeof digest;
-    GChecksum *sum = g_checksum_new(G_CHECKSUM_SHA1);
-    g_checksum_update(sum, reinterpret_cast<const guchar *>(PASSWORD), -1);
-    g_checksum_get_digest(sum, digest, &size);
-    g_checksum_free(sum);
-    g_autofree char *hash = g_base64_encode(digest, size);
-    place.file("users", std::string(USER) + ":{SHA}" + hash + "\n");
-    std::string modules;
-    for (const std::string module :
-         {"mpm_event", "authn_core", "authn_file", "authz_core", "authz_user", "auth_basic", "dav", "dav_fs"})
-        modules += "LoadModule " + module + "_module /usr/lib/apache2/modules/mod_" + module + ".so\n";
-    place.file("httpd.conf",
-               "Define place " + place.path + "\nListen 127.0.0.1:" + std::to_string(port) + "\n" + modules + R"(
-ServerRoot ${place}
-ServerName 127.0.0.1
-PidFile ${place}/pid
-ErrorLog ${place}/error.log
-DocumentRoot ${place}
-DavLockDB ${place}/lock/db
-<Directory ${place}/dav>
-Dav On
-AuthType Basic
-AuthName test
-AuthUserFile ${place}/users
-Require valid-user
-</Directory>
-)");
+    const auto at = [root](const std::string &path) { return root + path; };
+    backend.make_folder = [at](const std::string &path) { std::filesystem::create_directory(at(path)); };
+    backend.remove = [at](const std::string &path) { std::filesystem::remove_all(at(path)); };
+    backend.store = [at](const std::string &path, const std::string &bytes) { write_file(at(path), bytes); };
+    backend.content = [at](const std::string &path) {
+        return std::filesystem::is_regular_file(at(path)) ? std::optional(read_file(at(path))) : std::nullopt;
+    };
+    backend.list = [at](const std::string &path) { return names_in(at(path)); };
 }
 
-static std::optional<Backend> start_apache()
+static std::optional<Backend> start_other(const std::string &name)
 {
-    const auto place = std::make_shared<TempFolder>();
-    const unsigned user = geteuid() == 0 ? 65534 : 0; // Apache refuses to serve as root
-    for (const char *folder : {"", "dav", "lock"}) {
-        std::filesystem::create_directories(*place / folder);
-        if (user && chown((*place / folder).c_str(), user, user) != 0)
-            std::abort();
-    }
-    for (int attempt = 0; attempt < 5; attempt++) {
-        const int port = free_port();
-        write_config(*place, port);
-        const pid_t pid = spawn({"/usr/sbin/apache2", "-X", "-f", *place / "httpd.conf"}, {}, {}, user);
-        bool is_open = false, has_ended = false; // when somebody else took the port
-        comes_true([&] {
-            is_open = Connection(port).is_open;
-            has_ended = waitpid(pid, nullptr, WNOHANG) != 0;
-            return is_open || has_ended;
-        });
-        if (has_ended)
-            continue;
-        const std::shared_ptr<void> stop(nullptr, [pid](void *) {
-            kill(pid, SIGTERM);
-            end_of(pid);
-        });
-        Backend backend = introduce("http://127.0.0.1:" + std::to_string(port));
-        backend.owned.insert(backend.owned.end(), {place, stop});
-        backend.go_down = [pid] { kill(pid, SIGKILL); };
-        return backend;
-    }
-    ADD_FAILURE() << "Apache does not start";
-    return {};
+    const auto server = start_dav_server(name, USER, PASSWORD);
+    if (!server)
+        return {};
+    Backend backend = introduce(server->url, server->url);
+    if (!server->has_own_user)
+        use_folder(backend, server->folder);
+    backend.owned.push_back(server->process);
+    backend.taboo = server->taboo;
+    backend.go_down = [pid = server->pid] { kill(pid, SIGKILL); };
+    return backend;
 }
 
 Names backend_names()
 {
-    Names names = {"VeloraCloud"};
-    if (access("/usr/sbin/apache2", X_OK) == 0)
-        names.emplace_back("Apache");
+    Names names = dav_server_names();
+    names.insert(names.begin(), "VeloraCloud");
     return names;
 }
 
@@ -212,5 +183,5 @@ Names page_names()
 
 std::optional<Backend> start_backend(const std::string &name)
 {
-    return name == "VeloraCloud" ? start_velora_cloud() : start_apache();
+    return name == "VeloraCloud" ? start_velora_cloud() : start_other(name);
 }

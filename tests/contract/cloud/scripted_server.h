@@ -1,12 +1,13 @@
 #pragma once
 // An HTTP server that says what a test tells it to, whole or broken, and a client of it.
+#include "cloud_content_sync/known.h"
 #include "transfers.h"
 #include <netinet/in.h>
 #include <sys/socket.h>
 #include <unistd.h>
 
 struct Request {
-    std::string method, path, body, authorization;
+    std::string method, path, body, authorization, destination;
     int connection; // counts from 1
 };
 
@@ -71,11 +72,13 @@ class ScriptedServer {
         if (!fgets(line, sizeof line, stream) || sscanf(line, "%15s %2047s", method, path) != 2)
             return false;
         size_t length = 0;
-        request = {method, path, "", "", request.connection};
+        request = {method, path, "", "", "", request.connection};
         while (fgets(line, sizeof line, stream) && line[0] != '\r') {
             const std::string field(line, std::strlen(line) - 2);
             if (field.starts_with("Authorization: "))
                 request.authorization = field.substr(15);
+            if (field.starts_with("Destination: "))
+                request.destination = field.substr(13);
             if (field.starts_with("Content-Length: "))
                 length = std::stoul(field.substr(16));
         }
@@ -86,7 +89,7 @@ class ScriptedServer {
     void run(int fd, int number)
     {
         FILE *stream = fdopen(fd, "r");
-        Request request{"", "", "", "", number};
+        Request request{"", "", "", "", "", number};
         for (bool goes_on = true; goes_on && read_request(stream, request);) {
             std::unique_lock lock(mutex);
             const auto before = hook;
@@ -155,6 +158,8 @@ class Scripted : public testing::Test {
                                    "\nWaitLimit=" + std::to_string(wait_seconds) + "\n");
         setenv("CLOUD_SERVICES_DIR", home.path.c_str(), 1);
         ASSERT_EQ(cloud_content_sync_credentials_set("Test", nullptr, nullptr, "token"), 0);
+        if (way)
+            cloud::Known(*cloud::service_find("Test")).remember("way", static_cast<int>(*way));
         ASSERT_EQ(cloud_content_sync_create("Test", &handle), 0);
     }
     void TearDown() override
@@ -165,6 +170,7 @@ class Scripted : public testing::Test {
         server.reset();
     }
 
+    std::optional<cloud::Way> way = cloud::Way::CONDITION; // what the client has found out of the server before
     TempHome home;
     TempFolder scratch; // for local files
     std::unique_ptr<ScriptedServer> server;

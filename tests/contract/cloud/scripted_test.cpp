@@ -78,6 +78,7 @@ TEST_F(Scripted, hrefs_in_every_form)
                            file("/r%20t/%2e%2e") + file("/r%20t/a%2Fb") + file("/r%20t/nul%00x") +
                            file("/r%20t/deeper/down") + file("relative") + file("") + file("/r%20t//slashes") +
                            file("/r%20t/huge", "99999999999999999999999") + file("/r%20t/b.txt") +
+                           file("HTTPS://Other.Example:8443/%72%20t/port%2d1") +
                            "<d:response><d:href>/r%20t/gone</d:href>"
                            "<d:propstat><d:prop><d:getcontentlength>7</d:getcontentlength></d:prop>"
                            "<d:status>HTTP/1.1 404 Not Found</d:status></d:propstat></d:response>");
@@ -86,7 +87,7 @@ TEST_F(Scripted, hrefs_in_every_form)
     EXPECT_EQ(listing(handle, "/"), (Names{"absolute url/", "noslash/", "A:5", "b.txt:5",
                                            "c\xff"
                                            "d:5",
-                                           "gone:0", "huge:0", "slashes:5"}));
+                                           "gone:0", "huge:0", "port-1:5", "slashes:5"}));
     EXPECT_EQ(server->requests().at(0).authorization, "Bearer token");
 }
 
