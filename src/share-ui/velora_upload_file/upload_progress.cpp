@@ -87,3 +87,16 @@ void __progress_line_update(UploadViewData *vd)
         __show_end(vd);
     }
 }
+
+static Ecore_Job *s_update;
+
+void __progress_line_update_soon()
+{
+    const auto update = [](void *) {
+        s_update = nullptr;
+        if (s_vd)
+            __progress_line_update(s_vd);
+    };
+    if (!s_update)
+        s_update = ecore_job_add(update, nullptr);
+}
