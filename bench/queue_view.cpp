@@ -17,6 +17,7 @@
 #include <cstdio>
 #include <cstring>
 #include <ctime>
+#include <fstream>
 #include <malloc.h>
 #include <vector>
 
@@ -75,20 +76,34 @@ struct Stall {
     }
 };
 
-// When the main thread has come to rest: the start of the first quarter of a second in which it ran less than a tenth.
+// What the main thread had of the machine so far, in seconds.
+struct Share {
+    double ran = 0, waited = 0; // for a processor that was busy with others
+
+    Share()
+    {
+        std::ifstream("/proc/thread-self/schedstat") >> ran >> waited;
+        ran /= 1e9; // of nanoseconds
+        waited /= 1e9;
+    }
+};
+
+// When the main thread has come to rest: the start of the first quarter of a second in which it ran for less than a
+// tenth of the time that it could have.
 double wait_for_quiet()
 {
-    double since = now(), own = seconds_of(CLOCK_THREAD_CPUTIME_ID);
+    double since = now();
+    Share before;
     driver::run_until(
         [&] {
             const double time = now();
             if (time - since < 0.25)
                 return false;
-            const double ran = seconds_of(CLOCK_THREAD_CPUTIME_ID) - own;
-            if (ran < 0.025)
+            const Share share;
+            if (share.ran - before.ran < 0.1 * (time - since - (share.waited - before.waited)))
                 return true;
             since = time;
-            own += ran;
+            before = share;
             return false;
         },
         600);

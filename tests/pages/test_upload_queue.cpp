@@ -1,5 +1,7 @@
 // The queue: its order, counters, notifications, failures, cancels, retries, and ends that come too early.
 #include "upload_page.h"
+#include "velora_upload_file/upload_listed.h"
+#include "velora_upload_file/upload_retry.h"
 
 namespace {
 
@@ -63,7 +65,9 @@ TEST_F(Queue, RunsInOrderAndCounts)
             ASSERT_TRUE(finish_file());
             const std::string count = std::to_string(ended);
             EXPECT_TRUE(wait_for([&] { return ongoing() == count + " / 3"; })) << ongoing();
-            EXPECT_TRUE(shows(count + " of 3 · " + count + "\u00a0KB of 3\u00a0KB")) << driver::read_texts(window());
+            const std::string words = count + " of 3 · " + count + "\u00a0KB of 3\u00a0KB"; // with the next frame
+            EXPECT_TRUE(wait_for([&] { return driver::read_texts(window()).find(words) != std::string::npos; }))
+                << driver::read_texts(window());
         }
         EXPECT_TRUE(wait_for([] {
             return rows() == Texts{"uploaded three.txt", "uploaded one(1).jpg", "queued two.txt"};
@@ -317,6 +321,103 @@ TEST_F(Queue, EndsInTheMiddleOfATransfer)
         });
         EXPECT_TRUE(notifications().empty() || notifications()[0].find("Velora: ") == std::string::npos)
             << "no progress is left behind";
+    }
+}
+
+// Files have rows as far as somebody has scrolled; the others are the queue's as well.
+TEST_F(Queue, ALongListStandsForFilesWithoutRows)
+{
+    const size_t count = 150;
+    Texts names, old_names;
+    for (size_t i = 0; i < count; i++) {
+        names.push_back("file" + std::to_string(i) + ".txt");
+        old_names.push_back("old " + names.back());
+    }
+    const auto of_type = [](int type) { return __listed(s_vd, type).size(); };
+    const auto retry_popup = [this](int nth) {
+        return driver::click_row(row(nth)) && press_popup_button(2) && wait_for(is_over);
+    };
+    const struct {
+        const char *name;
+        std::function<void()> script;
+        size_t stored; // files
+    } cases[] = {
+        {"they end before they have rows",
+         [&] {
+             fake_cloud_fail_upload(140, CLOUD_CONTENT_SYNC_ERROR_SERVER);
+             fake_cloud_hold(false);
+             ASSERT_TRUE(wait_for(is_over));
+             EXPECT_LT(rows().size(), 130u);
+             EXPECT_EQ(of_type(ITEM_TYPE_UPLOADED), count - 1);
+             EXPECT_EQ(of_type(ITEM_TYPE_FAILED), 1u);
+             ASSERT_TRUE(wait_for([count] {
+                 elm_genlist_item_show(elm_genlist_last_item_get(s_vd->genlist), ELM_GENLIST_ITEM_SCROLLTO_IN);
+                 return rows().size() == count;
+             })) << rows().size();
+             EXPECT_EQ(rows()[139], "failed file139.txt");
+             EXPECT_TRUE(retry_popup(139));
+             EXPECT_EQ(rows()[139], "uploaded file139.txt");
+         },
+         count},
+        {"all that have rows are taken out",
+         [&] {
+             std::vector<UploadItem *> seen;
+             for (const RunFile &file : the_run()->files)
+                 if (file.item->gen_it)
+                     seen.push_back(file.item.get());
+             __uploads_cancel(s_vd, seen);
+             EXPECT_TRUE(wait_for([] { return rows().size() > 20; })) << rows().size();
+             fake_cloud_hold(false);
+             ASSERT_TRUE(wait_for(is_over));
+             EXPECT_EQ(of_type(ITEM_TYPE_UPLOADED), count - seen.size());
+             EXPECT_EQ(fake_cloud_list("/").size(), 1 + count - seen.size());
+         },
+         0},
+        {"another share is next",
+         [&] {
+             share({"late.txt"});
+             fake_cloud_hold(false);
+             ASSERT_TRUE(wait_for([] { return s_vd->phase == PHASE_BROWSING; }));
+             driver::settle();
+             EXPECT_EQ(of_type(ITEM_TYPE_UPLOADED) + of_type(ITEM_TYPE_UPLOADING), 0u);
+             EXPECT_EQ(rows()[0], "folder Alpha");
+         },
+         count},
+        {"a result is opened, and left", // the list of the run begins anew
+         [&] {
+             show_result(old_names, "fail");
+             EXPECT_EQ(of_type(ITEM_TYPE_FAILED), count);
+             press_back();
+             EXPECT_EQ(of_type(ITEM_TYPE_UPLOADING), count);
+             fake_cloud_hold(false);
+             ASSERT_TRUE(wait_for(is_over));
+         },
+         count},
+        {"nobody is signed in any more",
+         [&] {
+             fake_cloud_revoke_tokens();
+             fake_cloud_hold(false);
+             ASSERT_TRUE(wait_for(is_over));
+             EXPECT_EQ(of_type(ITEM_TYPE_FAILED), count);
+             fake_cloud_sign_in("ann@example.com");
+             EXPECT_TRUE(__retry_signed_out(s_vd));
+             EXPECT_EQ(the_run()->total(), static_cast<int>(count));
+             ASSERT_TRUE(wait_for(is_over));
+             EXPECT_EQ(of_type(ITEM_TYPE_UPLOADED), count);
+         },
+         count},
+    };
+    for (const auto &c : cases) {
+        SCOPED_TRACE(c.name);
+        fake_cloud_reset();
+        fake_cloud_sign_in("ann@example.com");
+        fake_cloud_add_folder("/Alpha");
+        fake_cloud_refresh_now();
+        run([&] {
+            start(names);
+            c.script();
+        });
+        EXPECT_TRUE(c.stored == 0 || fake_cloud_list("/").size() == c.stored + 1) << fake_cloud_list("/").size();
     }
 }
 

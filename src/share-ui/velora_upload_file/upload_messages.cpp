@@ -123,7 +123,7 @@ static void __item_message(UploadViewData *vd, const Message &message)
     else
         __upload_row_progress(file.item.get());
     if (vd->phase == PHASE_UPLOADING) // the line may be about a result that is looked at meanwhile
-        __progress_line_update(vd);
+        __progress_line_update_soon();
 }
 
 static void __run_message(UploadViewData *vd, const Message &message)

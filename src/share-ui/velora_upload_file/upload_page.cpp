@@ -68,9 +68,14 @@ void __more_button_delete(UploadViewData *vd)
 
 void __info_set(UploadViewData *vd, const char *words, double progress)
 {
+    // A queue sets it many times a second, and mostly the words alone change.
+    static const char key[] = "velora.info.shown";
     const bool is_shown = words && *words;
     elm_object_part_text_set(vd->layout, "velora.text.info", is_shown ? words : "");
-    elm_object_signal_emit(vd->layout, is_shown ? "velora,info,show" : "velora,info,hide", "velora");
+    if (is_shown != (evas_object_data_get(vd->layout, key) != nullptr)) {
+        elm_object_signal_emit(vd->layout, is_shown ? "velora,info,show" : "velora,info,hide", "velora");
+        evas_object_data_set(vd->layout, key, is_shown ? key : nullptr);
+    }
     Evas_Object *bar = elm_object_part_content_get(vd->layout, "velora.swallow.progress");
     if (progress < 0) {
         if (bar)

@@ -89,3 +89,20 @@ void __progress_line_update(UploadViewData *vd)
         __show_end(vd);
     }
 }
+
+static Ecore_Timer *s_update;
+static double s_updated; // the last time
+
+void __progress_line_update_soon()
+{
+    const auto update = [](void *) -> Eina_Bool {
+        s_update = nullptr;
+        s_updated = ecore_time_get();
+        if (s_vd)
+            __progress_line_update(s_vd);
+        return ECORE_CALLBACK_CANCEL;
+    };
+    const double due = s_updated + ecore_animator_frametime_get();
+    if (!s_update)
+        s_update = ecore_timer_add(std::max(due - ecore_time_get(), 0.0), update, nullptr);
+}

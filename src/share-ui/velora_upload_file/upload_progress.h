@@ -4,3 +4,5 @@
 
 // Brings the line up to date with the view's phase, its run and what waits.
 void __progress_line_update(UploadViewData *vd);
+// Does so once for all that happens in the time of a frame.
+void __progress_line_update_soon();

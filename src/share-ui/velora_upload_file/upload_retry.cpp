@@ -33,6 +33,8 @@ static Eina_Bool __idler_uploading_cb(void *data)
     auto *vd = static_cast<UploadViewData *>(data);
     if (!vd || vd != s_vd || !vd->run || vd->run->is_joinable)
         VELORA_LOGE("data is NULL");
+    else if (!__run_prepare(vd, 0.01))
+        return ECORE_CALLBACK_RENEW;
     else
         __run_begin(vd);
     return ECORE_CALLBACK_CANCEL;
