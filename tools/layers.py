@@ -14,7 +14,7 @@ import sys
 SHORT_HEADER = 20
 # The files of the upload view without "upload_" and ending, from the bottom up: each knows those of earlier lines alone.
 UPLOAD_VIEW = (
-    "pace",
+    "pace message",
     "notification run text waiting",
     "book wait",
     "record worker",

@@ -16,6 +16,10 @@
 #include <unistd.h>
 
 namespace {
+// With so many requests waiting they are no longer handled as fast as can be, which leaves the bus nothing to run on.
+constexpr size_t flood_size = 50;
+constexpr double flood_pause = 0.005; // seconds
+
 struct Application {
     const app_event_callback_s *callbacks = nullptr;
     void *user_data = nullptr;
@@ -105,7 +109,7 @@ void handle_request(void *)
     // First, for the callback may run a loop of its own.
     app.queue_begun = !app.queue.empty();
     if (app.queue_begun)
-        ecore_timer_add(0.0, handle_next, nullptr);
+        ecore_timer_add(app.queue.size() > flood_size ? flood_pause : 0.0, handle_next, nullptr);
     g_clear_pointer(&app.service_timer, ecore_timer_del);
     follow_language();
     if (app.callbacks->app_control)

@@ -33,22 +33,6 @@ struct Descriptor {
 };
 } // namespace
 
-// A descriptor that stands for the file and opens nothing. *is_link: a link of /proc, which names a file of this
-// process and not one of the person's.
-static int take_hold(const std::string &path, bool *is_link)
-{
-    open_how how = {};
-    how.flags = O_PATH | O_CLOEXEC;
-    how.resolve = RESOLVE_NO_MAGICLINKS;
-    const auto found = static_cast<int>(syscall(SYS_openat2, AT_FDCWD, path.c_str(), &how, sizeof how));
-    if (found >= 0 || errno == ENOENT)
-        return found;
-    const bool was_loop = errno == ELOOP;
-    const int plainly = open(path.c_str(), O_PATH | O_CLOEXEC); // also where the system has no openat2
-    *is_link = plainly >= 0 && was_loop;
-    return plainly;
-}
-
 // What the system makes up has names like files, but nobody's data.
 static bool is_made_up(int fd)
 {
@@ -61,12 +45,45 @@ static bool is_made_up(int fd)
            std::find(std::begin(kinds), std::end(kinds), static_cast<unsigned long>(system.f_type)) != std::end(kinds);
 }
 
-// The path of an open file without links; empty when it has none.
-static std::string whole_path(const std::string &link)
+// What a link names; empty when it is none. Of an open file in /proc it is the path without links.
+static std::string link_target(const std::string &link)
 {
     char path[PATH_MAX];
     const ssize_t size = readlink(link.c_str(), path, sizeof path);
     return size > 0 ? std::string(path, static_cast<size_t>(size)) : "";
+}
+
+// For systems without openat2: whether the path, or a link that it ends in, names something in a folder of /proc.
+static bool leads_into_proc(std::string path)
+{
+    for (int links = 0; links < 40; links++) {
+        const size_t slash = path.rfind('/');
+        const std::string folder = slash == path.npos ? "." : path.substr(0, slash + 1);
+        const Descriptor held(open(folder.c_str(), O_PATH | O_CLOEXEC));
+        if (held.fd >= 0 && is_made_up(held.fd))
+            return true;
+        const std::string target = link_target(path);
+        if (target.empty())
+            return false;
+        path = target.front() == '/' ? target : folder + (slash == path.npos ? "/" : "") + target;
+    }
+    return true;
+}
+
+// A descriptor that stands for the file and opens nothing. *is_link: a link of /proc, which names a file of this
+// process and not one of the person's.
+static int take_hold(const std::string &path, bool *is_link)
+{
+    open_how how = {};
+    how.flags = O_PATH | O_CLOEXEC;
+    how.resolve = RESOLVE_NO_MAGICLINKS;
+    const auto found = static_cast<int>(syscall(SYS_openat2, AT_FDCWD, path.c_str(), &how, sizeof how));
+    if (found >= 0 || errno == ENOENT)
+        return found;
+    const bool was_loop = errno == ELOOP;
+    const int plainly = open(path.c_str(), O_PATH | O_CLOEXEC);
+    *is_link = plainly >= 0 && (was_loop || leads_into_proc(path));
+    return plainly;
 }
 
 // By its place, and where it has another name as well, by what it is.
@@ -76,8 +93,8 @@ static bool is_our_own(const Descriptor &file, const struct stat &about)
     const Descriptor own(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     if (own.fd < 0)
         return false;
-    const std::string place = whole_path(own.proc_path());
-    if (!place.empty() && whole_path(file.proc_path()).compare(0, place.size() + 1, place + "/") == 0)
+    const std::string place = link_target(own.proc_path());
+    if (!place.empty() && link_target(file.proc_path()).compare(0, place.size() + 1, place + "/") == 0)
         return true;
     const std::unique_ptr<DIR, int (*)(DIR *)> entries(opendir(folder.c_str()), closedir);
     while (const dirent *entry = entries ? readdir(entries.get()) : nullptr)

@@ -5,6 +5,7 @@
 #include "velora_upload_file/upload_list.h"
 #include "velora_upload_file/upload_listed.h"
 #include "velora_upload_file/upload_menu.h"
+#include "velora_upload_file/upload_message.h"
 #include "velora_upload_file/upload_notification.h"
 #include "velora_upload_file/upload_open.h"
 #include "velora_upload_file/upload_page.h"
@@ -17,34 +18,6 @@
 #include "velora_upload_file/upload_thumbnails.h"
 #include "velora_upload_file/upload_worker.h"
 #include <algorithm>
-#include <cstdlib>
-
-// A text, taken apart: "update.3.7" is a verb, a number and a run; "end.7" has no number. A text without a run means
-// the one that is under way.
-struct Message {
-    std::string verb;
-    const char *number = nullptr; // the piece behind the verb; null: there is none
-    int run = 0;                  // 0: not said
-};
-
-static bool __is_of_item(const std::string &verb)
-{
-    return verb == "store" || verb == "update";
-}
-
-static Message __take_apart(char **pieces)
-{
-    Message message = {.verb = pieces[0] ? pieces[0] : ""};
-    if (!pieces[0] || !pieces[1])
-        return message;
-    if (!__is_of_item(message.verb)) {
-        message.run = std::atoi(pieces[1]);
-        return message;
-    }
-    message.number = *pieces[1] ? pieces[1] : nullptr;
-    message.run = pieces[2] ? std::atoi(pieces[2]) : 0;
-    return message;
-}
 
 static RunHold __run_close(UploadViewData *vd)
 {
@@ -108,16 +81,15 @@ static void __row_store(UploadViewData *vd, const RunFile &file)
 
 static void __item_message(UploadViewData *vd, const Message &message)
 {
-    if (!message.number) {
+    if (!message.has_number) {
         VELORA_LOGE("split_str is NULL");
         return;
     }
-    const long index = std::strtol(message.number, nullptr, 10);
-    if (index < 0 || index >= vd->run->total()) {
+    if (message.number < 0 || message.number >= vd->run->total()) {
         VELORA_LOGE("upload_item is NULL");
         return;
     }
-    const RunFile &file = vd->run->files[static_cast<size_t>(index)];
+    const RunFile &file = vd->run->files[static_cast<size_t>(message.number)];
     if (message.verb == "store")
         __row_store(vd, file);
     else
@@ -157,13 +129,11 @@ void __pipe_cb(void *, void *buffer, unsigned int size)
         __content_result_handle(vd, result);
         return;
     }
-    char **pieces = g_strsplit(static_cast<const char *>(buffer), ".", -1);
-    const Message message = __take_apart(pieces);
+    const Message message = __message_read(buffer, size);
     if (message.verb == "meta_changed")
         __share_meta_changed(vd);
-    else if (message.verb == "thumb" && pieces[1])
-        __cloud_thumbnail_arrived(vd, static_cast<uint32_t>(std::strtoul(pieces[1], nullptr, 10)));
+    else if (message.verb == "thumb" && message.has_number)
+        __cloud_thumbnail_arrived(vd, static_cast<uint32_t>(message.number));
     else
         __run_message(vd, message);
-    g_strfreev(pieces);
 }

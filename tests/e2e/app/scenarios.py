@@ -36,8 +36,8 @@ def bad_files(person):
     os.mkfifo(fifo)
     unreadable = person.file("secret.txt")
     os.chmod(unreadable, 0)
-    bad = [os.path.join(person.folder, "missing.txt"), os.path.join(person.folder, "two\nlines gone.txt"), fifo, person.folder] + ([unreadable] if os.getuid() else [])
-    person.upload(good[0], *bad, good[1])
+    bad = [os.path.join(person.folder, "missing.txt"), os.path.join(person.folder, "two\nlines gone.txt"), person.folder] + ([unreadable] if os.getuid() else [])
+    person.upload(good[0], fifo, *bad, good[1])
     person.finished(f"{len(bad)} files", "Upload failed")
     person.sees("missing.txt", GONE)
     check(person.texts().count(GONE) == len(bad), f"a reason is missing: {person.texts()!r}")
@@ -45,7 +45,8 @@ def bad_files(person):
     found = person.file("missing.txt")
     person.retry("missing.txt")
     person.finished("missing.txt", "Upload complete")
-    person.leave()
+    reply = person.leave()
+    check(reply == f"reply: SUCCEEDED refused[]={fifo}", f"the sender was told {reply!r}")
     person.has_stored({"good.txt": good[0], "last.txt": good[1], "missing.txt": found})
 
 
