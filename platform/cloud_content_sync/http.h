@@ -39,10 +39,10 @@ struct Transfer {
     // What came of it.
     CURLcode result = CURLE_OK;
     long status = 0;
+    std::string content_length; // as the answer's header has it
     std::string etag;
     std::string repr_digest;
-    std::string content_length; // as the answer's header has it
-    bool was_resent = false;    // libcurl found the connection dead and wanted to send the body a second time
+    bool was_resent = false; // libcurl found the connection dead and wanted to send the body a second time
 
     // Kept by Http.
     Credentials account;
@@ -105,6 +105,7 @@ class Http {
     void knock();
     void knocked();
     bool answer_challenge(Transfer &transfer);
+    bool send_again(CURL *easy, CURLcode result);
     void dispatch();
     void end_stalled();
     void finish(CURL *easy, CURLcode result);

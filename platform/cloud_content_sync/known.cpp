@@ -84,8 +84,10 @@ void Known::remember(const std::string &key, int value)
     }
 }
 
-void Known::forget(const std::string &key)
+void Known::doubt(const std::string &key)
 {
+    if (!find(key) || !doubted.insert(key).second)
+        return;
     found[key].reset();
     if (const Db *to = database())
         Stmt(*to, "DELETE FROM known WHERE storage = ? AND key = ?").bind(1, storage).bind(2, key).done();

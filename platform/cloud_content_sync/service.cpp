@@ -52,8 +52,6 @@ std::optional<Service> service_find(const std::string &name)
     service.ca_file = string_of(file, "Service", "CAFile");
     if (const int seconds = g_key_file_get_integer(file, "Service", "StallTimeout", nullptr); seconds > 0)
         service.stall_seconds = seconds;
-    service.looks_first = g_key_file_get_boolean(file, "Service", "LookFirst", nullptr) != FALSE;
-    service.reads_back = g_key_file_get_boolean(file, "Service", "ReadBack", nullptr) != FALSE;
     service.api = string_of(file, "Service", "Api");
     if (!is_http(service.storage) || (!service.api.empty() && !is_http(service.api)))
         return {};
@@ -73,6 +71,8 @@ std::optional<Service> service_find(const std::string &name)
     if (!root)
         return {};
     service.root_path = *root;
+    service.looks_first = g_key_file_get_boolean(file, "Service", "LookFirst", nullptr) != FALSE;
+    service.reads_back = g_key_file_get_boolean(file, "Service", "ReadBack", nullptr) != FALSE;
     service.storage.resize(service.storage.find_last_not_of('/') + 1);
     return service;
 }
