@@ -65,7 +65,8 @@ class Known {
         std::string account;
         long long made = 0; // seconds since 1970
     };
-    std::map<std::string, Temporary> left; // by path; of this process, where the database fails
+    std::map<std::string, Temporary> left; // by path; also where the database fails
+    std::string looked_for;                // the account whose rows in the database are in `left` as well
     unsigned samples = 0;
 };
 
