@@ -168,7 +168,7 @@ int cloud_content_sync_name_get_next(const char *name, char **next);
 // empty, "." or
 // ".." segment), FORBIDDEN (also when the folder does not exist), STORAGE_FULL, CORRUPTED, UNAUTHORIZED, SERVER,
 // NETWORK (also when nothing moves for a minute, or no answer comes for five minutes after the last byte), and
-// LOCAL_CHANGED: what was stored of the changed file is then removed.
+// LOCAL_CHANGED: what was stored of the changed file is then removed. UNSAFE: README.md, "Nothing is replaced".
 int cloud_content_sync_upload(cloud_content_sync_h handle, const char *local_path, const char *server_path, int *req_id,
                               cloud_content_sync_transfer_cb cb, void *user_data);
 // What the upload that runs waits for before it is tried again, and in how many seconds that is at the latest. It

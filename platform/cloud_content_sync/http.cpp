@@ -203,7 +203,7 @@ void Http::knocked()
     }
 }
 
-// Whether a refused request was sent again, with an answer to the service's challenge.
+// Whether a refused request can be sent again, with an answer to the service's challenge.
 bool Http::answer_challenge(Transfer &transfer)
 {
     if (transfer.result != CURLE_OK || transfer.status != 401 || !may_be_digest(transfer) ||
@@ -215,6 +215,29 @@ bool Http::answer_challenge(Transfer &transfer)
     challenge = std::move(next);
     known.remember(AUTH, 1);
     return !transfer.read || (transfer.rewind && transfer.rewind());
+}
+
+bool Http::send_again(CURL *easy, CURLcode result)
+{
+    const auto found = transfers.find(easy);
+    if (found == transfers.end())
+        return false;
+    Transfer &transfer = *found->second;
+    transfer.result = result;
+    curl_easy_getinfo(easy, CURLINFO_RESPONSE_CODE, &transfer.status);
+    if (!answer_challenge(transfer))
+        return false;
+    std::unique_ptr<Transfer> owned = std::move(found->second);
+    transfers.erase(found);
+    curl_multi_remove_handle(multi.get(), easy);
+    transfer.header_list.reset();
+    transfer.easy.reset(curl_easy_init());
+    if (!transfer.easy)
+        std::abort();
+    transfer.last_activity = std::chrono::steady_clock::now();
+    transfers[transfer.easy.get()] = std::move(owned);
+    launch(transfer);
+    return true;
 }
 
 void Http::launch(Transfer &transfer)
@@ -268,25 +291,14 @@ void Http::finish(CURL *easy, CURLcode result)
     const auto found = transfers.find(easy);
     if (found == transfers.end())
         return;
-    std::unique_ptr<Transfer> transfer = std::move(found->second);
+    const std::unique_ptr<Transfer> transfer = std::move(found->second);
     transfers.erase(found);
-    std::erase(behind_knock, transfer.get());
     curl_multi_remove_handle(multi.get(), easy);
     transfer->result = result;
     curl_easy_getinfo(easy, CURLINFO_RESPONSE_CODE, &transfer->status);
     curl_off_t seconds = 0;
     if (curl_easy_getinfo(easy, CURLINFO_RETRY_AFTER, &seconds) == CURLE_OK)
         transfer->retry_after = seconds;
-    if (answer_challenge(*transfer)) {
-        transfer->easy.reset(curl_easy_init());
-        if (!transfer->easy)
-            std::abort();
-        transfer->header_list.reset();
-        transfer->last_activity = std::chrono::steady_clock::now();
-        Transfer &again = *transfer;
-        transfers[again.easy.get()] = std::move(transfer);
-        return launch(again);
-    }
     transfer->done(*transfer);
 }
 
@@ -294,7 +306,7 @@ void Http::dispatch()
 {
     int left = 0;
     while (const CURLMsg *message = curl_multi_info_read(multi.get(), &left))
-        if (message->msg == CURLMSG_DONE)
+        if (message->msg == CURLMSG_DONE && !send_again(message->easy_handle, message->data.result))
             finish(message->easy_handle, message->data.result);
 }
 

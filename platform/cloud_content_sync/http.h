@@ -39,11 +39,11 @@ struct Transfer {
     // What came of it.
     CURLcode result = CURLE_OK;
     long status = 0;
+    std::string content_length; // as the answer's header has it
     std::string etag;
     std::string repr_digest;
-    long long retry_after = 0;  // seconds, by the service's Retry-After; 0: it gave none
-    std::string content_length; // as the answer's header has it
-    bool was_resent = false;    // libcurl found the connection dead and wanted to send the body a second time
+    long long retry_after = 0; // seconds, by the service's Retry-After; 0: it gave none
+    bool was_resent = false;   // libcurl found the connection dead and wanted to send the body a second time
 
     // Kept by Http.
     Credentials account;
@@ -111,6 +111,7 @@ class Http {
     void knock();
     void knocked();
     bool answer_challenge(Transfer &transfer);
+    bool send_again(CURL *easy, CURLcode result);
     void dispatch();
     void end_stalled();
     void finish(CURL *easy, CURLcode result);

@@ -8,6 +8,7 @@
 #include <openssl/rand.h>
 #include <set>
 #include <unistd.h>
+#include <utility>
 
 namespace cloud {
 
@@ -84,8 +85,10 @@ void Known::remember(const std::string &key, int value)
     }
 }
 
-void Known::forget(const std::string &key)
+void Known::doubt(const std::string &key)
 {
+    if (!find(key) || !doubted.insert(key).second)
+        return;
     found[key].reset();
     if (const Db *to = database())
         Stmt(*to, "DELETE FROM known WHERE storage = ? AND key = ?").bind(1, storage).bind(2, key).done();
@@ -124,7 +127,9 @@ void Known::drop_temporary_if_old(const std::string &path)
 {
     leave_temporary(path);
     const long long old = time(nullptr) - AT_WORK_SECONDS;
-    if (const auto found_left = left.find(path); found_left != left.end() && found_left->second.made < old)
+    if (const auto found_left = left.find(path);
+        found_left != left.end() &&
+        (found_left->second.made < old || found_left->second.made > old + 2 * AT_WORK_SECONDS))
         left.erase(found_left);
     if (const Db *to = database()) {
         Stmt stmt(*to, "DELETE FROM temporary WHERE storage = ? AND path = ? AND made NOT BETWEEN ? AND ? + ?");
@@ -141,11 +146,9 @@ void Known::leave_temporary(const std::string &path)
 std::vector<std::string> Known::left_behind(const std::string &who)
 {
     std::set<std::string> paths;
-    for (const auto &[path, one] : left)
-        if (one.account == who)
-            paths.insert(path);
-    if (const Db *from = database()) {
-        Stmt stmt(*from, "SELECT path, account, pid, boot FROM temporary WHERE storage = ?");
+    // Others' leavings are looked for once; what this one leaves is in `left`.
+    if (const Db *from = std::exchange(looked_for, who) == who ? nullptr : database()) {
+        Stmt stmt(*from, "SELECT path, account, pid, boot, made FROM temporary WHERE storage = ?");
         stmt.bind(1, storage);
         bool has_others = false;
         while (stmt.row()) {
@@ -153,7 +156,7 @@ std::vector<std::string> Known::left_behind(const std::string &who)
             const bool is_alive = stmt.text(3) == platform_boot_id() && (kill(pid, 0) == 0 || errno == EPERM);
             has_others |= stmt.text(1) != who;
             if (stmt.text(1) == who && (!is_alive || pid == getpid()))
-                paths.insert(stmt.text(0));
+                left.emplace(stmt.text(0), Temporary{who, stmt.integer(4)});
         }
         stmt.reset();
         if (has_others) // nobody is left who could delete what another account has there
@@ -162,6 +165,9 @@ std::vector<std::string> Known::left_behind(const std::string &who)
                 .bind(2, who)
                 .done();
     }
+    for (const auto &[path, one] : left)
+        if (one.account == who)
+            paths.insert(path);
     std::scoped_lock lock(s_mutex);
     std::erase_if(paths, [this](const std::string &path) { return s_at_work.count(storage + path) > 0; });
     return {paths.begin(), paths.end()};

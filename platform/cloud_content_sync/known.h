@@ -5,6 +5,7 @@
 #include "cloud_content_sync/service.h"
 #include <map>
 #include <optional>
+#include <set>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -33,7 +34,8 @@ class Known {
     // found out is believed for 30 days.
     std::optional<int> find(const std::string &key);
     void remember(const std::string &key, int value);
-    void forget(const std::string &key);
+    // Forgets it, once, when the service does not do what was found out.
+    void doubt(const std::string &key);
 
     // Notes the server path before something is stored there, and that nothing is there any more. `who` is the account.
     void add_temporary(const std::string &who, const std::string &path);
@@ -58,11 +60,13 @@ class Known {
     Db db;
     bool was_opened = false;
     std::map<std::string, std::optional<int>> found;
+    std::set<std::string> doubted;
     struct Temporary {
         std::string account;
         long long made = 0; // seconds since 1970
     };
-    std::map<std::string, Temporary> left; // by path; of this process, where the database fails
+    std::map<std::string, Temporary> left; // by path; also where the database fails
+    std::string looked_for;                // the account whose rows in the database are in `left` as well
     unsigned samples = 0;
 };
 

@@ -56,8 +56,6 @@ std::optional<Service> service_find(const std::string &name)
     if (const int seconds = g_key_file_get_integer(file, "Service", "WaitLimit", nullptr);
         seconds > 0 || g_key_file_has_key(file, "Service", "WaitLimit", nullptr))
         service.wait_seconds = std::max(seconds, 0);
-    service.looks_first = g_key_file_get_boolean(file, "Service", "LookFirst", nullptr) != FALSE;
-    service.reads_back = g_key_file_get_boolean(file, "Service", "ReadBack", nullptr) != FALSE;
     service.api = string_of(file, "Service", "Api");
     if (!is_http(service.storage) || (!service.api.empty() && !is_http(service.api)))
         return {};
@@ -77,6 +75,8 @@ std::optional<Service> service_find(const std::string &name)
     if (!root)
         return {};
     service.root_path = *root;
+    service.looks_first = g_key_file_get_boolean(file, "Service", "LookFirst", nullptr) != FALSE;
+    service.reads_back = g_key_file_get_boolean(file, "Service", "ReadBack", nullptr) != FALSE;
     service.storage.resize(service.storage.find_last_not_of('/') + 1);
     return service;
 }

@@ -370,7 +370,7 @@ void Upload::stored(const Transfer &transfer)
     // 201: made by this request; 200 and 204 would mean that something was there and the condition was ignored.
     created = transfer.status == 201;
     if (!created && temporary.empty())
-        client.http.known.forget("way");
+        client.http.known.doubt("way");
     stored_etag = transfer.etag;
     if (!client.is_wanted(wanted.id))
         return created ? remove_stored(0) : finish(0);
@@ -448,10 +448,9 @@ void Upload::looked(const Transfer &transfer, MultistatusReader &reader)
     const bool may_be_same = !entry.is_folder && whole_file_read() && (entry.size < 0 || entry.size == local.st_size);
     if (!look_by_digest || !may_be_same)
         return finish_look({.found = Found::DIFFERENT});
-    if (entry.sha256.empty()) {
-        client.http.known.remember("digest", 0);
+    note_digest(!entry.sha256.empty());
+    if (entry.sha256.empty())
         return read_back();
-    }
     finish_look({.found = entry.sha256 == digest ? Found::SAME : Found::DIFFERENT});
 }
 

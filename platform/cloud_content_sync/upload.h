@@ -85,6 +85,7 @@ class Upload {
     void folder_looked_at(const Look &look);
     // Compares what is stored with what was sent, as thoroughly as the service and its description ask for.
     void check_stored();
+    void note_digest(bool is_there);
     void head_ended(const Transfer &transfer);
     void next_name_looked_at(const Look &look);
     // Compares what is stored under `path` (empty: where()) with what was sent; by_digest false: only whether something

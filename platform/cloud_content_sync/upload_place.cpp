@@ -234,6 +234,15 @@ void Upload::check_stored()
     request(std::move(transfer), &Upload::head_ended);
 }
 
+void Upload::note_digest(bool is_there)
+{
+    Known &known = client.http.known;
+    if (is_there)
+        known.doubt("digest");
+    else if (!known.find("digest"))
+        known.remember("digest", 0);
+}
+
 void Upload::head_ended(const Transfer &transfer)
 {
     const bool is_etag_same = stored_etag.empty() || transfer.etag.empty() || stored_etag == transfer.etag;
