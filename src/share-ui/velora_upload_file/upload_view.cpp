@@ -83,6 +83,7 @@ static void __abandon_view(void *data)
     }
     s_view_pipe = nullptr;
     __listed_forget();
+    __progress_noti_flush(); // the process ends, and what it said last may stay
     vd->client = nullptr;
     vd->run = nullptr;
 }
