@@ -245,6 +245,7 @@ std::string Account::complete_for()
 // Within change().
 bool Account::clear()
 {
+    writer.run("DELETE FROM temporary"); // a table that may not be there yet; they name folders
     return writer.run("DELETE FROM folder; DELETE FROM content; DELETE FROM upload; DELETE FROM setting "
                       "WHERE key = 'complete_for'");
 }

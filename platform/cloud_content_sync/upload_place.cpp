@@ -219,6 +219,7 @@ bool Upload::is_folder_in_doubt(long status, int error)
 void Upload::folder_looked_at(const Look &result)
 {
     const bool is_absent = !result.error && result.found == Found::ABSENT;
+    is_unknown &= !is_absent; // nothing can be stored there
     finish(is_absent ? CLOUD_CONTENT_SYNC_ERROR_FORBIDDEN : folder_error);
 }
 
