@@ -60,7 +60,8 @@ void fake_cloud_reset()
     const Credentials credentials = {"someone@example.org", "secret", "someone@example.org"};
     for (const std::string name : {"Velora", "Test"}) {
         std::ofstream(descriptions + "/" + name + ".conf")
-            << "[Service]\nStorage=http://127.0.0.1:1/\nApi=http://127.0.0.1:1\nWeb=https://velora.example.org\nWaitLimit=0\n";
+            << "[Service]\nStorage=http://127.0.0.1:1/\nApi=http://127.0.0.1:1\nWeb=https://"
+               "velora.example.org\nWaitLimit=0\n";
         credentials_store(name, &credentials);
     }
 }
