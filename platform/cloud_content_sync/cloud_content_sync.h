@@ -27,20 +27,21 @@ enum cloud_content_sync_error_e {
     CLOUD_CONTENT_SYNC_ERROR_INVALID_PARAMETER = 1, // a required argument is null or malformed
     CLOUD_CONTENT_SYNC_ERROR_NO_SERVICE = 2,        // no description of a service of that name
     CLOUD_CONTENT_SYNC_ERROR_DB_FAILED = 3,
-    CLOUD_CONTENT_SYNC_ERROR_NOT_FOUND = 4,      // no such folder, content or request
-    CLOUD_CONTENT_SYNC_ERROR_NO_ACCOUNT = 5,     // nobody is signed in
-    CLOUD_CONTENT_SYNC_ERROR_NETWORK = 20,       // the service cannot be reached
-    CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED = 21,  // the service refuses the credentials (401)
-    CLOUD_CONTENT_SYNC_ERROR_SERVER = 22,        // the service answered with another error
-    CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE = 23,    // the local file is missing, unreadable or a folder
-    CLOUD_CONTENT_SYNC_ERROR_CORRUPTED = 24,     // what is stored is not what was sent
-    CLOUD_CONTENT_SYNC_ERROR_FORBIDDEN = 25,     // the service refuses the operation (403, 409, 423)
-    CLOUD_CONTENT_SYNC_ERROR_STORAGE_FULL = 26,  // the account's storage is full (507)
-    CLOUD_CONTENT_SYNC_ERROR_BAD_NAME = 27,      // the service cannot store a file of this name
-    CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED = 28, // the local file changed while it was sent
-    CLOUD_CONTENT_SYNC_ERROR_CERTIFICATE = 29,   // the service's certificate is not to be trusted; of a sign-in alone
-    CLOUD_CONTENT_SYNC_ERROR_LOCAL_PRIVATE = 32, // the local file is not one that somebody can have meant to upload
-    CLOUD_CONTENT_SYNC_ERROR_UNSAFE = 31,        // the service would replace other files, nothing is uploaded to it
+    CLOUD_CONTENT_SYNC_ERROR_NOT_FOUND = 4,        // no such folder, content or request
+    CLOUD_CONTENT_SYNC_ERROR_NO_ACCOUNT = 5,       // nobody is signed in
+    CLOUD_CONTENT_SYNC_ERROR_NETWORK = 20,         // the service cannot be reached
+    CLOUD_CONTENT_SYNC_ERROR_UNAUTHORIZED = 21,    // the service refuses the credentials (401)
+    CLOUD_CONTENT_SYNC_ERROR_SERVER = 22,          // the service answered with another error
+    CLOUD_CONTENT_SYNC_ERROR_LOCAL_FILE = 23,      // the local file is missing, unreadable or a folder
+    CLOUD_CONTENT_SYNC_ERROR_CORRUPTED = 24,       // what is stored is not what was sent
+    CLOUD_CONTENT_SYNC_ERROR_FORBIDDEN = 25,       // the service refuses the operation (403, 409, 423)
+    CLOUD_CONTENT_SYNC_ERROR_STORAGE_FULL = 26,    // the account's storage is full (507)
+    CLOUD_CONTENT_SYNC_ERROR_BAD_NAME = 27,        // the service cannot store a file of this name
+    CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED = 28,   // the local file changed while it was sent
+    CLOUD_CONTENT_SYNC_ERROR_CERTIFICATE = 29,     // the service's certificate is not to be trusted; of a sign-in alone
+    CLOUD_CONTENT_SYNC_ERROR_LOCAL_PRIVATE = 32,   // the local file is not one that somebody can have meant to upload
+    CLOUD_CONTENT_SYNC_ERROR_OUTCOME_UNKNOWN = 30, // it may be stored; another upload of the same paths looks first
+    CLOUD_CONTENT_SYNC_ERROR_UNSAFE = 31,          // the service would replace other files, nothing is uploaded to it
 };
 // States of a transfer and of a refresh. Callbacks bring RUNNING, DONE and FAILED; what is queued is silent.
 enum cloud_content_sync_state_e {

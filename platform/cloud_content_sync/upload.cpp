@@ -11,7 +11,7 @@ namespace cloud {
 
 static constexpr int NAMES_MAX = 1000;
 static constexpr int PUTS_MAX = 20; // each sends the whole body
-static constexpr int LOOKS_MAX = 2;
+static constexpr int LOOKS_MAX = 2, BREAKS_MAX = 3;
 // After the last byte the service may need time to store a large file.
 static constexpr auto ANSWER_LIMIT = std::chrono::seconds(300);
 // A cancelled upload waits this long for the answer that says whether there is something to remove.
@@ -82,7 +82,7 @@ void Upload::resumed(const Look &result)
         return trouble(result.error, result.retry_after);
     if (result.found == Found::SAME)
         return verified(result);
-    is_unknown = result.found == Found::ABSENT; // it may still be on its way
+    is_unknown = is_seen_absent = result.found == Found::ABSENT; // it may still be on its way
     target = wanted.server_path;
     put();
 }
@@ -279,6 +279,7 @@ void Upload::put_ended(const Transfer &transfer)
         return trouble(transfer.error(), transfer.asks_to_wait());
     if (transfer.leaves_open() && whole_file_read()) {
         is_unknown = true;
+        is_seen_absent = false;
         put_error = transfer.error();
         return look(true, &Upload::refused);
     }
@@ -304,11 +305,12 @@ void Upload::put_unanswered(const Transfer &transfer)
     if (transfer.never_sent() || stalled_midway)
         return trouble(transfer.error());
     is_unknown = true;
+    is_seen_absent = !whole_file_read(); // hardly
     put_error = transfer.error();
-    if (!whole_file_read()) // it cannot be told whether it is there, and hardly is
-        return trouble(put_error);
-    look(true, lost_reply ? &Upload::refused : &Upload::settled);
-    lost_reply = true;
+    // A connection that ends in the middle of a body says less than one that ends behind it.
+    const bool is_last = whole_file_read() ? lost_reply : ++breaks >= BREAKS_MAX;
+    lost_reply |= whole_file_read();
+    look(true, is_last ? &Upload::refused : &Upload::settled);
 }
 
 // After an attempt without an answer: is it there?
@@ -318,9 +320,9 @@ void Upload::settled(const Look &result)
         return trouble(result.error, result.retry_after);
     if (result.found == Found::SAME)
         return verified(result);
-    if (result.found == Found::ABSENT)
+    is_unknown = is_seen_absent = result.found == Found::ABSENT;
+    if (is_seen_absent)
         return put();
-    is_unknown = false;
     if (!renew_temporary())
         try_next_name();
 }
@@ -332,7 +334,7 @@ void Upload::refused(const Look &result)
         return trouble(result.error, result.retry_after);
     if (result.found == Found::SAME)
         return verified(result);
-    is_unknown = result.found == Found::ABSENT;
+    is_unknown = is_seen_absent = result.found == Found::ABSENT;
     if (!is_unknown || !is_folder_in_doubt(put_status, put_error))
         trouble(put_error);
 }
@@ -388,6 +390,7 @@ void Upload::verified(const Look &result)
 {
     if (result.error) { // it is stored, and nobody has seen how
         is_unknown = true;
+        is_seen_absent = false;
         return trouble(result.error, result.retry_after);
     }
     // What differs may be another client's by now, so it stays.
@@ -514,7 +517,9 @@ void Upload::finish(int error)
     else if (error != 0 || !client.is_kept(wanted.id))
         client.ledger.close(who, record);
     // After a cancel nobody is there to be told.
-    client.report_failed(wanted, error);
+    const bool may_be_open = error == CLOUD_CONTENT_SYNC_ERROR_NETWORK || error == CLOUD_CONTENT_SYNC_ERROR_SERVER;
+    const bool is_open = may_be_open && is_unknown && !is_seen_absent;
+    client.report_failed(wanted, is_open ? CLOUD_CONTENT_SYNC_ERROR_OUTCOME_UNKNOWN : error);
 }
 
 } // namespace cloud

@@ -114,18 +114,20 @@ class Upload {
     int percent = -1;               // last one reported
     int read_error = 0;
     int puts = 0;
-    bool lost_reply = false; // an attempt for `target` ended without an answer
-    bool is_unknown = false; // an attempt may have stored the file under `target`, and nobody has seen it there
-    long put_status = 0;     // HTTP's, or 0
-    int put_error = 0;       // of the attempt that is being looked after
-    LedgerRow record;        // in the book of uploads
-    std::string who;         // whose upload it is
-    Wait wait;               // for better times, before the next attempt
-    bool is_hashing = false; // of what an earlier attempt has sent
-    bool created = false;    // this request made what is stored under `target`
+    bool lost_reply = false;     // an attempt for `target` ended without an answer
+    bool is_unknown = false;     // an attempt may have stored the file under `target`, and nobody has seen it there
+    bool is_seen_absent = false; // it was not there after the last attempt, but may still come
+    long put_status = 0;         // HTTP's, or 0
+    int put_error = 0;           // of the attempt that is being looked after
+    LedgerRow record;            // in the book of uploads
+    std::string who;             // whose upload it is
+    Wait wait;                   // for better times, before the next attempt
+    bool is_hashing = false;     // of what an earlier attempt has sent
+    bool created = false;        // this request made what is stored under `target`
     std::string stored_etag;
     int names_tried = 0;
     int look_attempts = 0;
+    int breaks = 0; // of connections in the middle of a body
     std::string look_path;
     bool look_by_digest = false;
     LookDone look_done = nullptr;

@@ -104,6 +104,8 @@ class Faults:
             of_path, of_method = self.paths[method, path], self.counts[method]
             self.tally["requests"] += 1
         luck = random.Random(hashlib.sha256(f"{self.seed} {method} {path} {of_path}".encode()).digest())
+        if "/.velora-" in path:  # the client finds out how to store without replacing; what it stores so is no file of anybody
+            return None, luck
         for rule in self.rules:
             if rule.applies(method, of_path, of_method):
                 return rule.fault, luck

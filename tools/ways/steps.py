@@ -16,6 +16,7 @@ reported = []
 
 def report(holds, name, told=None):
     reported.append(holds)
+    told = " ".join(str(told).split()) if told else None  # a line is a step
     print(f"{'ok' if holds else 'not ok'} {name}" + (f" ({told})" if told else ""), flush=True)
 
 

@@ -74,6 +74,8 @@ const char *__failure_text(int error)
         return __text("IDS_VELORA_BODY_REFUSED");
     case CLOUD_CONTENT_SYNC_ERROR_BAD_NAME:
         return __text("IDS_VELORA_BODY_BAD_NAME");
+    case CLOUD_CONTENT_SYNC_ERROR_OUTCOME_UNKNOWN:
+        return __text("IDS_VELORA_BODY_MAYBE_UPLOADED");
     case CLOUD_CONTENT_SYNC_ERROR_STORAGE_FULL:
         return __text("IDS_VELORA_BODY_STORAGE_FULL");
     case CLOUD_CONTENT_SYNC_ERROR_UNSAFE:

@@ -105,6 +105,7 @@ def main():
     try:
         device.start_service()
         device.sign_in()
+        device.setting("memory/connection/type", "wifi")  # a machine without a network would wait for one
         web = device.web
         print(f"{'':18}{'injected':>9}{'failed':>7}{'lost':>6}{'doubled':>8}{'false':>6}{'s':>5}", flush=True)
         for name in names:
