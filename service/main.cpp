@@ -152,12 +152,13 @@ static int run(Service &service, const Fd &root_folder, const Options &options)
             server.log = [](const std::string &line) { std::fprintf(stderr, "%s\n", line.c_str()); };
         if (const int code = start_listening(options, server))
             return code;
-        std::printf("listening on %s\n", server.address().c_str());
-        std::fflush(stdout);
         Running running{service, server};
         const guint signals[] = {g_unix_signal_add(SIGTERM, Running::begin_end, &running),
                                  g_unix_signal_add(SIGINT, Running::begin_end, &running),
                                  g_unix_signal_add(SIGUSR1, Running::hurry, &running)};
+        // Whoever reads this may end the service at once.
+        std::printf("listening on %s\n", server.address().c_str());
+        std::fflush(stdout);
         sd_notify(0, "READY=1");
         g_main_loop_run(running.loop);
         for (const guint source : signals)

@@ -4,8 +4,8 @@
 #include <cstdlib>
 #include <glib.h>
 #include <map>
-#include <openssl/rand.h>
 #include <string_view>
+#include <unistd.h>
 
 namespace cloud {
 
@@ -140,7 +140,7 @@ std::string digest_authorization(DigestChallenge &challenge, const Credentials &
         return std::string(hex);
     };
     unsigned char random[16];
-    if (RAND_bytes(random, sizeof random) != 1)
+    if (getentropy(random, sizeof random) != 0)
         std::abort();
     char count[9];
     std::snprintf(count, sizeof count, "%08x", ++challenge.count);

@@ -5,7 +5,6 @@
 #include <csignal>
 #include <ctime>
 #include <mutex>
-#include <openssl/rand.h>
 #include <set>
 #include <unistd.h>
 #include <utility>
@@ -32,7 +31,7 @@ std::string temporary_name(bool is_hidden)
 {
     static constexpr char HEX[] = "0123456789abcdef";
     unsigned char bytes[DIGITS / 2];
-    if (RAND_bytes(bytes, sizeof bytes) != 1)
+    if (getentropy(bytes, sizeof bytes) != 0)
         std::abort();
     std::string name = is_hidden ? "." : "";
     name += PREFIX;
