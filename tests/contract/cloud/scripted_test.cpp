@@ -190,6 +190,7 @@ TEST_F(Scripted, an_upload_and_its_answers)
         {"reads back wrong", {created, found("5", ""), answer("200 OK", "jello")}, BAD, "ULG"},
         {"vanished", {created, none}, BAD, "UL"},
         {"lost, stored", {"", found("5", HELLO_HEX)}, 0, "UL"},
+        {"rubbish, stored", {"rubbish\n\x01", found("5", HELLO_HEX)}, 0, "UL"},
         {"lost, nothing there", {"", none, stored}, 0, "ULU"},
         {"lost twice, stored", {"", none, "", found("5", HELLO_HEX)}, 0, "ULUL"},
         {"lost twice", {"", none, "", none}, NETWORK, "ULUL", "/x.txt", {none, stored}, "LU"},
