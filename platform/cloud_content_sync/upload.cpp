@@ -275,8 +275,11 @@ void Upload::put_ended(const Transfer &transfer)
         return finish(read_error);
     if (transfer.result != CURLE_OK)
         return put_unanswered(transfer);
-    if (transfer.asks_to_wait() >= 0)
+    if (transfer.asks_to_wait() >= 0) {
+        is_unknown |= whole_file_read(); // it should not be there; a look is cheap
+        is_seen_absent = true;
         return trouble(transfer.error(), transfer.asks_to_wait());
+    }
     if (transfer.leaves_open() && whole_file_read()) {
         is_unknown = true;
         is_seen_absent = false;
