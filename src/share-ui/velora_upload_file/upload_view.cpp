@@ -197,7 +197,8 @@ static void __give_way(AppData *ad)
 
 static void __later_job(void *data)
 {
-    if (data == s_vd)
+    // What was shared while the question stood has the view now.
+    if (data == s_vd && s_vd->phase == PHASE_ENDED && !__has_files(s_vd))
         _velora_pages_go_on(s_vd->ad, s_vd, __give_way);
 }
 
