@@ -87,7 +87,7 @@ def trouble(tour):
         person.sees("Waiting for a network") if not told else None
         begun = time.monotonic()
         person.setting("memory/connection/type", "wifi")
-        wait_for("an upload", lambda: os.listdir(os.path.join(person.data, "tmp")) or
+        wait_for("an upload", lambda: person.halves() or
                  not person.find("Waiting for a network"), 5, 0.02)
         return f"it goes on after {time.monotonic() - begun:.2f} s"
 

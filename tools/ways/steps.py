@@ -123,7 +123,6 @@ def stays(what, condition, seconds=1.5):
 
 def stored(person, files):
     """These files and nothing else, once the service has let go of what was cancelled."""
-    tmp = os.path.join(person.data, "tmp")
     person.hurry()  # with what was on its way at the cancel
-    wait_for("the service to let go of half a file", lambda: not os.listdir(tmp))
+    wait_for("the service to let go of half a file", lambda: not person.halves())
     person.has_stored(files)

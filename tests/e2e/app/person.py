@@ -144,6 +144,21 @@ class Person(Device):
         except Trouble:
             raise Failure("the run is over, but its ongoing notification stays") from None
 
+    def halves(self):
+        """The files that the service is receiving: their sizes in bytes."""
+        with os.scandir(os.path.join(self.data, "tmp")) as files:
+            sizes = []
+            for file in files:
+                try:
+                    sizes.append(file.stat().st_size)
+                except FileNotFoundError:
+                    pass
+            return sizes
+
+    def on_its_way(self):
+        """Waits until the service has some of a large file: what comes first is the client's question how it keeps files."""
+        wait_for("bytes on their way", lambda: any(size >= 1 << 16 for size in self.halves()))
+
     # what must hold
 
     def ends(self, status=0):
@@ -172,6 +187,9 @@ class Person(Device):
 
     def has_stored(self, expected):
         """The service has these files and nothing else: {cloud path: local path or content}."""
+        def is_temporary(path):
+            return os.path.basename(path).startswith(".velora-")
+        wait_for("the client to clear away", lambda: not any(is_temporary(path) for path in self.all_files()), 10)
         there = {os.fsencode(path) for path in self.all_files()}
         wanted = {os.fsencode(os.path.join(FOLDER, os.fsdecode(name))): source for name, source in expected.items()}
         check(there == set(wanted), f"stored are {sorted(there)!r}, not {sorted(wanted)!r}")
@@ -181,8 +199,8 @@ class Person(Device):
                     source = file.read()
             with self.get(os.fsdecode(path)) as stored:
                 check(digest(stored.read()) == digest(source), f"{path!r} is not what was sent")
-        half = os.listdir(os.path.join(self.data, "tmp"))
-        check(not half, f"half a file is left in the service: {half!r}")
+        half = self.halves()
+        check(not half, f"half a file is left in the service: {half!r} bytes")
 
     def holds(self):
         """Nothing crashed or complained, and no notification claims that something is still under way."""
