@@ -277,6 +277,37 @@ TEST_F(Owners, AQuestionGoesWithWhatItIsAbout)
     });
 }
 
+TEST_F(Owners, TheQuestionAboutWhatWasLeftTakesNothingFromAShare)
+{
+    for (const int button : {2, 1}) { // the first one is not asked again in this process
+        SCOPED_TRACE(button == 1 ? "Later" : "Upload");
+        fake_cloud_reset();
+        fake_cloud_refresh_now();
+        const std::string left = locals({"left.txt"})[0];
+        const char *const path = left.c_str(), *const destination = "/left.txt";
+        cloud_content_sync_h client = nullptr;
+        ASSERT_EQ(cloud_content_sync_create("Velora", &client), 0);
+        EXPECT_EQ(cloud_content_sync_queue_add(client, &path, &destination, 1), 0);
+        cloud_content_sync_destroy(client);
+        fake_app::clear();
+        run([&] {
+            request({.sender = "icon"});
+            ASSERT_TRUE(wait_for([] { return s_vd && popup_is("left"); }));
+            share_from("late", {"late.txt"});
+            ASSERT_TRUE(popup_is("left"));
+            ASSERT_TRUE(press_popup_button(button));
+            if (button == 2) {
+                ASSERT_TRUE(wait_for([] { return uploaded("/left.txt") == "left.txt"; }));
+            }
+            ASSERT_TRUE(wait_for(is_browsing));
+            ASSERT_TRUE(press_done());
+            ASSERT_TRUE(wait_for([] { return is_over() && uploaded("/late.txt") != "(missing)"; }));
+            EXPECT_EQ(uploaded("/late.txt"), "late.txt");
+        });
+        EXPECT_EQ(answers(), (Texts{"icon canceled", "late succeeded"}));
+    }
+}
+
 TEST_F(Owners, APopupKeepsTheBackKeyAndDismissesItselfAlone)
 {
     run([&] {

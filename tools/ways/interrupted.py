@@ -106,9 +106,10 @@ def two_hundred(tour):
 
     def kills():
         person.upload(*files.values())
+        wait_for("the files in the book", lambda: entries(person))
         done = 0
         while done < 200:
-            time.sleep(random.uniform(0, 0.35))
+            time.sleep(random.uniform(0, 0.08))
             kill(person)
             done += 1
             if not entries(person):
@@ -125,4 +126,4 @@ def two_hundred(tour):
 
 
 WAYS = {"interrupted": (killed, {"service": ("--delay", "400")}), "interrupted-trouble": (trouble, {"service": SLOW}),
-        "interrupted-200": (two_hundred, {"service": ("--delay", "20")})}
+        "interrupted-200": (two_hundred, {})}

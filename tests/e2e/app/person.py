@@ -192,7 +192,8 @@ class Person(Device):
         wait_for("the client to clear away", lambda: not any(is_temporary(path) for path in self.all_files()), 10)
         there = {os.fsencode(path) for path in self.all_files()}
         wanted = {os.fsencode(os.path.join(FOLDER, os.fsdecode(name))): source for name, source in expected.items()}
-        check(there == set(wanted), f"stored are {sorted(there)!r}, not {sorted(wanted)!r}")
+        more, less = sorted(there - set(wanted)), sorted(set(wanted) - there)
+        check(not more and not less, f"stored are also {len(more)} {more[:20]!r}, missing are {len(less)} {less[:20]!r}")
         for path, source in wanted.items():
             if isinstance(source, bytes) and source.startswith(os.fsencode(self.home)):
                 with open(source, "rb") as file:
