@@ -80,32 +80,6 @@ int get_field(account_h account, FieldIndex index, char **value)
     return ACCOUNT_ERROR_NONE;
 }
 
-// Either all statements of its life are kept (commit) or none.
-class Transaction {
-  public:
-    explicit Transaction(Db &database) : db(database), open(db.run("BEGIN IMMEDIATE")) {}
-    ~Transaction()
-    {
-        if (open)
-            db.run("ROLLBACK");
-    }
-    Transaction(const Transaction &) = delete;
-    Transaction &operator=(const Transaction &) = delete;
-    bool begun() const
-    {
-        return open;
-    }
-    bool commit()
-    {
-        open = !db.run("COMMIT");
-        return !open;
-    }
-
-  private:
-    Db &db;
-    bool open;
-};
-
 bool write_capabilities(Db &db, account_h account, int id)
 {
     for (const auto &[type, capability] : account->capabilities) {

@@ -53,6 +53,33 @@ struct Db {
     }
 };
 
+// Either all statements of its life are kept, when commit() is true, or none. Of one thread, like its connection.
+class Transaction {
+  public:
+    explicit Transaction(Db &database) : db(database), open(db.run("BEGIN IMMEDIATE")) {}
+    ~Transaction()
+    {
+        if (open)
+            db.run("ROLLBACK");
+    }
+    Transaction(const Transaction &) = delete;
+    Transaction &operator=(const Transaction &) = delete;
+    // Whether there is one: another process may hold the database for longer than the wait for it.
+    bool begun() const
+    {
+        return open;
+    }
+    bool commit()
+    {
+        open = !db.run("COMMIT");
+        return !open;
+    }
+
+  private:
+    Db &db;
+    bool open;
+};
+
 // The calling thread's connection to the database `name` in platform_data_dir(), opened when first asked for and closed
 // when the thread ends. It follows the file: after a change of folder, a deleted file or a fork it is opened afresh.
 // Null when the database cannot be opened. `name` and `schema` must be constants; the connection must not leave the

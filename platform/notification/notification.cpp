@@ -110,6 +110,14 @@ int notification_set_pkgname(notification_h noti, const char *pkgname)
     return NOTIFICATION_ERROR_NONE;
 }
 
+int notification_set_heir(notification_h noti, const char *content)
+{
+    if (!noti || !content)
+        return NOTIFICATION_ERROR_INVALID_PARAMETER;
+    noti->heir = content;
+    return NOTIFICATION_ERROR_NONE;
+}
+
 int notification_insert(notification_h noti, int *priv_id)
 {
     if (!noti || noti->package.empty())
@@ -150,15 +158,6 @@ int notification_update_progress(notification_h noti, int priv_id, double progre
     const bool done = store_set_progress(noti->package, priv_id, held, failed);
     if (done)
         noti->progress = held;
-    return outcome(done, failed);
-}
-
-int notification_set_heir(notification_h noti, int priv_id, const char *content)
-{
-    if (!noti || !content)
-        return NOTIFICATION_ERROR_INVALID_PARAMETER;
-    bool failed = false;
-    const bool done = store_set_heir(noti->package, priv_id, content, failed);
     return outcome(done, failed);
 }
 

@@ -74,6 +74,10 @@ int notification_set_execute_option(notification_h noti, notification_execute_ty
                                     const char *key, bundle *service_handle);
 int notification_set_pkgname(notification_h noti, const char *pkgname);
 
+// Names, before it is posted, what is to become of an ongoing notification when its process ends without deleting it,
+// or the machine does: a normal one with this content, and the same title, pictures and launch request.
+int notification_set_heir(notification_h noti, const char *content);
+
 // Posts the notification and gives its private id, 1 or more and never used again; `priv_id` may be null.
 // NOTIFICATION_ERROR_INVALID_PARAMETER without a package.
 int notification_insert(notification_h noti, int *priv_id);
@@ -87,11 +91,6 @@ notification_h notification_load(const char *pkgname, int priv_id);
 // changes in quick succession is what the user gets to see.
 int notification_update_content(notification_h noti, int priv_id, const char *content);
 int notification_update_progress(notification_h noti, int priv_id, double progress);
-
-// Names what is to become of the posted, ongoing notification when its process ends without deleting it, or the machine
-// does: a normal one with this content, and the same title, pictures and launch request.
-// NOTIFICATION_ERROR_NOT_EXIST_ID when it is gone.
-int notification_set_heir(notification_h noti, int priv_id, const char *content);
 
 // Takes the posted notification away; the handle still wants notification_free. NOTIFICATION_ERROR_NOT_EXIST_ID when it
 // was never posted or is gone.

@@ -50,14 +50,13 @@ long long started(long long pid)
     return at == stat.npos ? 0 : std::strtoll(stat.c_str() + at, nullptr, 10);
 }
 
-void remember_poster(const Db &db, int id)
+bool remember_poster(const Db &db, long long id, const notification_s::Text &heir)
 {
     const long long pid = getpid();
-    Stmt(db, "INSERT OR REPLACE INTO poster VALUES (?1, ?2, ?3)")
-        .bind(1, static_cast<long long>(id))
-        .bind(2, pid)
-        .bind(3, started(pid))
-        .done();
+    Stmt poster(db, "INSERT OR REPLACE INTO poster VALUES (?1, ?2, ?3)");
+    if (!poster.bind(1, id).bind(2, pid).bind(3, started(pid)).done())
+        return false;
+    return !heir || Stmt(db, "INSERT OR REPLACE INTO heir VALUES (?1, ?2)").bind(1, id).bind(2, *heir).done();
 }
 
 // Runs a change of one notification; true when there was one.
@@ -91,6 +90,10 @@ bool store_insert(notification_s &noti)
     if (!db)
         return false;
     Stmt(*db, "DELETE FROM notification WHERE boot <> ?1").bind(1, platform_boot_id()).done();
+    // A process that is killed here must not leave one behind that has no poster: nobody would take it away.
+    Transaction transaction(*db);
+    if (!transaction.begun())
+        return false;
     Stmt insert(*db, "INSERT INTO notification (package, type, flags, layout, places, progress, title, content, info,"
                      " info_sub, icon, indicator, launch, boot)"
                      " VALUES (?1, ?2, ?3, ?4, ?5, ?6, ?7, ?8, ?9, ?10, ?11, ?12, ?13, ?14) RETURNING id");
@@ -105,15 +108,18 @@ bool store_insert(notification_s &noti)
         bind(insert, index++, image);
     if (noti.launch)
         insert.bind(index, noti.launch->text);
-    if (noti.flags & NOTIFICATION_PROP_VOLATILE_DISPLAY)
+    // An heir is to be there after the machine's next start, whatever becomes of the ongoing one.
+    if (noti.flags & NOTIFICATION_PROP_VOLATILE_DISPLAY && !noti.heir)
         insert.bind(index + 1, platform_boot_id());
     if (!insert.row())
         return false;
     const int id = static_cast<int>(insert.integer(0));
     if (!insert.done())
         return false;
-    if (noti.type == NOTIFICATION_TYPE_ONGOING)
-        remember_poster(*db, id);
+    if (noti.type == NOTIFICATION_TYPE_ONGOING && !remember_poster(*db, id, noti.heir))
+        return false;
+    if (!transaction.commit())
+        return false;
     noti.id = id;
     return true;
 }
@@ -198,20 +204,6 @@ bool store_set_progress(const std::string &package, int id, double progress, boo
     Stmt update(*db, "UPDATE notification SET progress = ?3 WHERE id = ?1 AND package = ?2");
     update.bind(1, static_cast<long long>(id)).bind(2, package).bind(3, progress);
     return change(*db, update, failed);
-}
-
-bool store_set_heir(const std::string &package, int id, const char *content, bool &failed)
-{
-    Db *db = store();
-    failed = !db;
-    if (!db)
-        return false;
-    // It is to be there after the machine's next start, whatever becomes of the ongoing one.
-    Stmt last(*db, "UPDATE notification SET boot = NULL WHERE id = ?1 AND package = ?2");
-    if (!change(*db, last.bind(1, static_cast<long long>(id)).bind(2, package), failed))
-        return false;
-    Stmt heir(*db, "INSERT OR REPLACE INTO heir VALUES (?1, ?2)");
-    return change(*db, heir.bind(1, static_cast<long long>(id)).bind(2, content), failed);
 }
 
 bool store_delete(const std::string &package, int id, bool &failed)

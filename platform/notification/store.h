@@ -18,6 +18,7 @@ struct notification_s {
     std::array<Text, 4> texts;  // in the order of text_index
     std::array<Text, 2> images; // by notification_image_type_e
     std::optional<bundle> launch;
+    Text heir;
     bool closed = false; // the daemon took it off the screen
 };
 
@@ -30,10 +31,9 @@ std::vector<notification_s> store_list(const char *package, int id = 0);
 // Takes away the ongoing notifications of processes that ended without doing so, or puts their heirs in their place;
 // true when there were any.
 bool store_forget_orphans();
-// These four are false when there is no such notification or the store fails; `failed` tells which.
+// These three are false when there is no such notification or the store fails; `failed` tells which.
 bool store_set_content(const std::string &package, int id, const char *content, bool &failed);
 bool store_set_progress(const std::string &package, int id, double progress, bool &failed);
-bool store_set_heir(const std::string &package, int id, const char *content, bool &failed);
 bool store_delete(const std::string &package, int id, bool &failed);
 bool store_delete_type(const std::string &package, int type); // NOTIFICATION_TYPE_NONE: both
 void store_set_closed(int id);

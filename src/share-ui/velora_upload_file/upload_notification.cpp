@@ -141,13 +141,13 @@ int __progress_noti_new(const char *text, int *noti_id)
     const AppControl request = __request_create(APP_CONTROL_OPERATION_NOTIFICATION_UPLOAD);
     if (!request)
         return -1;
+    __noti_step(
+        notification_set_heir(noti.get(), dcgettext(VELORA_SHARE_DOMAIN, "IDS_VELORA_BODY_INTERRUPTED", LC_MESSAGES)),
+        "notification_set_heir");
     int id = *noti_id;
     if (__noti_insert(noti.get(), request.get(), &id) != 0)
         return -1;
     *noti_id = id;
-    __noti_step(notification_set_heir(noti.get(), id,
-                                      dcgettext(VELORA_SHARE_DOMAIN, "IDS_VELORA_BODY_INTERRUPTED", LC_MESSAGES)),
-                "notification_set_heir");
     return 0;
 }
 
