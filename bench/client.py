@@ -70,8 +70,8 @@ class Uploads:
         return found
 
 
-def beside(bench, what, server, files, goal, rclone=False, first=True):
-    home = os.path.join(bench.place, f"home-{server.name}-{server.port}")
+def beside(bench, what, server, files, goal, rclone=False, first=True, place=None):
+    home = os.path.join(place or bench.place, f"home-{server.name}-{server.port}")
     uploads = Uploads(bench, server, home, files)
     notes = []
     try:
@@ -86,22 +86,26 @@ def beside(bench, what, server, files, goal, rclone=False, first=True):
 
 
 @contextlib.contextmanager
-def server_of(kind, bench, name):
-    place = os.path.join(bench.place, f"{name}-{kind}")
-    os.makedirs(place)
-    os.chmod(place, 0o755)
+def server_of(kind, bench, where):
+    place = os.path.join(where, kind)
+    os.makedirs(place, mode=0o755)
     with velora_cloud(bench.build, place) if kind == "velora-cloud" else apache(place) as server:
         yield server
 
 
 def small(bench):
-    files = make_files(os.path.join(bench.place, "small"), COUNT, SMALL)
+    """All on the disk, where the server waits for it, and all in memory, where the programs are what is left."""
+    runs = []
+    for where, place in (("on the disk", bench.disk), ("in memory", bench.place)):
+        files = make_files(os.path.join(place, "small"), COUNT, SMALL)
+        for kind, goal in (("velora-cloud", 1.1), ("Apache", 1.5)):
+            what = f"{COUNT} x {SMALL >> 10} KiB, client alone, to {kind} {where}"
 
-    def to(kind, goal):
-        with server_of(kind, bench, "small") as server:
-            return beside(bench, f"{COUNT} x {SMALL >> 10} KiB, client alone, to {kind}", server, files, goal)
-    return [attempt(f"{COUNT} x {SMALL >> 10} KiB, client alone, to {kind}", functools.partial(to, kind, goal))
-            for kind, goal in (("velora-cloud", 1.1), ("Apache", 1.5))]
+            def run(kind=kind, goal=goal, what=what, place=place, files=files):
+                with server_of(kind, bench, place) as server:
+                    return beside(bench, what, server, files, goal, place=place)
+            runs.append(attempt(what, run))
+    return runs
 
 
 def large(bench):
@@ -117,7 +121,7 @@ def large(bench):
             with open(path, "wb") as file:
                 for number in range(LARGE >> 20):
                     file.write(number.to_bytes(4, "big") + piece[4:])
-            with server_of("velora-cloud", bench, "large") as server:
+            with server_of("velora-cloud", bench, bench.place) as server:
                 return beside(bench, what, server, [path], 1.15, rclone=True, first=False)
         finally:
             with contextlib.suppress(OSError):
@@ -130,7 +134,7 @@ def distant(bench):
     files = make_files(os.path.join(bench.place, "distant"), COUNT, SMALL)
 
     def to(kind, goal):
-        with server_of(kind, bench, "distant") as server, far(server, ROUND_TRIP) as away:
+        with server_of(kind, bench, bench.place) as server, far(server, ROUND_TRIP) as away:
             return beside(bench, what(kind), away, files, goal, rclone=True)
 
     def what(kind):

@@ -2,18 +2,22 @@
 
 import contextlib
 import dataclasses
+import json
 import os
 import signal
 import statistics
 import subprocess
 import sys
 import tempfile
+import threading
 import time
 
 HERE = os.path.dirname(os.path.abspath(__file__))
 ROOT = os.path.dirname(HERE)
 sys.path[:0] = [os.path.join(ROOT, "tools"), os.path.join(ROOT, "tests", "e2e", "app")]
 MEMORY = "/dev/shm"  # a file system without a disk
+running = set()  # programs that are measured
+stopped = threading.Event()
 
 
 class NotMeasured(Exception):
@@ -48,10 +52,11 @@ class Result:
 
 @dataclasses.dataclass
 class Bench:
-    """What a row gets: the build, how often, and a folder in memory that goes in the end."""
+    """What a row gets: the build, how often, and folders in memory and on the disk that go in the end."""
     build: str
     rounds: int
     place: str
+    disk: str
 
     def program(self, path):
         return os.path.join(self.build, path)
@@ -72,6 +77,7 @@ def measured(command, environment=None):
     start = time.monotonic()
     process = subprocess.Popen(command, env=environment, stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL,
                                stderr=subprocess.PIPE)
+    running.add(process)
     try:
         words = process.stderr.read()
         _, status, used = os.wait4(process.pid, 0)
@@ -81,8 +87,11 @@ def measured(command, environment=None):
         process.wait()
         raise
     finally:
+        running.discard(process)
         process.stderr.close()
     wall = time.monotonic() - start
+    if stopped.is_set():
+        raise NotMeasured("interrupted")
     if process.returncode:
         last = words.decode(errors="replace").strip().splitlines()[-1:]
         raise NotMeasured(f"{os.path.basename(command[0])} ended with {process.returncode}: {''.join(last)}")
@@ -106,6 +115,8 @@ def interleaved(rounds, subjects):
     rows = {name: [] for name in subjects}
     for number in range(rounds):
         for name in list(subjects)[::-1 if number % 2 else 1]:
+            if stopped.is_set():
+                raise NotMeasured("interrupted")
             rows[name].append(subjects[name](number))
     return rows
 
@@ -201,7 +212,6 @@ def as_json(result):
 def build_options(build):
     """{name: value} of what makes a program fast or slow."""
     done = subprocess.run(["meson", "introspect", build, "--buildoptions"], capture_output=True, text=True, check=True)
-    import json
     names = ("buildtype", "optimization", "debug", "b_sanitize", "b_lto")
     return {one["name"]: one["value"] for one in json.loads(done.stdout) if one["name"] in names}
 
@@ -213,18 +223,24 @@ def make(build):
 def _interrupted(*_):
     for number in (signal.SIGINT, signal.SIGTERM, signal.SIGHUP):
         signal.signal(number, signal.SIG_IGN)  # what is being taken away is taken away
+    stopped.set()
+    for process in list(running):
+        process.kill()  # other threads wait for them
     raise KeyboardInterrupt
 
 
 @contextlib.contextmanager
-def place():
-    """A folder, in memory where there is such a place, for this program's files and those of all it starts. It goes in
-    the end, also of a program that is interrupted."""
+def place(on_disk=False):
+    """A folder for this program's files and those of all it starts, in memory where there is such a place. It goes in the
+    end, also of a program that is interrupted."""
     for number in (signal.SIGINT, signal.SIGTERM, signal.SIGHUP):
         signal.signal(number, _interrupted)
-    with tempfile.TemporaryDirectory(prefix="bench-", dir=MEMORY if os.access(MEMORY, os.W_OK) else None,
-                                     ignore_cleanup_errors=True) as folder:
+    memory_folder = None if on_disk or not os.access(MEMORY, os.W_OK) else MEMORY
+    with tempfile.TemporaryDirectory(prefix="bench-", dir=memory_folder, ignore_cleanup_errors=True) as folder:
         os.chmod(folder, 0o755)  # Apache runs as somebody else
+        if on_disk:
+            yield folder
+            return
         before = tempfile.tempdir
         os.environ["TMPDIR"] = tempfile.tempdir = folder
         try:

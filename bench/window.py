@@ -14,6 +14,8 @@ from person import Person
 PATHS = "http://orvant.com/appcontrol/data/path"
 SECONDS = 15  # of each look at an idle window
 SETTLE = 4
+START_FIGURES = [Figure("wall", "launch request to the folders", "s", Goal(0.26), 3), Figure("cpu", "CPU", "s"),
+                 Figure("rss", "memory (RSS)", "MB", Goal(40), 1), Figure("pss", "its share (PSS)", "MB", digits=1)]
 
 
 @contextlib.contextmanager
@@ -51,9 +53,9 @@ def start_application(person, bench, path):
     return figures
 
 
-def start_bare(person, bench):
+def start_bare(device, bench):
     start = time.monotonic()
-    process, painted = bare_window(person, bench)
+    process, painted = bare_window(device, bench)
     time.sleep(0.5)
     figures = {"wall": painted - start, "cpu": processor_seconds(process.pid), **memory(process.pid)}
     process.terminate()
@@ -61,15 +63,25 @@ def start_bare(person, bench):
     return figures
 
 
-def first_page(bench):
-    figures = [Figure("wall", "launch request to the folders", "s", Goal(0.26), 3), Figure("cpu", "CPU", "s"),
-               Figure("rss", "memory (RSS)", "MB", Goal(40), 1), Figure("pss", "its share (PSS)", "MB", digits=1)]
-    with ending(Person(bench.build)) as person:
+@contextlib.contextmanager
+def share_of_one(bench, build):
+    """A function that shares a file with the application of a build, which has been started once before."""
+    with ending(Person(build)) as person:
         path = person.file("one.txt")
-        subjects = {"Velora": lambda _: start_application(person, bench, path), "bare window": lambda _: start_bare(person, bench)}
-        for subject in subjects.values():
-            subject(0)  # what a first start of all leaves in the home
-        return [Result("first folder page", figures, interleaved(bench.rounds, subjects))]
+
+        def share(_number):
+            return start_application(person, bench, path)
+        share(-1)  # what a first start of all leaves in the home
+        yield share
+
+
+def first_page(bench):
+    with share_of_one(bench, bench.build) as share, ending(Device(bench.build)) as device:
+        device.start_display()
+        device.start_bus()
+        start_bare(device, bench)
+        return [Result("first folder page", START_FIGURES, interleaved(bench.rounds, {
+            "Velora": share, "bare window": lambda _: start_bare(device, bench)}))]
 
 
 # an idle window
