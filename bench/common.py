@@ -174,8 +174,8 @@ def judge(result):
         if figure.goal:
             one["goal"] = {"at_most": figure.goal.limit, "beside": figure.goal.beside}
             value = one["ratio"].get(figure.goal.beside) if figure.goal.beside else medians.get(ours)
-            # What counts is what the table shows.
-            one["met"] = None if value is None else round(value, 2 if figure.goal.beside else figure.digits) <= figure.goal.limit
+            digits = 2 if figure.goal.beside else figure.digits  # what counts is what the table shows
+            one["met"] = None if value is None else round(value, digits) <= figure.goal.limit
         judged.append(one)
     return judged
 

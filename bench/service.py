@@ -95,7 +95,8 @@ def served(server, number):
 
 
 def service(bench):
-    figures = [Figure("one", "an upload, one connection", "ms", digits=3), Figure("eight", "eight connections", "ms", digits=3),
+    figures = [Figure("one", "an upload, one connection", "ms", digits=3),
+               Figure("eight", "eight connections", "ms", digits=3),
                Figure("download", "CPU of a download", "ms", digits=3)]
     with contextlib.ExitStack() as stack:
         places = [os.path.join(bench.disk, name) for name in ("ours", "apache")]
@@ -103,7 +104,8 @@ def service(bench):
             os.makedirs(place, mode=0o755)
         ours = stack.enter_context(velora_cloud(bench.build, places[0]))
         other = stack.enter_context(apache(places[1]))
-        subjects = {"Velora": lambda number: served(ours, number), "Apache, not durable": lambda number: served(other, number),
+        subjects = {"Velora": lambda number: served(ours, number),
+                    "Apache, not durable": lambda number: served(other, number),
                     "bare disk": lambda number: disk(bench.disk, number)}
         return [Result("velora-cloud on the disk, 10 KiB", figures, interleaved(bench.rounds, subjects))]
 

@@ -62,13 +62,15 @@ def curl(bench, number):
         config = os.path.join(device.home, "curl.conf")
         with open(config, "w", encoding="ascii") as file:
             file.write(lines)
-        return measured(["curl", "-sSf", "-u", f"{EMAIL}:{PASSWORD}", "-H", "If-None-Match: *", "-H", "Expect:", "-K", config])
+        return measured(["curl", "-sSf", "-u", f"{EMAIL}:{PASSWORD}", "-H", "If-None-Match: *", "-H", "Expect:", "-K",
+                         config])
     finally:
         device.end()
 
 
 def thousand(bench):
-    figures = [Figure("wall", "Done to the result", "s", Goal(1.2, "curl")), Figure("cpu", "CPU of the application", "s", Goal(0.9))]
+    figures = [Figure("wall", "Done to the result", "s", Goal(1.2, "curl")),
+               Figure("cpu", "CPU of the application", "s", Goal(0.9))]
     return [Result(f"{COUNT:,} x {SIZE >> 10} KiB in the application, velora-cloud in memory", figures,
                    interleaved(bench.rounds, {"Velora": lambda number: application(bench, number),
                                               "curl": lambda number: curl(bench, number)}))]
