@@ -1,7 +1,7 @@
 // One long queue in the upload view, or a plain list of as many rows, measured in this process: real widgets without a
-// display, the real cloud client over a service in memory (tests/fakes). Prints one line of JSON; bench/queue runs it.
+// display, the real cloud client over a service in memory (tests/fakes). Prints one line of JSON; bench/run runs it.
 //
-// usage: queue_view app|genlist FILES
+// usage: queue_view app|genlist|app-page|genlist-page FILES     -page: until the page or the first row, and no further
 #include "account/account.h"
 #include "base/base.h"
 #include "driver.h"
@@ -118,7 +118,7 @@ bool is_row_seen(Evas_Object *genlist)
     return is_seen;
 }
 
-void genlist_of(int files, Figures *figures)
+void genlist_of(int files, bool is_page, Figures *figures)
 {
     driver::start();
     Evas_Object *window = elm_win_util_standard_add("bench", "bench");
@@ -144,9 +144,9 @@ void genlist_of(int files, Figures *figures)
         elm_genlist_item_append(genlist, itc, reinterpret_cast<void *>(static_cast<size_t>(i)), nullptr,
                                 ELM_GENLIST_ITEM_NONE, nullptr, nullptr);
     driver::run_until([&] { return is_row_seen(genlist); }, 600);
-    figures->first_row = now() - start;
-    figures->quiet = wait_for_quiet() - start;
-    figures->run_end = figures->quiet;
+    figures->first_row = figures->page = now() - start;
+    if (!is_page)
+        figures->quiet = wait_for_quiet() - start;
     figures->stall = stall.worst;
     figures->stall_own = stall.worst_own;
     figures->cpu = seconds_of(CLOCK_PROCESS_CPUTIME_ID) - cpu;
@@ -187,7 +187,7 @@ bool is_done_ready()
     return vd && vd->done_btn && !vd->ad->popup && !elm_object_disabled_get(vd->done_btn);
 }
 
-void queue_of(const std::vector<std::string> &paths, Figures *figures)
+void queue_of(const std::vector<std::string> &paths, bool is_page, Figures *figures)
 {
     const size_t memory = used_memory();
     const double begin = now();
@@ -198,6 +198,8 @@ void queue_of(const std::vector<std::string> &paths, Figures *figures)
     wait_for_quiet();
     figures->bytes_per_file =
         (static_cast<double>(used_memory()) - static_cast<double>(memory)) / static_cast<double>(paths.size());
+    if (is_page)
+        return;
     const double cpu = seconds_of(CLOCK_PROCESS_CPUTIME_ID), cpu_main = seconds_of(CLOCK_THREAD_CPUTIME_ID);
     Stall stall;
     const double start = now();
@@ -213,7 +215,7 @@ void queue_of(const std::vector<std::string> &paths, Figures *figures)
     figures->cpu_main = seconds_of(CLOCK_THREAD_CPUTIME_ID) - cpu_main;
 }
 
-void app_of(int files, Figures *figures)
+void app_of(int files, bool is_page, Figures *figures)
 {
     TempHome home;
     setlocale(LC_ALL, "C.UTF-8");
@@ -236,7 +238,7 @@ void app_of(int files, Figures *figures)
     char name[] = "velora";
     char *arguments[] = {name, nullptr};
     fake_app::run([&] {
-        queue_of(paths, figures);
+        queue_of(paths, is_page, figures);
         if (s_vd)
             _velora_app_exit(s_vd->ad);
         driver::settle();
@@ -250,16 +252,17 @@ void app_of(int files, Figures *figures)
 int main(int argc, char **argv)
 {
     const int files = argc == 3 ? std::atoi(argv[2]) : 0;
-    const bool is_app = files > 0 && std::strcmp(argv[1], "app") == 0;
-    if (files <= 0 || (!is_app && std::strcmp(argv[1], "genlist") != 0)) {
-        std::fprintf(stderr, "usage: queue_view app|genlist FILES\n");
+    const std::string kind = argc == 3 ? argv[1] : "";
+    const bool is_app = kind.starts_with("app"), is_page = kind.ends_with("-page");
+    if (files <= 0 || (kind != "app" && kind != "app-page" && kind != "genlist" && kind != "genlist-page")) {
+        std::fprintf(stderr, "usage: queue_view app|genlist|app-page|genlist-page FILES\n");
         return 2;
     }
     Figures f;
     if (is_app)
-        app_of(files, &f);
+        app_of(files, is_page, &f);
     else
-        genlist_of(files, &f);
+        genlist_of(files, is_page, &f);
     std::printf("{\"page\": %.3f, \"first_row\": %.3f, \"stall\": %.3f, \"stall_own\": %.3f, \"run_end\": %.3f, "
                 "\"quiet\": %.3f, \"cpu\": %.3f, \"cpu_main\": %.3f, \"bytes_per_file\": %.0f}\n",
                 f.page, f.first_row, f.stall, f.stall_own, f.run_end, f.quiet, f.cpu, f.cpu_main, f.bytes_per_file);
