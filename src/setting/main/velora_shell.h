@@ -13,6 +13,9 @@ void __changeable_font_set(AppData *ad);
 // Sets is_landscape from the window's rotation, unless the person has locked the rotation.
 void __velora_update_landscape_mode(AppData *ad);
 
+// Has the window show the system's indicator when there is a service that draws one.
+void __velora_update_indicator(AppData *ad);
+
 // The LaunchMode that a request's extra data "launch_mode" stands for.
 int __velora_read_launch_mode(app_control_h request);
 
