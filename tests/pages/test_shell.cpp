@@ -198,7 +198,7 @@ TEST_F(Shell, ALaterRequestUsesTheSameWindow)
 TEST_F(Shell, TellsTheSenderOfALongShareWhatIsRefused)
 {
     add_account();
-    Wish wish{.operation = shares, .paths = std::vector<std::string>(3000, "/a"), .sender = "a"};
+    Wish wish{.operation = shares, .paths = std::vector<std::string>(1100, "/a"), .sender = "a"};
     wish.paths.push_back("/dev/null");
     run([&] {
         request(wish);

@@ -84,9 +84,10 @@ struct Rest {
 };
 static std::deque<Rest> s_rests;
 
+static constexpr double budget = 0.005, pause_after = 0.02; // seconds; a look can take 50 µs
+
 static Eina_Bool __look_on_cb(void *)
 {
-    constexpr double budget = 0.005; // seconds
     const double start = ecore_time_get();
     while (!s_rests.empty()) {
         Rest &rest = s_rests.front();
@@ -111,6 +112,6 @@ void __refused_look_on(int request, char **paths, int count)
         return;
     }
     if (s_rests.empty())
-        ecore_timer_add(0, __look_on_cb, nullptr);
+        ecore_timer_add(pause_after, __look_on_cb, nullptr);
     s_rests.push_back({request, paths, count, static_cast<int>(looked_at)});
 }

@@ -68,7 +68,7 @@ static void __bar_update(UploadViewData *vd)
                                     missing > 0 ? missing / (missing + rows) : 0);
 }
 
-static constexpr int slice = 4; // rows that are made at once: the list needs milliseconds to measure each
+static constexpr int first_slice = 4, slice = 2; // rows made at once: the list needs milliseconds to measure each
 
 // Makes some rows more. False when there are enough: more than any window shows beyond what has been seen.
 static bool __rows_make(UploadViewData *vd, int count)
@@ -133,7 +133,7 @@ static void __row_gone(const ItemData *)
 static void __listed_begin(UploadViewData *vd, Listed listed)
 {
     s_listed = std::move(listed);
-    if (__rows_make(vd, slice))
+    if (__rows_make(vd, first_slice))
         __more_rows(vd);
     __bar_update(vd);
 }

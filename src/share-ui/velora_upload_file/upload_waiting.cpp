@@ -1,5 +1,4 @@
 #include "velora_upload_file/upload_waiting.h"
-#include "velora_upload_file/upload_progress.h"
 #include <Ecore_File.h>
 #include <utility>
 
@@ -7,6 +6,12 @@ static std::vector<UploadItemHold> s_waiting;
 static size_t s_measured; // so many of them, from the first one
 static gint64 s_bytes;
 static Ecore_Timer *s_measuring;
+static void (*s_measured_cb)();
+
+void __waiting_measured_cb_set(void (*measured)())
+{
+    s_measured_cb = measured;
+}
 
 // Asks for sizes as long as nobody minds; a hundred thousand files take longer than that. True: they are all known.
 static bool __measure()
@@ -28,7 +33,8 @@ static Eina_Bool __measure_cb(void *)
     if (!__measure())
         return ECORE_CALLBACK_RENEW;
     s_measuring = nullptr;
-    __progress_line_update_soon();
+    if (s_measured_cb)
+        s_measured_cb();
     return ECORE_CALLBACK_CANCEL;
 }
 
