@@ -5,6 +5,7 @@
 #include "app/inspect.h"
 #include "app/language.h"
 #include "app/target.h"
+#include "app/window_rest.h"
 #include "base/base.h"
 #include "theme/theme.h"
 #include <Ecore_X.h>
@@ -65,12 +66,14 @@ void window_hidden(void *, Evas_Object *window, void *)
 {
     if (std::ranges::find(app.hidden_windows, window) == app.hidden_windows.end())
         app.hidden_windows.push_back(window);
+    window_rest_hidden_set(window, true);
     look_at_windows();
 }
 
 void window_shown(void *, Evas_Object *window, void *)
 {
     std::erase(app.hidden_windows, window);
+    window_rest_hidden_set(window, false);
     look_at_windows();
 }
 
@@ -91,6 +94,7 @@ void watch_windows()
             continue;
         app.windows.push_back(window);
         platform_theme_window_watch(window);
+        window_rest_watch(window);
         evas_object_smart_callback_add(window, "iconified", window_hidden, nullptr);
         evas_object_smart_callback_add(window, "withdrawn", window_hidden, nullptr);
         evas_object_smart_callback_add(window, "normal", window_shown, nullptr);

@@ -194,6 +194,21 @@ TEST_F(Shell, ALaterRequestUsesTheSameWindow)
     });
 }
 
+// So many paths are looked at bit by bit, while the page is there already.
+TEST_F(Shell, TellsTheSenderOfALongShareWhatIsRefused)
+{
+    add_account();
+    Wish wish{.operation = shares, .paths = std::vector<std::string>(1100, "/a"), .sender = "a"};
+    wish.paths.push_back("/dev/null");
+    run([&] {
+        request(wish);
+        const double end = ecore_time_get() + 0.5; // far more than the looks take, and nothing shows when they are over
+        driver::run_until([end] { return ecore_time_get() > end; });
+        _velora_app_exit(app);
+    });
+    EXPECT_EQ(replies(), std::vector<std::string>{"a succeeded /dev/null"});
+}
+
 TEST_F(Shell, AnswersThoseWhoWait)
 {
     const struct {

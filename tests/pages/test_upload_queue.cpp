@@ -334,6 +334,11 @@ TEST_F(Queue, ALongListStandsForFilesWithoutRows)
         old_names.push_back("old " + names.back());
     }
     const auto of_type = [](int type) { return __listed(s_vd, type).size(); };
+    const auto without_rows = [] { // as the list's bar tells
+        double x = 0, part = 0;
+        edje_object_part_drag_value_get(elm_layout_edje_get(s_vd->genlist), "more_vbar", &x, &part);
+        return part;
+    };
     const auto retry_popup = [this](int nth) {
         return driver::click_row(row(nth)) && press_popup_button(2) && wait_for(is_over);
     };
@@ -348,12 +353,14 @@ TEST_F(Queue, ALongListStandsForFilesWithoutRows)
              fake_cloud_hold(false);
              ASSERT_TRUE(wait_for(is_over));
              EXPECT_LT(rows().size(), 130u);
+             EXPECT_NEAR(without_rows(), 1 - static_cast<double>(rows().size()) / count, 0.05);
              EXPECT_EQ(of_type(ITEM_TYPE_UPLOADED), count - 1);
              EXPECT_EQ(of_type(ITEM_TYPE_FAILED), 1u);
              ASSERT_TRUE(wait_for([count] {
                  elm_genlist_item_show(elm_genlist_last_item_get(s_vd->genlist), ELM_GENLIST_ITEM_SCROLLTO_IN);
                  return rows().size() == count;
              })) << rows().size();
+             EXPECT_EQ(without_rows(), 0);
              EXPECT_EQ(rows()[139], "failed file139.txt");
              EXPECT_TRUE(retry_popup(139));
              EXPECT_EQ(rows()[139], "uploaded file139.txt");

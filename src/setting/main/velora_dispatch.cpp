@@ -46,7 +46,7 @@ int __velora_read_launch_mode(app_control_h request)
     return launch_mode;
 }
 
-static const char *__convert_uri_to_path(const char *uri)
+const char *__convert_uri_to_path(const char *uri)
 {
     if (!uri) {
         VELORA_LOGE("uri is NULL");
@@ -106,39 +106,6 @@ static void __queue_paths(AppData *ad, char **uris, int count)
     ad->upload_list = _velora_upload_items_append(ad->upload_list, paths.data(), static_cast<int>(paths.size()));
 }
 
-// Takes what nobody can have meant to share out of the paths. Only so many are looked at here, as the person waits;
-// what comes behind them is refused when its turn comes to be uploaded.
-static std::vector<std::string> __refuse_private(std::vector<char *> *paths)
-{
-    constexpr size_t looked_at = 1000;
-    std::vector<std::string> refused;
-    std::vector<char *> others;
-    for (size_t i = 0; i < paths->size(); i++) {
-        const char *path = __convert_uri_to_path((*paths)[i]);
-        if (i < looked_at && cloud_content_sync_check_local(path) == CLOUD_CONTENT_SYNC_ERROR_LOCAL_PRIVATE)
-            refused.emplace_back(path);
-        else
-            others.push_back((*paths)[i]);
-    }
-    *paths = std::move(others);
-    return refused;
-}
-
-static void __say_refused(const std::vector<std::string> &refused)
-{
-    if (refused.empty())
-        return;
-    g_autofree char *name = g_filename_display_basename(refused.front().c_str());
-    for (char *at = name; *at; at++)
-        if (g_ascii_iscntrl(*at))
-            *at = '?';
-    std::string text = name;
-    if (refused.size() > 1)
-        text += " (+" + std::to_string(refused.size() - 1) + ")";
-    text += std::string(": ") + dcgettext(VELORA_DOMAIN, "IDS_VELORA_BODY_FILE_NOT_SHARED", LC_MESSAGES);
-    notification_status_message_post(text.c_str());
-}
-
 // Queues the files of the first share that is held, which is then taken. False when all of them were refused.
 static bool __queue_held(AppData *ad, app_control_h request)
 {
@@ -153,14 +120,14 @@ static bool __queue_held(AppData *ad, app_control_h request)
         app_control_get_extra_data_array(request, APP_CONTROL_DATA_PATH, &array, &count);
         paths.assign(array, array + count);
     }
-    std::vector<std::string> refused = __refuse_private(&paths);
+    std::vector<std::string> refused = __refused_take(&paths);
     __queue_paths(ad, paths.data(), static_cast<int>(paths.size()));
-    __say_refused(refused);
+    __refused_say(refused);
     const bool is_left = refused.empty() || !paths.empty();
-    _velora_request_held_taken(ad, std::move(refused), paths.size());
+    const int number = _velora_request_held_taken(ad, std::move(refused), paths.size());
     std::free(operation);
     std::free(uri);
-    __string_array_free(&array, &count);
+    __refused_look_on(number, array, count);
     return is_left;
 }
 

@@ -135,6 +135,7 @@ static void __velora_app_resume(void *data)
         return;
     }
     __velora_update_landscape_mode(ad);
+    __velora_update_indicator(ad);
 }
 
 static void __velora_language_changed_cb(void *)
@@ -178,6 +179,7 @@ static void __velora_app_reset(app_control_h request, void *data)
     __set_theme(ad);
     _velora_request_add(ad, request);
     __velora_update_landscape_mode(ad);
+    __velora_update_indicator(ad);
     evas_object_show(ad->win_main); // a sign-in that was given up may have hidden it
     elm_win_activate(ad->win_main);
     __velora_join_caller_window(ad, request);

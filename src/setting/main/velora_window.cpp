@@ -5,6 +5,9 @@
 #include "velora_common/velora_log.h"
 #include "velora_common/velora_pages.h"
 #include "velora_common/velora_paths.h"
+#include <Ecore_Con.h>
+#include <cstdlib>
+#include <unistd.h>
 
 static void __win_delete_request_cb(void *, Evas_Object *, void *)
 {
@@ -55,6 +58,23 @@ static void __set_first_size(Evas_Object *win)
     evas_object_resize(win, static_cast<int>(480 * scale), static_cast<int>(800 * scale));
 }
 
+// While a window wants an indicator the toolkit looks for its service once a second, for ever where there is none: the
+// window wants one where there is a service.
+static Elm_Win_Indicator_Mode __indicator_mode()
+{
+    const char *service = std::getenv("ELM_INDICATOR_SERVICE_0");
+    char *path = ecore_con_local_path_new(EINA_FALSE, service ? service : "elm_indicator_portrait", 0);
+    const bool is_there = path && access(path, F_OK) == 0;
+    std::free(path);
+    return is_there ? ELM_WIN_INDICATOR_SHOW : ELM_WIN_INDICATOR_HIDE;
+}
+
+void __velora_update_indicator(AppData *ad)
+{
+    if (ad->win_main)
+        elm_win_indicator_mode_set(ad->win_main, __indicator_mode());
+}
+
 static Evas_Object *__create_window(AppData *ad)
 {
     Evas_Object *win = app_get_preinitialized_window("velora");
@@ -68,7 +88,7 @@ static Evas_Object *__create_window(AppData *ad)
     elm_win_conformant_set(win, EINA_TRUE);
     elm_win_title_set(win, "velora");
     evas_object_smart_callback_add(win, "delete,request", __win_delete_request_cb, ad);
-    elm_win_indicator_mode_set(win, ELM_WIN_INDICATOR_SHOW);
+    elm_win_indicator_mode_set(win, __indicator_mode());
     // With the window, for a popup that scrolls is emptied by an extension that comes while it is open.
     elm_theme_extension_add(nullptr, _velora_common_app_file("res/edje/velora_genlist.edj").c_str());
     elm_theme_extension_add(nullptr, _velora_common_app_file("res/edje/velora_setup_wizard.edj").c_str());
@@ -112,7 +132,7 @@ static Evas_Object *__create_conformant(AppData *ad, int first_mode)
         VELORA_LOGE("ad->conformant is NULL");
         return nullptr;
     }
-    elm_win_indicator_mode_set(ad->win_main, ELM_WIN_INDICATOR_SHOW);
+    __velora_update_indicator(ad);
     elm_win_indicator_opacity_set(ad->win_main, ELM_WIN_INDICATOR_OPAQUE);
     evas_object_show(conformant);
     Evas_Object *indicator_bg = elm_bg_add(conformant);
@@ -179,7 +199,7 @@ void __create_main_view(AppData *ad, int first_mode)
     if (!(ad->bg = __create_bg(ad)) || !(ad->conformant = __create_conformant(ad, first_mode)) ||
         !(ad->layout_main = __create_layout_main(ad)))
         return;
-    elm_win_indicator_mode_set(win, ELM_WIN_INDICATOR_SHOW);
+    __velora_update_indicator(ad);
     if (!(ad->naviframe = __velora_create_navi_layout(ad->layout_main))) {
         VELORA_LOGE("nf is NULL");
         return;

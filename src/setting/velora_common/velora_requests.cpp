@@ -72,15 +72,23 @@ app_control_h _velora_request_held()
     return held == s_requests.end() ? nullptr : held->control;
 }
 
-void _velora_request_held_taken(AppData *ad, std::vector<std::string> refused, size_t others)
+int _velora_request_held_taken(AppData *ad, std::vector<std::string> refused, size_t others)
 {
     const auto held = std::ranges::find(s_requests, true, &Request::is_held);
     if (held == s_requests.end())
-        return;
+        return 0;
+    const int number = held->number;
     held->is_held = false;
     held->refused = std::move(refused);
     if (!held->refused.empty() && others == 0)
-        _velora_request_answer(ad, held->number, APP_CONTROL_RESULT_FAILED);
+        _velora_request_answer(ad, number, APP_CONTROL_RESULT_FAILED);
+    return number;
+}
+
+void _velora_request_refused_add(int number, std::vector<std::string> refused)
+{
+    if (const auto found = __find(number); found != s_requests.end())
+        std::ranges::move(refused, std::back_inserter(found->refused));
 }
 
 static void __reply(const Request &request, app_control_result_e result)

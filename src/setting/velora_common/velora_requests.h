@@ -23,7 +23,10 @@ void _velora_request_hold_last();
 app_control_h _velora_request_held();
 // The first held share is taken now, but for `refused`, some paths of it that are not uploaded, and of `others` that
 // are: its sender finds them in the reply, as the array "refused". With no others it is answered, as one that failed.
-void _velora_request_held_taken(AppData *ad, std::vector<std::string> refused, size_t others);
+// Its number.
+int _velora_request_held_taken(AppData *ad, std::vector<std::string> refused, size_t others);
+// More paths of a share, answered or not, that are not uploaded.
+void _velora_request_refused_add(int number, std::vector<std::string> refused);
 
 // Answers a request if it expects an answer, and forgets it.
 void _velora_request_answer(AppData *ad, int number, app_control_result_e result);

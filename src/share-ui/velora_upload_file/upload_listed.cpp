@@ -13,6 +13,7 @@ struct Listed {
     Evas_Smart_Cb tapped = nullptr;
     size_t next = 0;  // the first one that has not been given a row
     int appended = 0; // rows that were made
+    int gone = 0;     // how many of those were taken out
     int seen = 0;     // how many of those were in sight or went
     Ecore_Timer *more = nullptr;
 
@@ -58,7 +59,16 @@ static void __upload_row_append(UploadViewData *vd, size_t nth, int type)
     __row_tappable_set(record->gen_it, __is_tappable(vd, type));
 }
 
-static constexpr int slice = 4; // rows that are made at once: the list needs milliseconds to measure each
+// The list's bar is to tell how long it is with the rows that are not there yet.
+static void __bar_update(UploadViewData *vd)
+{
+    const auto missing = static_cast<double>(s_listed.total() - s_listed.next);
+    const double rows = s_listed.appended - s_listed.gone;
+    edje_object_part_drag_value_set(elm_layout_edje_get(vd->genlist), "more_vbar", 0,
+                                    missing > 0 ? missing / (missing + rows) : 0);
+}
+
+static constexpr int first_slice = 4, slice = 2; // rows made at once: the list needs milliseconds to measure each
 
 // Makes some rows more. False when there are enough: more than any window shows beyond what has been seen.
 static bool __rows_make(UploadViewData *vd, int count)
@@ -77,7 +87,10 @@ static bool __rows_make(UploadViewData *vd, int count)
 
 static Eina_Bool __more_rows_cb(void *data)
 {
-    if (__rows_make(static_cast<UploadViewData *>(data), slice))
+    auto *vd = static_cast<UploadViewData *>(data);
+    const bool is_more = __rows_make(vd, slice);
+    __bar_update(vd);
+    if (is_more)
         return ECORE_CALLBACK_RENEW;
     s_listed.more = nullptr;
     return ECORE_CALLBACK_CANCEL;
@@ -113,14 +126,16 @@ static void __row_unrealized_cb(void *, Evas_Object *, void *event_info)
 // A row that is taken out makes room for another.
 static void __row_gone(const ItemData *)
 {
+    s_listed.gone++;
     __row_seen(s_listed.seen + 1);
 }
 
 static void __listed_begin(UploadViewData *vd, Listed listed)
 {
     s_listed = std::move(listed);
-    if (__rows_make(vd, slice))
+    if (__rows_make(vd, first_slice))
         __more_rows(vd);
+    __bar_update(vd);
 }
 
 void __listed_show_run(UploadViewData *vd, RunHold run, Evas_Smart_Cb tapped)
@@ -172,5 +187,6 @@ void __listed_forget()
 void __listed_clear(UploadViewData *vd)
 {
     __listed_forget();
+    __bar_update(vd);
     remove_genlist_item(vd->genlist);
 }

@@ -23,7 +23,9 @@ static std::string __waiting_words()
         words = name;
         std::free(name);
     }
-    return words + " · " + __short_size(__waiting_bytes());
+    if (const std::optional<gint64> bytes = __waiting_bytes())
+        words += " · " + __short_size(*bytes);
+    return words;
 }
 
 static void __show_run(UploadViewData *vd)

@@ -20,6 +20,7 @@
 #include "velora_upload_file/upload_open.h"
 #include "velora_upload_file/upload_page.h"
 #include "velora_upload_file/upload_path_bar.h"
+#include "velora_upload_file/upload_progress.h"
 #include "velora_upload_file/upload_queue.h"
 #include "velora_upload_file/upload_result.h"
 #include "velora_upload_file/upload_retry.h"
@@ -154,6 +155,7 @@ static UploadViewData *__view_build(AppData *ad)
     __page_create(vd, __btn_back_cb, __more_create_folder_cb);
     __item_classes_create(vd);
     vd->genlist = __genlist_create(vd);
+    __waiting_measured_cb_set(__progress_line_update_soon);
     s_view_pipe = vd->pipe = _velora_common_pipe_add(__pipe_cb, vd);
     vd->client = _velora_common_client_get(ad);
     if (!vd->client)
