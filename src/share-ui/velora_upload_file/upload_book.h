@@ -1,6 +1,6 @@
 #pragma once
 // The files of a run in the cloud client's book of uploads, which outlives the process. Any thread; what cannot be
-// written is logged, and costs nothing but going on after a crash.
+// written is logged, where the disk is full told to the person, and costs nothing but going on after a crash.
 #include "velora_upload_file/upload_run.h"
 
 // Enters the run's files that wait.
