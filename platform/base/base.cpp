@@ -7,6 +7,7 @@
 #include <set>
 #include <sys/stat.h>
 #include <unistd.h>
+#include <utility>
 
 namespace fs = std::filesystem;
 
@@ -97,7 +98,8 @@ bool Db::open(const std::string &path, const char *schema)
 {
     sqlite3 *raw = nullptr;
     const int result =
-        sqlite3_open_v2(path.c_str(), &raw, SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE | SQLITE_OPEN_NOMUTEX, nullptr);
+        sqlite3_open_v2(path.c_str(), &raw,
+                        SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE | SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_URI, nullptr);
     handle.reset(raw);
     if (result != SQLITE_OK) {
         handle.reset();
@@ -116,16 +118,75 @@ bool Db::open(const std::string &path, const char *schema)
     return handle != nullptr;
 }
 
+// The characters of a path that have a meaning in an address of SQLite's.
+static std::string sqlite_address(const std::string &path, const char *parameter)
+{
+    std::string address = "file:";
+    for (const char c : path)
+        address += c == '%' ? "%25" : c == '?' ? "%3f" : c == '#' ? "%23" : std::string(1, c);
+    // Otherwise it would be looked for where the first database of the connection is.
+    return address + "?vfs=" + sqlite3_vfs_find(nullptr)->zName + "&" + parameter;
+}
+
+bool Db::open_copy(const std::string &memory, const char *schema, const std::string &path,
+                   std::initializer_list<const char *> tables)
+{
+    if (!open(memory, schema))
+        return false;
+    // A file whose index cannot be made either is read without it, but for what its log holds.
+    for (const char *how : {"mode=ro", "immutable=1"}) {
+        if (!Stmt(*this, "ATTACH ? AS disk").bind(1, sqlite_address(path, how)).done())
+            continue;
+        bool is_read = true;
+        for (const std::string table : tables)
+            is_read &= run(("INSERT OR REPLACE INTO main." + table + " SELECT * FROM disk." + table).c_str());
+        run("DETACH disk");
+        if (is_read)
+            break;
+    }
+    return true;
+}
+
 bool Db::run(const char *sql)
 {
     return handle && sqlite3_exec(handle.get(), sql, nullptr, nullptr, nullptr) == SQLITE_OK;
 }
 
-Stmt::Stmt(const Db &db, const char *sql)
+struct Db::Kept {
+    std::map<std::string, std::unique_ptr<sqlite3_stmt, Stmt::Finalize>, std::less<>> statements;
+    bool had_disk_trouble = false;
+};
+
+void Db::keep_statements()
 {
+    kept = std::make_shared<Kept>();
+}
+
+bool Db::had_disk_trouble()
+{
+    return kept && std::exchange(kept->had_disk_trouble, false);
+}
+
+Stmt::Stmt(const Db &db, const char *sql) : kept(db.kept)
+{
+    if (const auto found = kept ? kept->statements.find(sql) : decltype(kept->statements.end())();
+        kept && found != kept->statements.end()) {
+        handle = std::move(found->second);
+        kept->statements.erase(found);
+        return;
+    }
     sqlite3_stmt *raw = nullptr;
     if (db && sqlite3_prepare_v2(db.handle.get(), sql, -1, &raw, nullptr) == SQLITE_OK)
         handle.reset(raw);
+}
+
+Stmt::~Stmt()
+{
+    if (!kept || !handle)
+        return;
+    sqlite3_reset(handle.get());
+    sqlite3_clear_bindings(handle.get());
+    kept->statements[sqlite3_sql(handle.get())] = std::move(handle);
 }
 
 Stmt &Stmt::bind(int index, const char *text)
@@ -156,14 +217,25 @@ Stmt &Stmt::bind(int index, double value)
     return *this;
 }
 
+int Stmt::step()
+{
+    const int result = handle ? sqlite3_step(handle.get()) : SQLITE_MISUSE;
+    const int kind = result & 0xff;
+    const bool is_trouble =
+        kind == SQLITE_FULL || kind == SQLITE_IOERR || kind == SQLITE_READONLY || kind == SQLITE_CANTOPEN;
+    if (kept && is_trouble)
+        kept->had_disk_trouble = true;
+    return result;
+}
+
 bool Stmt::row()
 {
-    return handle && sqlite3_step(handle.get()) == SQLITE_ROW;
+    return step() == SQLITE_ROW;
 }
 
 bool Stmt::done()
 {
-    return handle && sqlite3_step(handle.get()) == SQLITE_DONE;
+    return step() == SQLITE_DONE;
 }
 
 void Stmt::reset()

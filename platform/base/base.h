@@ -1,6 +1,7 @@
 #pragma once
 // What the platform's libraries share: where they keep their files, and small owners of C handles.
 #include <cstdlib>
+#include <initializer_list>
 #include <memory>
 #include <sqlite3.h>
 #include <string>
@@ -41,12 +42,25 @@ struct Db {
         }
     };
     std::unique_ptr<sqlite3, Close> handle;
+    struct Kept;                // statements, by their text
+    std::shared_ptr<Kept> kept; // goes before the connection
 
     // Opens (and creates) the database file and runs `schema`, a list of statements that change nothing when they were
-    // run before. The result is false when either fails; the connection is then closed.
+    // run before. The result is false when either fails; the connection is then closed. `path` may be an address of
+    // SQLite's ("file:...").
     bool open(const std::string &path, const char *schema);
+    // Opens a database in memory, ":memory:" or an address, with what the `tables` of the file at `path` hold, as far
+    // as that can be read. For a disk that is full or read-only. Tables have the same columns in `schema` as there.
+    bool open_copy(const std::string &memory, const char *schema, const std::string &path,
+                   std::initializer_list<const char *> tables);
     // Runs statements that return no rows.
     bool run(const char *sql);
+    // From now on statements are kept when their Stmt ends, for the next one of the same text. No Stmt may outlive the
+    // connection.
+    void keep_statements();
+    // Of a connection that keeps them: whether one has failed since this was last asked because of the disk, which is
+    // full, read-only or broken.
+    bool had_disk_trouble();
     explicit operator bool() const
     {
         return handle != nullptr;
@@ -94,9 +108,15 @@ struct Stmt {
             sqlite3_finalize(s);
         }
     };
+    std::shared_ptr<Db::Kept> kept; // where it goes in the end, if anywhere
     std::unique_ptr<sqlite3_stmt, Finalize> handle;
 
     Stmt(const Db &db, const char *sql);
+    ~Stmt();
+    Stmt(const Stmt &) = delete;
+    Stmt &operator=(const Stmt &) = delete;
+
+    int step();
     Stmt &bind(int index, const char *text); // null binds NULL
     Stmt &bind(int index, const std::string &text);
     Stmt &bind(int index, long long value);

@@ -3,6 +3,7 @@
 #include "cloud_content_sync/cloud_content_sync.h"
 #include "cloud_content_sync/names.h"
 #include "cloud_content_sync/secrets.h"
+#include "dlog/dlog.h"
 #include <sys/stat.h>
 #include <unordered_set>
 
@@ -33,8 +34,11 @@ bool Account::open()
     bool has_rows = false;
     {
         std::scoped_lock lock(reading, writing);
-        if (!writer.open(path, SCHEMA) || chmod(path.c_str(), 0600) != 0 || !reader.open(path, nullptr))
+        const bool is_open = writer.open(path, SCHEMA) && chmod(path.c_str(), 0600) == 0 && reader.open(path, nullptr);
+        if (!is_open && !open_copy())
             return false;
+        for (Db *db : {&writer, &reader})
+            db->keep_statements();
         has_rows =
             Stmt(reader, "SELECT 1 FROM folder UNION ALL SELECT 1 FROM content UNION ALL SELECT 1 FROM upload LIMIT 1")
                 .row();
@@ -51,22 +55,64 @@ std::string Account::identity() const
     return credentials ? account_identity(service, *credentials) : "";
 }
 
-bool Account::change(const std::function<bool()> &work)
+// With both locks. What is in use stays when there is no memory either.
+bool Account::open_copy()
 {
-    std::scoped_lock lock(writing);
-    if (!writer.run("BEGIN IMMEDIATE"))
+    static std::atomic<int> copies = 0;
+    const std::string path = cloud_data_dir() + "/" + service.name + ".db",
+                      memory = "file:/cloud-" + std::to_string(++copies) + "?vfs=memdb"; // of this process
+    Db next_writer, next_reader;
+    if (!next_writer.open_copy(memory, SCHEMA, path, {"setting", "account_setting", "folder", "content", "upload"}) ||
+        !next_reader.open(memory, nullptr))
         return false;
-    if (work() && writer.run("COMMIT"))
+    __dlog_print(DLOG_WARN, "CLOUD", "the database of %s cannot be written; what changes now is kept in memory alone",
+                 service.name.c_str());
+    writer = std::move(next_writer);
+    reader = std::move(next_reader);
+    for (Db *db : {&writer, &reader})
+        db->keep_statements();
+    is_copy = true;
+    return true;
+}
+
+bool Account::attempt(const std::function<bool()> &work, bool *is_disk_trouble)
+{
+    const auto run = [this](const char *sql) { return Stmt(writer, sql).done(); };
+    writer.had_disk_trouble();
+    if (run("BEGIN IMMEDIATE") && work() && run("COMMIT"))
         return true;
+    *is_disk_trouble = writer.had_disk_trouble();
     writer.run("ROLLBACK");
     return false;
+}
+
+// `work` may be called several times.
+bool Account::change(const std::function<bool()> &work, bool may_leave_disk)
+{
+    std::scoped_lock lock(writing);
+    bool is_disk_trouble = false;
+    if (attempt(work, &is_disk_trouble))
+        return true;
+    // On a full disk what the log takes up already can be written once more.
+    if (!is_disk_trouble || is_copy)
+        return false;
+    if (writer.run("PRAGMA wal_checkpoint(RESTART)") && attempt(work, &is_disk_trouble))
+        return true;
+    if (!may_leave_disk)
+        return false;
+    {
+        std::scoped_lock readers(reading);
+        if (!open_copy())
+            return false;
+    }
+    return attempt(work, &is_disk_trouble);
 }
 
 // Credentials change under the database's lock alone, so whoever holds it knows whose rows it writes, whatever other
 // processes do.
 bool Account::while_signed_in(const std::string &who, const std::function<bool()> &work)
 {
-    return change([&] { return identity() == who && work(); });
+    return change([&] { return identity() == who && work(); }, true);
 }
 
 bool Account::write(const std::string &who, const std::function<bool(Db &)> &work)
@@ -79,7 +125,7 @@ bool Account::write_now(const std::string &who, const std::function<bool(Db &)> 
     if (!write(who, work))
         return false;
     std::scoped_lock lock(writing);
-    return writer.run("PRAGMA wal_checkpoint(FULL)");
+    return !is_copy && writer.run("PRAGMA wal_checkpoint(FULL)");
 }
 
 void Account::read(const std::function<void(const Db &)> &work)
@@ -111,6 +157,8 @@ bool Account::replace_credentials(const Credentials *next, std::optional<Credent
 
 bool Account::sign_in(const Credentials *credentials, std::optional<Credentials> *former)
 {
+    if (is_copy) // rows on the disk that cannot be removed would be the next one's
+        return false;
     // The Secret Service may take its time, so it is not asked while others wait for the database. An item that no file
     // names is nobody's.
     const std::string file = credentials_file(service.name);
@@ -267,7 +315,7 @@ long long Account::setting(const std::string &key, long long fallback)
 int Account::set_setting(const std::string &key, long long value)
 {
     bool is_anybody = true;
-    const bool is_stored = change([&] {
+    const bool is_stored = !is_copy && change([&] {
         const std::string who = identity();
         is_anybody = !who.empty();
         Stmt stmt(writer, "INSERT OR REPLACE INTO account_setting(account, key, value) VALUES(?, ?, ?)");

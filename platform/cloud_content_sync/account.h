@@ -2,6 +2,7 @@
 // The metadata database of one service: the account's folder tree as the last refresh and later uploads left it.
 #include "base/base.h"
 #include "cloud_content_sync/credentials.h"
+#include <atomic>
 #include <functional>
 #include <mutex>
 #include <optional>
@@ -27,8 +28,14 @@ struct ContentRow {
 class Account {
   public:
     explicit Account(Service service);
-    // Opens, and creates when it is missing, platform_data_dir()/cloud/SERVICE.db.
+    // Opens, and creates when it is missing, platform_data_dir()/cloud/SERVICE.db. Where the disk is full or read-only
+    // it is a copy in memory, which the other functions go over to as well when a change cannot be written.
     bool open();
+    // Whether what is written outlives the process.
+    bool is_persistent() const
+    {
+        return !is_copy;
+    }
 
     const Service service;
 
@@ -45,7 +52,7 @@ class Account {
     // For what other files of the client keep in the database: while_signed_in() with the connection that writes, and
     // `work` with the one that reads, which others wait for.
     bool write(const std::string &who, const std::function<bool(Db &)> &work);
-    // The same, and it is on the disk on return, so that it survives a flat battery.
+    // The same, and it is on the disk on return, so that it survives a flat battery; false also where it cannot be.
     bool write_now(const std::string &who, const std::function<bool(Db &)> &work);
     void read(const std::function<void(const Db &)> &work);
 
@@ -74,13 +81,16 @@ class Account {
     int set_setting(const std::string &key, long long value);
 
   private:
-    bool change(const std::function<bool()> &work);
+    bool attempt(const std::function<bool()> &work, bool *is_disk_trouble);
+    bool change(const std::function<bool()> &work, bool may_leave_disk = false);
+    bool open_copy();
     bool replace_credentials(const Credentials *next, std::optional<Credentials> &former);
     bool clear();
     bool forget_settings();
 
     std::mutex reading, writing;
     Db reader, writer;
+    std::atomic<bool> is_copy = false; // changed under both locks
 };
 
 } // namespace cloud

@@ -11,6 +11,8 @@
 
 namespace cloud {
 
+// Uploads that are looked after while others run; with more of them the next one waits.
+static constexpr size_t BESIDE_MAX = 8;
 // How often stalled transfers are looked for; with none under way there is nothing to look for.
 static constexpr auto TICK = std::chrono::milliseconds(1000), IDLE_TICK = std::chrono::milliseconds(60'000);
 
@@ -199,6 +201,8 @@ void Client::end_requests(int error)
         refreshes.swap(refresh_queue);
     }
     thumbnails->end();
+    for (const auto &upload : beside)
+        upload->end(error);
     if (running_upload)
         running_upload->end(error);
     for (const UploadRequest &request : uploads)
@@ -211,25 +215,53 @@ void Client::end_requests(int error)
     storage->end(error);
 }
 
+// False when there is none, or when it must wait for one of its name.
+bool Client::begin_next_upload()
+{
+    const auto deferred = std::ranges::find_if(beside, [](const auto &upload) { return upload->is_deferred(); });
+    if (deferred != beside.end()) {
+        running_upload = std::move(*deferred);
+        beside.erase(deferred);
+        running_upload->go_on();
+        return true;
+    }
+    UploadRequest next;
+    {
+        std::scoped_lock lock(mutex);
+        while (!upload_queue.empty() && !live.count(upload_queue.front().id))
+            upload_queue.pop_front();
+        if (stopping || upload_queue.empty())
+            return false;
+        next = upload_queue.front();
+    }
+    if (std::ranges::any_of(beside, [&](const auto &upload) { return upload->concerns(next.server_path); }))
+        return false;
+    {
+        std::scoped_lock lock(mutex);
+        upload_queue.pop_front(); // this thread alone does
+    }
+    running_upload = std::make_unique<Upload>(*this, std::move(next));
+    running_upload->start();
+    return true;
+}
+
 // Uploads run one after the other, so that two of one name never race for it.
 void Client::step_upload()
 {
+    for (const auto &upload : beside)
+        upload->step();
+    std::erase_if(beside, [](const auto &upload) { return upload->has_ended(); });
     if (running_upload)
         running_upload->step();
-    while (!running_upload || running_upload->has_ended()) {
-        running_upload.reset();
-        UploadRequest next;
-        {
-            std::scoped_lock lock(mutex);
-            if (stopping || upload_queue.empty())
+    for (;;) {
+        if (running_upload && !running_upload->has_ended()) {
+            if (beside.size() >= BESIDE_MAX || !running_upload->may_step_aside())
                 return;
-            next = std::move(upload_queue.front());
-            upload_queue.pop_front();
-            if (!live.count(next.id))
-                continue;
+            beside.push_back(std::move(running_upload));
         }
-        running_upload = std::make_unique<Upload>(*this, std::move(next));
-        running_upload->start();
+        running_upload.reset();
+        if (!begin_next_upload())
+            return;
     }
 }
 
@@ -296,9 +328,15 @@ void Client::wait_end()
 void Client::rest()
 {
     std::chrono::milliseconds pause = http.is_idle() ? IDLE_TICK : TICK;
-    if (const auto due = running_upload ? running_upload->due() : std::nullopt)
-        pause = std::clamp(std::chrono::ceil<std::chrono::milliseconds>(*due - Wait::Clock::now()),
-                           std::chrono::milliseconds(0), pause);
+    const auto wait_for = [&pause](const Upload &upload) {
+        if (const auto due = upload.due())
+            pause = std::clamp(std::chrono::ceil<std::chrono::milliseconds>(*due - Wait::Clock::now()),
+                               std::chrono::milliseconds(0), pause);
+    };
+    if (running_upload)
+        wait_for(*running_upload);
+    for (const auto &upload : beside)
+        wait_for(*upload);
     int fd = -1;
     if (network)
         connection_watch_get_fd(network, &fd);
@@ -319,10 +357,11 @@ void Client::loop()
         step_upload();
         contents->step();
         // Nobody waits for a thumbnail, so it waits for everybody.
-        thumbnails->step(!running_upload && contents->is_idle());
+        thumbnails->step(!running_upload && beside.empty() && contents->is_idle());
         rest();
     }
     wait_end();
+    beside.clear();
     running_upload.reset();
     running_refresh.reset();
     contents->end(0);

@@ -109,6 +109,7 @@ class Client : public std::enable_shared_from_this<Client> {
     void loop();
     void rest();
     void step_upload();
+    bool begin_next_upload();
     void step_refresh();
 
     std::mutex mutex;
@@ -123,7 +124,10 @@ class Client : public std::enable_shared_from_this<Client> {
     std::map<int, std::string> landed;
     Wait wait; // what the upload that runs waits for
 
-    std::unique_ptr<Upload> running_upload;   // client thread
+    std::unique_ptr<Upload> running_upload; // client thread
+    // Uploads for which the next one does not wait: they were cancelled and clean up, or what they have stored is
+    // looked at. Client thread.
+    std::vector<std::unique_ptr<Upload>> beside;
     std::unique_ptr<Refresh> running_refresh; // client thread
     connection_watch_h network = nullptr;     // while an upload waits for it; client thread
     bool network_changed = false;             // client thread

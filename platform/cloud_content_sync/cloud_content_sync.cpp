@@ -131,6 +131,14 @@ int cloud_content_sync_get_wait(cloud_content_sync_h handle, cloud_content_sync_
     return DONE;
 }
 
+int cloud_content_sync_get_is_persistent(cloud_content_sync_h handle, bool *persistent)
+{
+    if (!handle || !persistent)
+        return INVALID;
+    *persistent = handle->client->account->is_persistent();
+    return DONE;
+}
+
 // A change of the book for the account that is signed in.
 static int change_queue(cloud_content_sync_h handle, const char *const *local_paths, const char *const *server_paths,
                         int count, bool (cloud::Ledger::*change)(const std::string &, const cloud::LedgerPaths &))

@@ -66,8 +66,9 @@ typedef void (*cloud_content_sync_refresh_cb)(int status, int error, void *user_
 typedef bool (*cloud_content_sync_folder_cb)(cloud_content_sync_folder_h folder, int error, void *user_data);
 typedef bool (*cloud_content_sync_content_cb)(cloud_content_sync_content_h content, int error, void *user_data);
 
-// Opens a client of the service; nothing is sent. NO_SERVICE without a usable description, DB_FAILED when the service's
-// database cannot be opened. Nobody needs to be signed in: requests then fail with NO_ACCOUNT.
+// Opens a client of the service; nothing is sent. NO_SERVICE without a usable description. Where the service's database
+// cannot be opened, on a full or read-only disk, the client goes on with a copy of it in memory. Nobody needs to be
+// signed in: requests then fail with NO_ACCOUNT.
 int cloud_content_sync_create(const char *service_name, cloud_content_sync_h *handle);
 // Ends all requests and frees the handle. No callback runs any more on return: one that is running is waited for,
 // unless this is called from within it. Transfers in progress are broken off by closing their connection.
@@ -156,7 +157,9 @@ int cloud_content_sync_set_thumbnail_cb(cloud_content_sync_h handle, cloud_conte
 int cloud_content_sync_name_get_next(const char *name, char **next);
 
 // Stores a local file at server_path, whose folder must exist. Returns at once; *req_id (above 0) is written before the
-// first callback. Uploads of one handle run one after the other, in the order in which they were asked for.
+// first callback. Uploads of one handle are sent one after the other, in the order in which they were asked for. What
+// one has stored is looked at while the next one is sent, so who has two at a time under way, or more, does not wait
+// for the service's second answer; the last callbacks of two that follow each other may come in either order.
 //
 // Nothing is ever overwritten: when the name is taken, by a file or a folder, the next free one is used, as
 // cloud_content_sync_name_get_next has it. DONE means that the service holds a file of the same size and
@@ -182,11 +185,16 @@ enum cloud_content_sync_wait_e {
 };
 int cloud_content_sync_get_wait(cloud_content_sync_h handle, cloud_content_sync_wait_e *reason, int *seconds);
 
+// Whether what the client writes down outlives this process. False from when the disk, full or read-only, refuses it:
+// uploads and refreshes go on, but the book below, settings and sign-ins cannot be changed, and an upload that is cut
+// off with the process is not gone on with. It stays so for this handle.
+int cloud_content_sync_get_is_persistent(cloud_content_sync_h handle, bool *persistent);
+
 // The book of uploads, which outlives the process: files that are going to be uploaded, until each of them is stored,
 // cancelled or has failed. An upload finds its entry by its paths, and looks first whether an earlier attempt has
 // stored the file; one without an entry gets one. Sign-out empties the book.
 //
-// Enters files in this order, all or none. NO_ACCOUNT, DB_FAILED (a full disk): the uploads themselves do not need it.
+// Enters files in this order, all or none. NO_ACCOUNT; DB_FAILED on a full disk: the uploads do not need it.
 int cloud_content_sync_queue_add(cloud_content_sync_h handle, const char *const *local_paths,
                                  const char *const *server_paths, int count);
 // Takes entries out; those of uploads that have begun go with them. Errors as above; what is not there is none.

@@ -1,10 +1,15 @@
 #include "cloud_content_sync/credentials.h"
+#include "base/base.h"
 #include "cloud_content_sync/cloud_content_sync.h"
 #include "cloud_content_sync/secrets.h"
 #include <algorithm>
 #include <cerrno>
+#include <cstdlib>
+#include <ctime>
 #include <glib.h>
 #include <glib/gstdio.h>
+#include <mutex>
+#include <sys/stat.h>
 
 namespace cloud {
 
@@ -25,10 +30,10 @@ std::string credentials_file(const std::string &service_name)
     return cloud_data_dir() + "/" + service_name + ".credentials";
 }
 
-std::optional<Credentials> credentials_known(const std::string &service_name)
+static std::optional<Credentials> read_file(const std::string &path)
 {
     g_autoptr(GKeyFile) file = g_key_file_new();
-    if (!g_key_file_load_from_file(file, credentials_file(service_name).c_str(), G_KEY_FILE_NONE, nullptr))
+    if (!g_key_file_load_from_file(file, path.c_str(), G_KEY_FILE_NONE, nullptr))
         return {};
     const auto field = [&](const char *key) -> std::string {
         g_autofree char *value = g_key_file_get_string(file, GROUP, key, nullptr);
@@ -38,6 +43,34 @@ std::optional<Credentials> credentials_known(const std::string &service_name)
     if (credentials.secret.empty() && credentials.item.empty())
         return {};
     return credentials;
+}
+
+// What was read last is taken again while the file is the same one: every change makes a new one. The clock of files
+// may stand still for some milliseconds, so a young file is always read.
+std::optional<Credentials> credentials_known(const std::string &service_name)
+{
+    static std::mutex mutex;
+    static struct {
+        std::string path;
+        struct stat file = {};
+        std::optional<Credentials> credentials;
+    } last;
+    const std::string path = platform_data_dir() + "/cloud/" + service_name + ".credentials"; // nothing is made for it
+    std::scoped_lock lock(mutex);
+    struct stat now = {};
+    if (stat(path.c_str(), &now) != 0) {
+        last = {};
+        return {};
+    }
+    const auto is_same = [](const timespec &one, const timespec &other) {
+        return one.tv_sec == other.tv_sec && one.tv_nsec == other.tv_nsec;
+    };
+    const bool is_known = last.path == path && last.file.st_ino == now.st_ino && last.file.st_dev == now.st_dev &&
+                          last.file.st_size == now.st_size && is_same(last.file.st_mtim, now.st_mtim) &&
+                          is_same(last.file.st_ctim, now.st_ctim);
+    if (!is_known || std::abs(time(nullptr) - now.st_ctim.tv_sec) < 2)
+        last = {path, now, read_file(path)};
+    return last.credentials;
 }
 
 int credentials_load(const std::string &service_name, Credentials &credentials)

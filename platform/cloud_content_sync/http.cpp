@@ -10,7 +10,9 @@
 namespace cloud {
 
 static constexpr long CONNECT_SECONDS = 15;
-static constexpr long BUFFER_BYTES = 256 * 1024;
+// Of what comes; that of a list or a file is worth a larger one.
+static constexpr long BUFFER_BYTES = 256 * 1024, SMALL_BUFFER_BYTES = 16 * 1024;
+static constexpr long long UPLOAD_BYTES_MIN = 16 * 1024, UPLOAD_BYTES_MAX = 64 * 1024;
 
 static constexpr char AUTH[] = "auth";
 static constexpr int ATTEMPTS_MAX = 3;
@@ -132,7 +134,8 @@ static void set_body(CURL *easy, Transfer &transfer)
         curl_easy_setopt(easy, CURLOPT_READDATA, &transfer);
         curl_easy_setopt(easy, CURLOPT_SEEKFUNCTION, seek_cb);
         curl_easy_setopt(easy, CURLOPT_SEEKDATA, &transfer);
-        curl_easy_setopt(easy, CURLOPT_UPLOAD_BUFFERSIZE, BUFFER_BYTES);
+        const long long piece = std::clamp<long long>(transfer.body_size, UPLOAD_BYTES_MIN, UPLOAD_BYTES_MAX);
+        curl_easy_setopt(easy, CURLOPT_UPLOAD_BUFFERSIZE, static_cast<long>(piece));
         // Nothing has to be rewound to send an empty body twice, so libcurl would do it unasked on a dead connection.
         if (transfer.body_size == 0)
             curl_easy_setopt(easy, CURLOPT_FRESH_CONNECT, 1L);
@@ -251,7 +254,7 @@ void Http::launch(Transfer &transfer)
     curl_easy_setopt(easy, CURLOPT_NOSIGNAL, 1L);
     curl_easy_setopt(easy, CURLOPT_QUICK_EXIT, 1L); // an abort does not wait for the name resolver
     curl_easy_setopt(easy, CURLOPT_CONNECTTIMEOUT, CONNECT_SECONDS);
-    curl_easy_setopt(easy, CURLOPT_BUFFERSIZE, BUFFER_BYTES);
+    curl_easy_setopt(easy, CURLOPT_BUFFERSIZE, transfer.write ? BUFFER_BYTES : SMALL_BUFFER_BYTES);
     curl_easy_setopt(easy, CURLOPT_WRITEFUNCTION, write_cb);
     curl_easy_setopt(easy, CURLOPT_WRITEDATA, &transfer);
     curl_easy_setopt(easy, CURLOPT_HEADERFUNCTION, header_cb);
@@ -331,12 +334,6 @@ bool Http::run(std::chrono::milliseconds wait, int fd)
     end_stalled();
     if (std::exchange(is_woken, false))
         return false;
-    if (alarm != alarm.max()) {
-        const auto left = std::chrono::ceil<std::chrono::milliseconds>(alarm - std::chrono::steady_clock::now());
-        wait = std::clamp(left, std::chrono::milliseconds(0), wait);
-        if (left <= wait)
-            alarm = alarm.max();
-    }
     curl_waitfd other = {.fd = fd, .events = CURL_WAIT_POLLIN, .revents = 0};
     curl_multi_poll(multi.get(), &other, fd >= 0 ? 1 : 0, static_cast<int>(wait.count()), nullptr);
     return other.revents != 0;

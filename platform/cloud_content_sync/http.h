@@ -93,11 +93,6 @@ class Http {
     }
     // Ends the wait of run(), or of the next one. Any thread.
     void wake();
-    // Lets run() return at that time at the latest, once.
-    void wake_at(std::chrono::steady_clock::time_point time)
-    {
-        alarm = time;
-    }
     // The root URL of the WebDAV tree, without a final "/".
     const std::string &storage() const
     {
@@ -122,7 +117,6 @@ class Http {
     Transfer *knock_now = nullptr;
     std::atomic<std::thread::id> runner; // the thread of run()
     bool is_woken = false;               // by that thread
-    std::chrono::steady_clock::time_point alarm = std::chrono::steady_clock::time_point::max();
 
   public:
     Known known{service};

@@ -54,8 +54,9 @@ Known::Known(const Service &service) : name(service.name), storage(service.stora
 
 Db *Known::database()
 {
-    if (!was_opened)
-        db.open(cloud_data_dir() + "/" + name + ".db", SCHEMA);
+    const std::string path = cloud_data_dir() + "/" + name + ".db";
+    if (!was_opened && !db.open(path, SCHEMA))
+        db.open_copy(":memory:", SCHEMA, path, {"known", "temporary"});
     was_opened = true;
     return db ? &db : nullptr;
 }

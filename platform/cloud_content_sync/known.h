@@ -30,8 +30,8 @@ class Known {
     // Nothing is opened before something is asked for.
     explicit Known(const Service &service);
 
-    // "way": a Way; "digest": 0 when the service's answers carry none; "auth": 1 when it asked for Digest. What was
-    // found out is believed for 30 days.
+    // "way": a Way; "destination": 1 when a MOVE takes a path where others take an address; "digest": 0 when the
+    // service's answers carry none; "auth": 1 when it asked for Digest. What was found out is believed for 30 days.
     std::optional<int> find(const std::string &key);
     void remember(const std::string &key, int value);
     // Forgets it, once, when the service does not do what was found out.

@@ -25,16 +25,26 @@ static constexpr char INSERT[] =
 
 bool Ledger::add(const std::string &who, const LedgerPaths &files)
 {
-    return account.write_now(who, [&](Db &db) {
+    std::vector<long long> made;
+    const bool is_written = account.write_now(who, [&](Db &db) {
+        made.clear();
         Stmt old(db, "DELETE FROM upload WHERE state = 2 AND at < ?");
         if (!old.bind(1, static_cast<long long>(time(nullptr)) - KEPT_SECONDS).done())
             return false;
-        Stmt stmt(db, INSERT);
-        for (const auto &[local, server] : files)
-            if (add_row(stmt, who, local, server) == 0)
+        Stmt last(db, "SELECT max(id) FROM upload"), stmt(db, INSERT);
+        const long long before = last.row() ? last.integer(0) : 0;
+        for (const auto &[local, server] : files) {
+            const long long id = add_row(stmt, who, local, server);
+            if (id == 0)
                 return false;
+            if (id > before)
+                made.push_back(id);
+        }
         return true;
     });
+    std::scoped_lock lock(mutex);
+    own.insert(made.begin(), made.end());
+    return is_written;
 }
 
 bool Ledger::remove(const std::string &who, const LedgerPaths &files)
@@ -73,6 +83,8 @@ LedgerRow Ledger::begin(const std::string &who, const std::string &local_path, c
         found.id = stmt.integer(0);
         found.target = stmt.text(1);
     });
+    std::scoped_lock lock(mutex);
+    found.is_inherited = found.id != 0 && own.count(found.id) == 0;
     return found;
 }
 
@@ -80,17 +92,23 @@ bool Ledger::sent(const std::string &who, LedgerRow &row, const std::string &tar
 {
     if (row.id != 0 && row.target == target)
         return true;
-    return account.write(who, [&](Db &db) {
-        if (row.id == 0) {
+    long long id = 0;
+    const bool is_written = account.write(who, [&](Db &db) {
+        id = row.id;
+        if (id == 0) {
             Stmt insert(db, INSERT);
-            row.id = add_row(insert, who, row.local_path, row.server_path);
-            if (row.id == 0)
+            id = add_row(insert, who, row.local_path, row.server_path);
+            if (id == 0)
                 return false;
         }
-        row.target = target;
         Stmt stmt(db, "UPDATE upload SET state = 1, target = ?, at = ? WHERE id = ?");
-        return stmt.bind(1, target).bind(2, static_cast<long long>(time(nullptr))).bind(3, row.id).done();
+        return stmt.bind(1, target).bind(2, static_cast<long long>(time(nullptr))).bind(3, id).done();
     });
+    if (!is_written)
+        return false;
+    row.id = id;
+    row.target = target;
+    return true;
 }
 
 bool Ledger::give_up(const std::string &who, const LedgerRow &row)

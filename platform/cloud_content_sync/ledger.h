@@ -3,7 +3,9 @@
 // they were stored. Rows of the account's database, so they survive whatever ends the process; every function may be
 // called from any thread, and changes nothing when `who`, an identity, is not signed in.
 #include "cloud_content_sync/account.h"
+#include <mutex>
 #include <string>
+#include <unordered_set>
 #include <utility>
 #include <vector>
 
@@ -12,7 +14,8 @@ namespace cloud {
 struct LedgerRow {
     long long id = 0; // 0: not in the book yet
     std::string local_path, server_path;
-    std::string target; // where a body was sent of which nothing more is known, or empty
+    std::string target;        // where a body was sent of which nothing more is known, or empty
+    bool is_inherited = false; // from an earlier process, which may have done more than it could write down
 };
 
 // Paths on the device and in the cloud, of one file after the other.
@@ -40,6 +43,8 @@ class Ledger {
 
   private:
     Account &account;
+    std::mutex mutex;
+    std::unordered_set<long long> own; // rows that this process has made
 };
 
 // The statement of close(), for a transaction of the account's.

@@ -96,6 +96,8 @@ static bool is_our_own(const Descriptor &file, const struct stat &about)
     const std::string place = link_target(own.proc_path());
     if (!place.empty() && link_target(file.proc_path()).compare(0, place.size() + 1, place + "/") == 0)
         return true;
+    if (about.st_nlink == 1)
+        return false;
     const std::unique_ptr<DIR, int (*)(DIR *)> entries(opendir(folder.c_str()), closedir);
     while (const dirent *entry = entries ? readdir(entries.get()) : nullptr)
         if (struct stat one = {}; fstatat(own.fd, entry->d_name, &one, AT_SYMLINK_NOFOLLOW) == 0 &&

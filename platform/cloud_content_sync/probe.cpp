@@ -12,9 +12,14 @@ static constexpr char BODY[] = "Velora finds out whether this server keeps files
                                "This one may be deleted.\n";
 static constexpr auto CLEAN_LIMIT = std::chrono::seconds(15);
 
-std::vector<std::string> move_headers(const std::string &storage, const std::string &target)
+static constexpr char BY_PATH[] = "destination"; // of the known
+
+std::vector<std::string> move_headers(Http &http, const std::string &target)
 {
-    return {"Destination: " + storage + percent_encode(target), "Overwrite: F"};
+    const std::string &storage = http.storage();
+    const size_t root = http.known.find(BY_PATH) == 1 ? storage.find('/', storage.find("://") + 3) : 0;
+    return {"Destination: " + (root < storage.size() ? storage.substr(root) : "") + percent_encode(target),
+            "Overwrite: F"};
 }
 
 Probe::Probe(Http &owner, Credentials account, std::string identity, std::string destination)
@@ -134,17 +139,27 @@ void Probe::second_stored(const Transfer &transfer)
         not_stored(transfer);
         return clean(transfer.error());
     }
-    auto move = std::make_unique<Transfer>();
-    move->method = "MOVE";
-    move->path = second;
-    move->headers = move_headers(http.storage(), first);
-    send(std::move(move), &Probe::moved);
+    move();
+}
+
+void Probe::move()
+{
+    auto transfer = std::make_unique<Transfer>();
+    transfer->method = "MOVE";
+    transfer->path = second;
+    transfer->headers = move_headers(http, first);
+    send(std::move(transfer), &Probe::moved);
 }
 
 void Probe::moved(const Transfer &transfer)
 {
     if (transfer.result != CURLE_OK || transfer.status == 401)
         return clean(transfer.error());
+    // A service behind a proxy may know itself by another name, and take the address for another server's.
+    if ((transfer.status == 502 || transfer.status == 400) && http.known.find(BY_PATH) != 1) {
+        http.known.remember(BY_PATH, 1);
+        return move();
+    }
     decide(transfer.status == 412 ? Way::MOVE : Way::NONE);
 }
 

@@ -28,6 +28,7 @@ class Probe {
     void first_stored(const Transfer &transfer);
     void tried_again(const Transfer &transfer);
     void second_stored(const Transfer &transfer);
+    void move();
     void moved(const Transfer &transfer);
     void folder_looked_at(const Transfer &transfer);
     void send(std::unique_ptr<Transfer> transfer, Next next);
@@ -47,7 +48,8 @@ class Probe {
     bool is_hidden = true, is_cancelled = false, is_cleaning = false;
 };
 
-// The headers of a MOVE that must not replace anything. storage: the root URL, target: a server path.
-std::vector<std::string> move_headers(const std::string &storage, const std::string &target);
+// The headers of a MOVE to a server path that must not replace anything. The target is given as an address, or as a
+// path where that is what the service takes.
+std::vector<std::string> move_headers(Http &http, const std::string &target);
 
 } // namespace cloud

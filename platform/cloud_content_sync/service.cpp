@@ -2,7 +2,9 @@
 #include "base/base.h"
 #include "cloud_content_sync/names.h"
 #include <algorithm>
+#include <cerrno>
 #include <glib.h>
+#include <sys/stat.h>
 
 namespace cloud {
 
@@ -84,7 +86,8 @@ std::optional<Service> service_find(const std::string &name)
 std::string cloud_data_dir()
 {
     const std::string dir = platform_data_dir() + "/cloud";
-    g_mkdir_with_parents(dir.c_str(), 0700);
+    if (mkdir(dir.c_str(), 0700) != 0 && errno == ENOENT)
+        g_mkdir_with_parents(dir.c_str(), 0700);
     return dir;
 }
 

@@ -54,9 +54,15 @@ void Upload::resume()
     if (path_is_valid(record.target))
         target = record.target;
     lost_reply = false;
-    checksum.emplace();
-    sent = 0;
+    begin_body();
+    hash(&Upload::resumed);
+}
+
+// What is not read yet, then a look at where().
+void Upload::hash(LookDone then)
+{
     is_hashing = true;
+    after_hash = then;
     client.http.wake();
 }
 
@@ -72,8 +78,9 @@ void Upload::hash_some()
     if (!whole_file_read())
         return client.http.wake();
     is_hashing = false;
-    digest = checksum->hex();
-    look(true, &Upload::resumed);
+    if (digest.empty())
+        digest = checksum->hex();
+    look(true, after_hash);
 }
 
 void Upload::resumed(const Look &result)
@@ -90,7 +97,7 @@ void Upload::resumed(const Look &result)
 // Ends with the error, or waits for what it comes from to pass.
 void Upload::trouble(int error, long long retry_after)
 {
-    if (!client.is_wanted(wanted.id) || (error != CLOUD_CONTENT_SYNC_ERROR_NETWORK && retry_after < 0))
+    if (!is_wanted() || (error != CLOUD_CONTENT_SYNC_ERROR_NETWORK && retry_after < 0))
         return finish(error);
     wait = client.wait_begin(retry_after);
     if (!wait.is_under_way())
@@ -124,7 +131,7 @@ void Upload::wait_step()
 std::optional<Wait::Clock::time_point> Upload::due() const
 {
     if (!wait.is_under_way())
-        return {};
+        return delete_again_at;
     return wait.reason == CLOUD_CONTENT_SYNC_WAIT_SERVICE_BUSY ? std::min(wait.until, wait.told_until) : wait.until;
 }
 
@@ -144,7 +151,7 @@ bool Upload::local_is_what_was_sent() const
     Sha256 again;
     std::vector<char> buffer(256 * 1024);
     long long at = 0;
-    while (true) {
+    while (is_wanted()) {
         const ssize_t got = pread(fd, buffer.data(), buffer.size(), at);
         if (got < 0 && errno == EINTR)
             continue;
@@ -153,6 +160,7 @@ bool Upload::local_is_what_was_sent() const
         again.add(buffer.data(), static_cast<size_t>(got));
         at += got;
     }
+    return false;
 }
 
 bool Upload::local_changed() const
@@ -171,7 +179,7 @@ void Upload::step()
 {
     if (ended || is_removing)
         return delete_again();
-    if (!client.is_wanted(wanted.id)) {
+    if (!is_wanted()) {
         if (probe)
             return probe->cancel();
         if (transfer_now && (is_moving || (is_putting && whole_file_read()))) {
@@ -237,6 +245,7 @@ void Upload::request(std::unique_ptr<Transfer> transfer, void (Upload::*then)(co
 bool Upload::begin_body()
 {
     checksum.emplace();
+    digest.clear();
     sent = 0;
     return true;
 }
@@ -286,8 +295,9 @@ void Upload::put_ended(const Transfer &transfer)
         put_error = transfer.error();
         return look(true, &Upload::refused);
     }
-    if (transfer.status == 412 && (lost_reply || is_unknown))
-        return look(true, &Upload::settled);
+    // A refusal may come before the end of the body.
+    if (transfer.status == 412 && (lost_reply || is_unknown || (record.is_inherited && temporary.empty())))
+        return hash(&Upload::settled);
     if (transfer.status == 412 && renew_temporary())
         return;
     if (transfer.status == 412)
@@ -303,7 +313,7 @@ void Upload::put_unanswered(const Transfer &transfer)
     if (transfer.never_sent())
         puts--;
     const bool stalled_midway = transfer.result == CURLE_OPERATION_TIMEDOUT && !whole_file_read();
-    if (!client.is_wanted(wanted.id))
+    if (!is_wanted())
         return finish(transfer.error());
     if (transfer.never_sent() || stalled_midway)
         return trouble(transfer.error());
@@ -358,7 +368,7 @@ void Upload::try_next_name()
     target = join(parent_of(target), next_free_name(name_of(target)));
     lost_reply = is_unknown = false;
     // Looking costs less than sending a body in vain.
-    look(false, &Upload::next_name_looked_at, target);
+    look(record.is_inherited, &Upload::next_name_looked_at, target);
 }
 
 void Upload::next_name_looked_at(const Look &result)
@@ -367,7 +377,18 @@ void Upload::next_name_looked_at(const Look &result)
         return trouble(result.error, result.retry_after);
     if (result.found == Found::ABSENT)
         return put();
+    if (result.found == Found::SAME)
+        return is_there_already();
     try_next_name();
+}
+
+// A process that is gone has stored it under its name.
+void Upload::is_there_already()
+{
+    if (!temporary.empty())
+        return delete_temporary([this] { is_there_already(); });
+    stored_etag.clear();
+    verified({Found::SAME, 0});
 }
 
 void Upload::stored(const Transfer &transfer)
@@ -377,7 +398,7 @@ void Upload::stored(const Transfer &transfer)
     if (!created && temporary.empty())
         client.http.known.doubt("way");
     stored_etag = transfer.etag;
-    if (!client.is_wanted(wanted.id))
+    if (!is_wanted())
         return created ? remove_stored(0) : finish(0);
     if (local_changed())
         return remove_stored(CLOUD_CONTENT_SYNC_ERROR_LOCAL_CHANGED);
@@ -514,7 +535,8 @@ void Upload::finish(int error)
     if (!temporary.empty())
         return delete_temporary([this, error] { finish(error); });
     ended = true;
-    client.wait_end();
+    if (wait.is_under_way())
+        client.wait_end();
     if (error != 0 && is_unknown)
         client.ledger.give_up(who, record);
     else if (error != 0 || !client.is_kept(wanted.id))

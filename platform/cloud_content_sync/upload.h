@@ -25,6 +25,22 @@ class Upload {
     void step();
     // When step() is to be called although nothing moves; nothing: there is no such time.
     std::optional<std::chrono::steady_clock::time_point> due() const;
+    // Whether the next upload need not wait for the end of this one.
+    bool may_step_aside() const
+    {
+        return is_checking || !is_wanted();
+    }
+    // What is stored could not be looked at: it goes on when nothing else is uploaded, by go_on().
+    bool is_deferred() const
+    {
+        return doubt && is_wanted();
+    }
+    void go_on();
+    // Whether another upload to this server path has to wait for it.
+    bool concerns(const std::string &path) const
+    {
+        return (!is_checking || !is_wanted()) && (path == target || path == wanted.server_path);
+    }
     // Breaks it off; what is stored by now stays. The error is that of the last callback.
     void end(int error);
     bool has_ended() const
@@ -33,6 +49,10 @@ class Upload {
     }
 
   private:
+    bool is_wanted() const
+    {
+        return client.is_wanted(wanted.id);
+    }
     // What a look at a server path found.
     enum class Found { ABSENT, SAME, DIFFERENT };
     struct Look {
@@ -43,6 +63,7 @@ class Upload {
     using LookDone = void (Upload::*)(const Look &);
 
     void resume();
+    void hash(LookDone then);
     void hash_some();
     void resumed(const Look &look);
     void refused(const Look &look);
@@ -87,7 +108,9 @@ class Upload {
     void check_stored();
     void note_digest(bool is_there);
     void head_ended(const Transfer &transfer);
+    void checked(const Look &look);
     void next_name_looked_at(const Look &look);
+    void is_there_already();
     // Compares what is stored under `path` (empty: where()) with what was sent; by_digest false: only whether something
     // is there.
     void look(bool by_digest, LookDone then, const std::string &path = "");
@@ -130,7 +153,8 @@ class Upload {
     int breaks = 0; // of connections in the middle of a body
     std::string look_path;
     bool look_by_digest = false;
-    LookDone look_done = nullptr;
+    std::optional<Look> doubt; // what that has told in place of how it is
+    LookDone look_done = nullptr, after_hash = nullptr;
     Transfer *transfer_now = nullptr;
     std::unique_ptr<Probe> probe;
     std::vector<std::string> left_behind; // of earlier uploads, to be deleted
@@ -143,6 +167,7 @@ class Upload {
     std::optional<std::chrono::steady_clock::time_point> delete_again_at;
     int moves = 0;
     int folder_error = 0;
+    bool is_checking = false; // what is stored under its name is looked at
     bool is_putting = false;
     bool is_moving = false;
     bool is_removing = false;

@@ -37,7 +37,7 @@ void Upload::prepare()
 
 void Upload::delete_left_behind()
 {
-    if (left_behind.empty() || !client.is_wanted(wanted.id))
+    if (left_behind.empty() || !is_wanted())
         return choose_way();
     auto transfer = std::make_unique<Transfer>();
     transfer->method = "DELETE";
@@ -65,7 +65,7 @@ void Upload::choose_way()
         probe = std::make_unique<Probe>(client.http, credentials, who, parent_of(target));
         return probe->start([this](int error) {
             probe.reset();
-            if (error || !client.is_wanted(wanted.id))
+            if (error || !is_wanted())
                 return trouble(error);
             choose_way();
         });
@@ -101,7 +101,7 @@ void Upload::temporary_deleted(const Transfer &transfer)
         is_broken_off = false;
         was_broken_off = true;
         delete_again_at = std::chrono::steady_clock::now() + DELETE_AGAIN;
-        return client.http.wake_at(*delete_again_at);
+        return;
     }
     Known &known = client.http.known;
     const bool is_absent = transfer.result == CURLE_OK && transfer.status == 404;
@@ -135,14 +135,14 @@ bool Upload::renew_temporary()
 
 void Upload::move()
 {
-    if (!client.is_wanted(wanted.id) || ++moves > MOVES_MAX)
+    if (!is_wanted() || ++moves > MOVES_MAX)
         return finish(CLOUD_CONTENT_SYNC_ERROR_SERVER);
     is_temporary_whole = true;
     static_cast<void>(client.ledger.sent(who, record, target));
     auto transfer = std::make_unique<Transfer>();
     transfer->method = "MOVE";
     transfer->path = temporary;
-    transfer->headers = move_headers(client.http.storage(), target);
+    transfer->headers = move_headers(client.http, target);
     is_moving = true;
     request(std::move(transfer), &Upload::moved);
 }
@@ -167,7 +167,7 @@ void Upload::moved(const Transfer &transfer)
         moves = 0;
         is_moving = false;
         if (transfer.status == 412)
-            return try_next_name();
+            return record.is_inherited ? look(true, &Upload::next_name_looked_at, target) : try_next_name();
         return look(false, &Upload::occupied, target);
     }
     const bool may_have_moved = transfer.status == 403 || transfer.status == 404 || transfer.status == 408;
@@ -223,16 +223,35 @@ void Upload::folder_looked_at(const Look &result)
     finish(is_absent ? CLOUD_CONTENT_SYNC_ERROR_FORBIDDEN : folder_error);
 }
 
+// Meanwhile the next upload may begin, unless there is more to be done than to look.
 void Upload::check_stored()
 {
     Known &known = client.http.known;
     const bool has_digests = known.find("digest") != 0, is_sample = known.is_sample();
-    if (has_digests || lost_reply || is_unknown || client.service.reads_back || is_sample)
-        return look(true, &Upload::verified);
+    const bool is_doubtful = lost_reply || is_unknown;
+    is_checking = temporary.empty() && !is_doubtful;
+    client.http.wake();
+    if (has_digests || is_doubtful || client.service.reads_back || is_sample)
+        return look(true, &Upload::checked);
     auto transfer = std::make_unique<Transfer>();
     transfer->method = "HEAD";
     transfer->path = where();
     request(std::move(transfer), &Upload::head_ended);
+}
+
+// What comes of an error may take its time, and another upload may have begun.
+void Upload::checked(const Look &result)
+{
+    if (!result.error || !is_checking)
+        return verified(result);
+    doubt = result;
+    client.http.wake();
+}
+
+void Upload::go_on()
+{
+    is_checking = false;
+    verified(*std::exchange(doubt, std::nullopt));
 }
 
 void Upload::note_digest(bool is_there)
@@ -250,7 +269,7 @@ void Upload::head_ended(const Transfer &transfer)
     const bool is_size_same = transfer.content_length == std::to_string(local.st_size);
     if (transfer.result == CURLE_OK && transfer.status == 200 && is_etag_same && is_size_same)
         return verified({Found::SAME, 0});
-    look(true, &Upload::verified); // in doubt
+    look(true, &Upload::checked); // in doubt
 }
 
 } // namespace cloud

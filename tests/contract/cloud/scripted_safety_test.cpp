@@ -9,7 +9,8 @@ namespace {
 struct Manners {
     bool keeps_by_condition, keeps_by_overwrite;
     bool has_hidden = true;
-    size_t room = 100; // files
+    size_t room = 100;           // files
+    bool has_other_name = false; // than the client's address of it
 };
 
 class Safety : public Scripted {
@@ -48,7 +49,10 @@ class Safety : public Scripted {
         if (request.method == "PROPFIND")
             return multistatus(file(request.path, std::to_string(found->second.size())));
         if (request.method == "MOVE") {
-            const std::string target = below(request.destination.substr(server->url.size()));
+            const bool is_address = request.destination.starts_with(server->url);
+            if (is_address && manners.has_other_name)
+                return answer("502 Another server");
+            const std::string target = below(request.destination.substr(is_address ? server->url.size() : 0));
             const bool is_taken = files.count(target) > 0;
             if (is_taken && manners.keeps_by_overwrite)
                 return answer("412 Taken");
@@ -91,6 +95,7 @@ TEST_F(Safety, what_is_there_stays_or_nothing_is_uploaded)
         {"neither", {false, false}, false, UNSAFE, "UUUMDD"},
         {"neither, and a look will do", {false, false}, true, 0, ""},
         {"no hidden names", {false, true, false}, false, 0, ""},
+        {"behind a proxy", {false, true, true, 100, true}, false, 0, "UUUMMDDULGMLMUHMLLM"},
         {"full", {true, true, true, 1}, false, FULL, ""},
         {"full for the second", {false, true, true, 2}, false, FULL, ""},
     };

@@ -52,6 +52,12 @@ class ScriptedServer {
         std::scoped_lock lock(mutex);
         hook = std::move(on_request);
     }
+    // The same before the body is read.
+    void set_head_hook(std::function<void(const Request &)> on_head)
+    {
+        std::scoped_lock lock(mutex);
+        head_hook = std::move(on_head);
+    }
     std::vector<Request> requests()
     {
         std::scoped_lock lock(mutex);
@@ -66,7 +72,7 @@ class ScriptedServer {
 
   private:
     // False when the connection ends.
-    static bool read_request(FILE *stream, Request &request)
+    bool read_request(FILE *stream, Request &request)
     {
         char line[4096], method[16], path[2048];
         if (!fgets(line, sizeof line, stream) || sscanf(line, "%15s %2047s", method, path) != 2)
@@ -82,6 +88,10 @@ class ScriptedServer {
             if (field.starts_with("Content-Length: "))
                 length = std::stoul(field.substr(16));
         }
+        std::unique_lock lock(mutex);
+        const auto before_body = head_hook;
+        lock.unlock();
+        before_body(request);
         request.body.resize(length);
         return fread(request.body.data(), 1, length, stream) == length;
     }
@@ -110,6 +120,7 @@ class ScriptedServer {
     std::mutex mutex;
     Script script;
     std::function<void(const Request &)> hook = [](const Request &) {};
+    std::function<void(const Request &)> head_hook = hook;
     int listener = -1;
     std::thread acceptor;
     std::vector<std::thread> workers; // the acceptor's until it has ended

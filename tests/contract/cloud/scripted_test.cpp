@@ -253,6 +253,36 @@ TEST_F(Scripted, an_upload_and_its_answers)
     }
 }
 
+// While the first file is looked at the second one is sent; a look that fails is made up for when nothing else is sent.
+TEST_F(Scripted, a_look_at_what_is_stored_does_not_hold_up_the_next_upload)
+{
+    const std::string local = scratch.file("hello", "hello");
+    std::promise<void> is_sent;
+    std::atomic<int> looks = 0;
+    serve(
+        [&](const Request &request) -> std::string {
+            if (request.method == "PUT")
+                return answer("201 Created", "", request.path.ends_with("/second") ? HELLO_DIGEST : "");
+            return ++looks < 3
+                       ? ""
+                       : multistatus(file("/r%20t/first", "5", "<v:sha256>" + std::string(HELLO_HEX) + "</v:sha256>"));
+        },
+        30, 60);
+    server->set_hook([&](const Request &request) {
+        if (request.method == "PUT" && request.path.ends_with("/second"))
+            return is_sent.set_value();
+        if (request.method == "PROPFIND" && looks == 0) {
+            EXPECT_EQ(is_sent.get_future().wait_for(std::chrono::seconds(20)), std::future_status::ready);
+        }
+    });
+    Watch first, second;
+    start(handle, local, "/first", first);
+    start(handle, local, "/second", second);
+    EXPECT_EQ(second.end(), 0);
+    EXPECT_EQ(first.end(), 0);
+    EXPECT_EQ(looks, 3);
+}
+
 // An empty body needs no rewinding, so nothing but a fresh connection keeps libcurl from sending it twice.
 TEST_F(Scripted, an_empty_file_is_not_sent_twice)
 {
