@@ -310,11 +310,14 @@ class Device:
     def click(self, text, kind=None, seconds=20.0):
         """A pointer click in the middle of a text or widget, once it is there and lies still."""
         place = wait_for(f'"{text}" on screen', lambda: self.find(text, kind), seconds)
+        end = time.monotonic() + seconds
         while True:
             time.sleep(0.15)
             now = self.find(text, kind)
             if now == place:
                 break
+            if time.monotonic() > end:
+                raise Trouble(f'"{text}" does not stay on screen')
             place = now or place
         _, _, x, y, width, height = place
         self.run("xdotool", "mousemove", str(x + width // 2), str(y + height // 2), "sleep", "0.05", "mousedown", "1",
