@@ -8,11 +8,14 @@
 #include "cloud_content_sync/upload.h"
 #include <algorithm>
 #include <csignal>
+#include <utility>
 
 namespace cloud {
 
 // Uploads that are looked after while others run; with more of them the next one waits.
 static constexpr size_t BESIDE_MAX = 8;
+// Until what has been told of a change can be seen.
+static constexpr auto SETTLE = std::chrono::milliseconds(300);
 // How often stalled transfers are looked for; with none under way there is nothing to look for.
 static constexpr auto TICK = std::chrono::milliseconds(1000), IDLE_TICK = std::chrono::milliseconds(60'000);
 
@@ -306,10 +309,12 @@ Wait Client::wait_begin(long long retry_after)
     const bool is_reachable = retry_after >= 0;
     if (!is_reachable && !network)
         connection_watch_create(&network); // before the look, or a change in between would go unseen
-    network_changed = false;
-    const Wait next = patience.next(is_reachable, is_reachable || has_network(), retry_after);
+    const bool was_change = std::exchange(network_changed, false);
+    Wait next = patience.next(is_reachable, is_reachable || has_network(), retry_after);
     if (!next.is_under_way())
         wait_end();
+    else if (was_change) // the settings store tells of a change while it makes it, so the answer may be that of before
+        next.until = std::min(next.until, Wait::Clock::now() + SETTLE);
     std::scoped_lock lock(mutex);
     wait = next;
     return next;
