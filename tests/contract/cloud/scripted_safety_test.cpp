@@ -120,13 +120,13 @@ TEST_F(Safety, what_is_there_stays_or_nothing_is_uploaded)
 // Whenever it comes, and whatever has been made by then.
 TEST_F(Safety, a_cancel_leaves_nothing)
 {
-    const std::string local = scratch.file("hello", "hello");
+    const std::string local = scratch.file("hello", "hello"), other = scratch.file("other", "hello");
     for (const bool keeps_by_condition : {true, false}) {
         size_t requests = 0;
         for (bool has_ended = false; !has_ended; requests++) {
             SCOPED_TRACE(requests);
             serve_tree({keeps_by_condition, true});
-            size_t seen = 0;
+            std::atomic<size_t> seen = 0; // of two connections
             std::atomic<int> id = 0;
             server->set_hook([&](const Request &) {
                 while (id == 0)
@@ -136,8 +136,8 @@ TEST_F(Safety, a_cancel_leaves_nothing)
             });
             Watch watch;
             id = start(handle, local, "/x", watch);
-            // The next upload comes after it.
-            EXPECT_EQ(upload(handle, local, "/next"), 0);
+            // The next upload of its name comes after all that it still does.
+            EXPECT_EQ(upload(handle, other, "/x"), 0);
             has_ended = !watch.calls.empty() && watch.calls.back().state == CLOUD_CONTENT_SYNC_STATE_DONE;
             TearDown();
             EXPECT_EQ(files.size(), has_ended ? 3u : 2u);
