@@ -2,6 +2,7 @@
 #include "base/base.h"
 #include "connection/connection.h"
 #include <linux/rtnetlink.h>
+#include <string_view>
 #include <sys/epoll.h>
 #include <sys/inotify.h>
 #include <sys/socket.h>
@@ -40,6 +41,19 @@ struct connection_watch_s {
     }
 };
 
+// Whether an event is of the store's database or its journal: others keep theirs in the same folder, and one that is
+// written because of a change must not pass for another change.
+static bool is_of_store(const char *events, ssize_t size)
+{
+    for (ssize_t at = 0; at < size;) {
+        const auto *event = reinterpret_cast<const inotify_event *>(events + at);
+        if (event->mask & IN_Q_OVERFLOW || (event->len > 0 && std::string_view(event->name).starts_with("settings.db")))
+            return true;
+        at += static_cast<ssize_t>(sizeof *event + event->len);
+    }
+    return false;
+}
+
 int connection_watch_create(connection_watch_h *watch)
 {
     if (!watch)
@@ -75,8 +89,9 @@ int connection_watch_read(connection_watch_h watch)
         return CONNECTION_ERROR_INVALID_PARAMETER;
     bool is_any = false;
     alignas(inotify_event) char buffer[4096];
-    for (const int fd : {watch->kernel, watch->store})
-        while (fd >= 0 && read(fd, buffer, sizeof buffer) > 0)
-            is_any = true;
+    while (watch->kernel >= 0 && read(watch->kernel, buffer, sizeof buffer) > 0)
+        is_any = true;
+    for (ssize_t size = 0; watch->store >= 0 && (size = read(watch->store, buffer, sizeof buffer)) > 0;)
+        is_any = is_of_store(buffer, size) || is_any;
     return is_any ? CONNECTION_ERROR_NONE : CONNECTION_ERROR_OPERATION_FAILED;
 }
